@@ -1,0 +1,64 @@
+#pragma once
+// One buffer of a port: its header, the memory behind it and who holds it. The node's table owns it; the
+// worker keeps a second reference while its codec works on the memory, so a client that frees a buffer
+// which it does not hold harms nobody.
+// Threads: `holder`, `header`, `freed` and `unread` are guarded by the node's mutex. The memory belongs to
+// whoever holds the buffer; pointers and sizes never change.
+
+#include <cstddef>
+#include <cstdint>
+#include <memory>
+
+#include <OMX_Core.h>
+#include <binder/IMemory.h>
+#include <media/IOMX.h>
+#include <utils/RefBase.h>
+
+#include "host/mediaserver/codec.h"
+
+namespace mediaserver {
+
+enum class Holder {
+  Client,
+  Transit,  // a client's call is copying into it
+  Node,     // waits in its port's line
+  Codec,    // the worker has it in hand
+};
+
+class Buffer {
+ public:
+  // Works on the client's block directly. Null when there is no block or no memory behind it.
+  static std::shared_ptr<Buffer> onBlock(const android::sp<android::IMemory>& block);
+  // Memory of its own, as large as the client's block, and copied to and from it. Null as above, or when
+  // memory is short.
+  static std::shared_ptr<Buffer> withBackup(const android::sp<android::IMemory>& block);
+  // Memory of its own. Null when memory is short.
+  static std::shared_ptr<Buffer> own(size_t size);
+
+  uint8_t* data() const { return header.pBuffer; }
+  size_t capacity() const { return header.nAllocLen; }
+  // True when `length` bytes from `offset` lie inside the buffer.
+  bool contains(size_t offset, size_t length) const;
+
+  // Copy a range between the client's block and the own memory; nothing without a backup, and never more
+  // than the buffer has. The caller holds the buffer, and no lock.
+  void copyIn(size_t offset, size_t length);
+  void copyOut(size_t offset, size_t length);
+
+  OMX_BUFFERHEADERTYPE header{};
+  android::IOMX::buffer_id id = nullptr;
+  Holder holder = Holder::Client;
+  bool freed = false;   // no longer in its port's table
+  bool unread = false;  // came back to the client with output, and has not been sent again
+
+ private:
+  struct Release {
+    void operator()(uint8_t* memory) const;
+  };
+
+  android::sp<android::IMemory> _block;
+  uint8_t* _backup = nullptr;  // the block's bytes, if they are not the buffer itself
+  std::unique_ptr<uint8_t, Release> _own;
+};
+
+}  // namespace mediaserver

@@ -1,0 +1,15 @@
+#pragma once
+// The media server's components as one device has them. Any thread.
+
+#include <vector>
+
+#include <omxhost/device.h>
+
+#include "host/mediaserver/codec.h"
+
+namespace mediaserver {
+
+// Empty for a device without components.
+std::vector<Component> componentsOf(const omxhost::Device& device);
+
+}  // namespace mediaserver

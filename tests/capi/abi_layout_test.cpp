@@ -1,0 +1,180 @@
+// What binaries count on without a name: the order of virtual operations and of data members, and the
+// layout of records.
+#include <gtest/gtest.h>
+
+#include <cstddef>
+#include <cstring>
+
+#include "core/buffer_info.h"
+#include "core/omx_codec_observer.h"
+#include "core/omx_interface.h"
+#include "decoder/omx_interface_decoder.h"
+#include "encoder/omx_interface_encoder.h"
+#include "omxbridge/omxbridge.h"
+#include "platform/board_platform_wrapper.h"
+#include "platform/qcom_board_platform_wrapper.h"
+#include "platform/ti_board_platform_wrapper.h"
+#include "tests/capi/c_records.h"
+
+namespace {
+
+// Offsets in classes with virtual operations: conditionally supported, and supported by both compilers.
+#pragma GCC diagnostic push
+#pragma GCC diagnostic ignored "-Winvalid-offsetof"
+
+template <size_t count>
+constexpr bool ascending(const size_t (&offsets)[count]) {
+  for (size_t i = 1; i < count; ++i) {
+    if (offsets[i - 1] >= offsets[i]) return false;
+  }
+  return true;
+}
+
+#define AT(member) offsetof(OmxInterface, member)
+static_assert(ascending({AT(_portBuffers),
+                         AT(_componentName),
+                         AT(_portBufferMode),
+                         AT(_threadError),
+                         AT(_inputClosed),
+                         AT(_endOfOutputReached),
+                         AT(_deinitDone),
+                         AT(_portReconfiguring),
+                         AT(_queueOutputData),
+                         AT(_omx),
+                         AT(_node),
+                         AT(_observer),
+                         AT(_mpMemHeap),
+                         AT(_memoryDealer),
+                         AT(_inputCallback),
+                         AT(_inputCallbackContext),
+                         AT(_outputCallback),
+                         AT(_outputCallbackContext),
+                         AT(_outputConvertBuffer),
+                         AT(_outputConvertBufferSize),
+                         AT(_omxState),
+                         AT(_outputThread),
+                         AT(_semStateChanged),
+                         AT(_semEventQueued),
+                         AT(_semReserved3),
+                         AT(_semOutputDataReady),
+                         AT(_semInputBuffersReturned),
+                         AT(_semOutputBuffersReturned),
+                         AT(_semEndOfOutput),
+                         AT(_semInputBufferFree),
+                         AT(_semReserved9),
+                         AT(_portFrameSize),
+                         AT(_endOfInputPending),
+                         AT(_platformWrapper),
+                         AT(_isEncoder),
+                         AT(_state)}));
+// The semaphores are one behind the other, and nothing comes behind the session's own state.
+static_assert(AT(_semReserved9) - AT(_semStateChanged) == 8 * sizeof(sem_t));
+static_assert(AT(_state) + sizeof(void*) == sizeof(OmxInterface));
+#undef AT
+
+static_assert(
+    ascending({offsetof(OmxInterfaceDecoder, _state), offsetof(OmxInterfaceDecoder, _queueThreadMessages),
+               offsetof(OmxInterfaceDecoder, _eventThread), offsetof(OmxInterfaceDecoder, _clipTable),
+               offsetof(OmxInterfaceDecoder, _eventThreadWaiting)}));
+static_assert(sizeof(OmxInterfaceEncoder) == sizeof(OmxInterface));
+
+static_assert(ascending({offsetof(BufferInfo, bufferId), offsetof(BufferInfo, busy),
+                         offsetof(BufferInfo, memory), offsetof(BufferInfo, length),
+                         offsetof(BufferInfo, data), offsetof(BufferInfo, rangeLength),
+                         offsetof(BufferInfo, outputData), offsetof(BufferInfo, timestamp),
+                         offsetof(BufferInfo, eos), offsetof(BufferInfo, lock)}));
+
+// Sees the wrapper's members, which are for the vendors' classes.
+class WrapperMembers : public CBoardPlatformWrapper {
+ public:
+  static constexpr bool inOrder() {
+    return ascending({offsetof(WrapperMembers, _owner), offsetof(WrapperMembers, _omx),
+                      offsetof(WrapperMembers, _node)}) &&
+           offsetof(WrapperMembers, _node) + sizeof(void*) == sizeof(CBoardPlatformWrapper);
+  }
+
+ protected:
+  ~WrapperMembers() = default;
+};
+static_assert(WrapperMembers::inOrder());
+
+#pragma GCC diagnostic pop
+
+// The slot of a virtual operation, from how pointers to members are represented; -1 for one that is not
+// virtual.
+template <typename Function, typename Class>
+int slot(Function Class::*operation) {
+  ptrdiff_t words[2];
+  static_assert(sizeof(operation) == sizeof(words));
+  memcpy(words, &operation, sizeof(words));
+#if defined(__arm__) || defined(__aarch64__)
+  const bool isVirtual = (words[1] & 1) != 0;
+  const ptrdiff_t offset = words[0];
+#else
+  const bool isVirtual = (words[0] & 1) != 0;
+  const ptrdiff_t offset = words[0] - 1;
+#endif
+  return isVirtual ? static_cast<int>(offset / static_cast<ptrdiff_t>(sizeof(void*))) : -1;
+}
+
+TEST(VirtualSlots, OfSessionsAreWhereBinariesCallThem) {
+  // 0 and 1 are the destructor's two forms.
+  EXPECT_EQ(slot(&OmxCodecObserverDelegate::setObserver), 2);
+  EXPECT_EQ(slot(&OmxCodecObserverDelegate::onOmxObserverEmptyBufferDone), 6);
+  EXPECT_EQ(slot(&OmxInterface::setObserver), 2);
+  EXPECT_EQ(slot(&OmxInterface::setMPmemInfo), 3);
+  EXPECT_EQ(slot(&OmxInterface::onOmxObserverEvent), 4);
+  EXPECT_EQ(slot(&OmxInterface::onOmxObserverFillBufferDone), 5);
+  EXPECT_EQ(slot(&OmxInterface::onOmxObserverEmptyBufferDone), 6);
+  EXPECT_EQ(slot(&OmxInterface::onEvent), 7);
+  EXPECT_EQ(slot(&OmxInterface::init), 8);
+  EXPECT_EQ(slot(&OmxInterface::deInit), 9);
+  EXPECT_EQ(slot(&OmxInterface::callOutputCallbackFunction), 10);
+  EXPECT_EQ(slot(&OmxInterfaceDecoder::onOmxObserverEvent), 4);
+  EXPECT_EQ(slot(&OmxInterfaceDecoder::onEvent), 7);
+  EXPECT_EQ(slot(&OmxInterfaceDecoder::init), 8);
+  EXPECT_EQ(slot(&OmxInterfaceDecoder::callOutputCallbackFunction), 10);
+
+  for (const int operation :
+       {slot(&OmxInterface::setupIOMXConnections), slot(&OmxInterfaceEncoder::setConfig),
+        slot(&OmxInterfaceDecoder::getBufferNum)}) {
+    EXPECT_EQ(operation, -1) << "one more slot than binaries know";
+  }
+}
+
+TEST(VirtualSlots, OfWrappersAreWhereBinariesCallThem) {
+  EXPECT_EQ(slot(&CBoardPlatformWrapper::configureEncoder), 0);
+  EXPECT_EQ(slot(&CBoardPlatformWrapper::setConfig), 1);
+  EXPECT_EQ(slot(&CBoardPlatformWrapper::setPictureOrder), 2);
+  EXPECT_EQ(slot(&CBoardPlatformWrapper::setInputPackingFormat), 3);
+  EXPECT_EQ(slot(&CBoardPlatformWrapper::setOutputColorFormat), 4);
+  EXPECT_EQ(slot(&CQcomBoardPlatformWrapper::setInputPackingFormat), 3);
+  EXPECT_EQ(slot(&CTIBoardPlatformWrapper::setOutputColorFormat), 4);
+}
+
+TEST(Records, AreLaidOutAlikeInCAndCPlusPlus) {
+  using webrtc::VideoCodec;
+  using webrtc::VideoCodecH264;
+  const size_t layout[] = {
+#include "tests/capi/record_layout.inl"
+  };
+  ASSERT_EQ(std::size(layout), cRecordLayoutCount);
+  for (size_t i = 0; i < cRecordLayoutCount; ++i) EXPECT_EQ(layout[i], cRecordLayout[i]) << "number " << i;
+}
+
+// The places in words that the records' readers go by.
+static_assert(offsetof(webrtc::VideoCodecH264, profile) == 8);
+static_assert(offsetof(webrtc::VideoCodecH264, keyFrameInterval) == 12);
+static_assert(offsetof(webrtc::VideoCodecH264, referenceFrames) == 32);
+static_assert(offsetof(webrtc::VideoCodecH264, entropyCoding) == 36);
+static_assert(offsetof(webrtc::VideoCodecH264, transform8x8) == 37);
+static_assert(offsetof(webrtc::VideoCodec, payloadName) == 4);
+static_assert(offsetof(webrtc::VideoCodec, payloadType) == 36);
+static_assert(offsetof(webrtc::VideoCodec, width) == 38);
+static_assert(offsetof(webrtc::VideoCodec, height) == 40);
+static_assert(offsetof(webrtc::VideoCodec, startBitrate) == 44);
+static_assert(offsetof(webrtc::VideoCodec, maxFramerate) == 56);
+static_assert(offsetof(webrtc::VideoCodec, codecSpecific) == 60);
+static_assert(sizeof(DECODEDDATAINFO) == 7 * 4);
+
+}  // namespace

@@ -1,0 +1,15 @@
+// Sessions run from plain C, as an application would. Both return 0, or the line of what went wrong.
+// The encoder sends frames of 176x144 and expects `length` bytes of output for each; the decoder expects
+// pictures of the given size in pixels, of three bytes each.
+#pragma once
+
+#ifdef __cplusplus
+extern "C" {
+#endif
+
+int runEncoderInC(unsigned int length);
+int runDecoderInC(unsigned int width, unsigned int height);
+
+#ifdef __cplusplus
+}
+#endif

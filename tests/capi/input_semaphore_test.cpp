@@ -1,0 +1,74 @@
+// The input semaphore: whatever order it is used in, and while others use it.
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <thread>
+
+#include "core/omx_interface.h"
+#include "omxbridge/omxbridge.h"
+#include "tests/capi/semaphore_watch.h"
+#include "tests/encoder/encoder_rig.h"
+
+namespace {
+
+using namespace omxtest;
+
+TEST(InputSemaphore, MayBeUsedInAnyOrder) {
+  const auto post = [] { return semaphoreEmptyBufferPost(nullptr, nullptr); };
+  const auto setUp = [] { return omx_setup_input_semaphore(nullptr); };
+  int (*const operations[])() = {post, setUp, omx_teardown_input_semaphore};
+  // Every sequence of five, among them posts before set-up, set-up twice and teardown of nothing.
+  for (int sequence = 0; sequence < 3 * 3 * 3 * 3 * 3; ++sequence) {
+    for (int rest = sequence, i = 0; i < 5; ++i, rest /= 3) EXPECT_EQ(operations[rest % 3](), 0);
+  }
+  EXPECT_EQ(semaphoreMisuses(), 0);
+}
+
+TEST(InputSemaphore, MayBePostedWhileItComesAndGoes) {
+  std::atomic<bool> done{false};
+  std::thread posters[2];
+  for (std::thread& poster : posters) {
+    poster = std::thread([&] {
+      while (!done) semaphoreEmptyBufferPost(nullptr, nullptr);
+    });
+  }
+  for (int i = 0; i < 2000; ++i) {
+    omx_setup_input_semaphore(nullptr);
+    if (i % 3 == 0) omx_setup_input_semaphore(nullptr);
+    omx_teardown_input_semaphore();
+  }
+  done = true;
+  for (std::thread& poster : posters) poster.join();
+  EXPECT_EQ(semaphoreMisuses(), 0);
+}
+
+TEST(InputSemaphore, TakesThePlaceOfTheInputCallback) {
+  EncoderRig rig("msm8960");
+  ASSERT_EQ(rig.create(), 0);
+  OmxInterface* handle = rig.session.get();
+  int context = 0;
+  omx_interface_register_input_callback(
+      handle,
+      [](void* /*session*/, void* calls) {
+        ++*static_cast<int*>(calls);
+        return 0;
+      },
+      &context);
+  EXPECT_EQ(omx_setup_input_semaphore(handle), 0);
+  EXPECT_EQ(rig.session->_inputCallback, semaphoreEmptyBufferPost);
+  EXPECT_EQ(rig.session->_inputCallbackContext, nullptr);
+
+  // Buffers come back before and after the teardown.
+  ASSERT_EQ(omx_interface_init(handle), 0);
+  const unsigned char frame[38016] = {};
+  for (const size_t sent : {1U, 2U}) {
+    EXPECT_EQ(omx_send_data_frame_to_encoder(handle, frame, 176, 144, 0), 0);
+    EXPECT_TRUE(rig.server.messages().waitForDelivered(emptyBufferDone(), sent));
+    EXPECT_EQ(omx_teardown_input_semaphore(), 0);
+  }
+  EXPECT_EQ(context, 0);
+  rig.session.reset();
+  EXPECT_EQ(semaphoreMisuses(), 0);
+}
+
+}  // namespace

@@ -1,0 +1,12 @@
+// Each size and offset that C and C++ have to agree on. The including file says what VideoCodec and kin are.
+sizeof(VideoCodecH264), offsetof(VideoCodecH264, unused0), offsetof(VideoCodecH264, profile),
+    offsetof(VideoCodecH264, keyFrameInterval), offsetof(VideoCodecH264, unused1),
+    offsetof(VideoCodecH264, referenceFrames), offsetof(VideoCodecH264, entropyCoding),
+    offsetof(VideoCodecH264, transform8x8), sizeof(VideoCodec), offsetof(VideoCodec, codecType),
+    offsetof(VideoCodec, payloadName), offsetof(VideoCodec, payloadType), offsetof(VideoCodec, width),
+    offsetof(VideoCodec, height), offsetof(VideoCodec, startBitrate), offsetof(VideoCodec, maxBitrate),
+    offsetof(VideoCodec, minBitrate), offsetof(VideoCodec, maxFramerate), offsetof(VideoCodec, codecSpecific),
+    sizeof(DECODEDDATAINFO), offsetof(DECODEDDATAINFO, width), offsetof(DECODEDDATAINFO, height),
+    offsetof(DECODEDDATAINFO, dataType), offsetof(DECODEDDATAINFO, cropWidth),
+    offsetof(DECODEDDATAINFO, cropHeight), offsetof(DECODEDDATAINFO, cropLeft),
+    offsetof(DECODEDDATAINFO, cropTop), sizeof(CONFIGTYPE), sizeof(OmxResult),

@@ -1,0 +1,91 @@
+// Waiting in session tests: a call on a thread of its own whose result is waited for with a limit, and a
+// gate that threads stop at until a test lets them go on. Where a limit passes, the session hangs: there
+// is no way to clean up behind that, so the program says where it was and ends.
+#pragma once
+
+#include <stdio.h>
+#include <stdlib.h>
+
+#include <chrono>
+#include <condition_variable>
+#include <functional>
+#include <future>
+#include <mutex>
+#include <utility>
+
+#include "tests/support/eventually.h"
+
+namespace omxtest {
+
+// What a hung test tells of itself before it ends; set by fixtures.
+inline std::function<void()>& hangReport() {
+  static std::function<void()> report;
+  return report;
+}
+
+[[noreturn]] inline void endHungTest(const char* where) {
+  fprintf(stderr, "HANG: %s did not come within the limit\n", where);
+  if (hangReport()) hangReport()();
+  abort();
+}
+
+inline void require(bool came, const char* what) {
+  if (!came) endHungTest(what);
+}
+
+template <typename Predicate>
+void requireEventually(Predicate predicate, const char* what) {
+  require(eventually(std::move(predicate)), what);
+}
+
+// A call in progress. The object waits for it at its end.
+template <typename Result>
+class Later {
+ public:
+  Later(const char* what, std::function<Result()> call)
+      : _what(what), _future(std::async(std::launch::async, std::move(call))) {}
+  Later(Later&&) = default;
+  ~Later() {
+    if (_future.valid()) result();
+  }
+
+  bool isDone() const { return _future.wait_for(std::chrono::seconds(0)) == std::future_status::ready; }
+  Result result() {
+    require(_future.wait_for(kWaitLimit) == std::future_status::ready, _what);
+    return _future.get();
+  }
+
+ private:
+  const char* _what;
+  std::future<Result> _future;
+};
+
+// Threads stop at pass() until open() is called, once and for all.
+class Gate {
+ public:
+  ~Gate() { open(); }
+  void pass() {
+    std::unique_lock<std::mutex> lock(_mutex);
+    ++_arrived;
+    _changed.notify_all();
+    require(_changed.wait_for(lock, kWaitLimit, [this] { return _open; }), "opening a gate");
+  }
+  // Until that many threads have come to the gate.
+  void waitForArrival(int count = 1) {
+    std::unique_lock<std::mutex> lock(_mutex);
+    require(_changed.wait_for(lock, kWaitLimit, [&] { return _arrived >= count; }), "arrival at a gate");
+  }
+  void open() {
+    const std::lock_guard<std::mutex> lock(_mutex);
+    _open = true;
+    _changed.notify_all();
+  }
+
+ private:
+  std::mutex _mutex;
+  std::condition_variable _changed;
+  int _arrived = 0;
+  bool _open = false;
+};
+
+}  // namespace omxtest

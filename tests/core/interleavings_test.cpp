@@ -1,0 +1,210 @@
+// Moments at which threads of a session meet, each brought about on purpose.
+#include <atomic>
+#include <thread>
+
+#include "tests/core/session_fixture.h"
+
+namespace omxtest {
+namespace {
+
+using InterleavingTest = SessionTest;
+
+TEST_F(InterleavingTest, AFailureWakesADeInitThatHasLookedForOneBefore) {
+  // deInit() has found no failure and sleeps until the end of output. The stream that failed now never
+  // ends: without a wake-up deInit() would not either.
+  start();
+  Later<int> ending = beginDeInit();
+  waitForSleeper(&SessionState::endOfOutputWaiters);
+  deliver(makeEmptyBufferDone(this));
+  EXPECT_EQ(ending.result(), OMXI_ERR_BUFFER_NOT_FOUND);
+}
+
+TEST_F(InterleavingTest, NobodyFindsARecordOfAPortThatIsBeingFreed) {
+  // While deInit() frees a port, record by record, the application gives buffers back and feeds and the
+  // server sends messages again. Whoever used a record that is going would use freed memory, or hand the
+  // component a buffer that it does not know any more.
+  start();
+  std::vector<void*> inputs;
+  std::vector<void*> outputs;
+  for (size_t i = 0; i < kInputs; ++i) inputs.push_back(bufferId(0, i));
+  for (size_t i = 0; i < kOutputs; ++i) outputs.push_back(bufferId(1, i));
+  void* handle = nullptr;
+  void* data = nullptr;
+  ASSERT_EQ(_session->reserveInputBuffer(&handle, &data), 0);
+  ASSERT_EQ(_session->sendInputBuffer(handle, 0, 0), 0);
+  endOfStream();
+  const size_t fills = omx().count(Method::FillBuffer);
+  const size_t empties = omx().count(Method::EmptyBuffer);
+  size_t freed = 0;
+  omx().before(Method::FreeBuffer, [&](const Call& call) {
+    if (call.port == 1) {
+      for (void* id : outputs) {
+        _session->returnIomxOutputBuffer(id);
+        deliver(makeFillBufferDone(id, 1, OMX_BUFFERFLAG_EOS));
+      }
+      EXPECT_EQ(_session->fillOutputBuffers(), OMXI_OK);
+    } else {
+      EXPECT_EQ(_session->sendInputBuffer(handle, 1, 0), -1);
+      EXPECT_EQ(_session->sendFinalBuffer(handle, 0), -1);
+      _session->releaseInputBuffer(handle);
+      for (size_t i = 0; i < kInputs - freed; ++i) deliver(makeEmptyBufferDone(inputs[i]));
+      ++freed;
+    }
+  });
+  EXPECT_EQ(deInit(), OMXI_OK);
+  EXPECT_EQ(freed, kInputs);
+  EXPECT_EQ(omx().count(Method::FillBuffer), fills);
+  EXPECT_EQ(omx().count(Method::EmptyBuffer), empties);
+}
+
+TEST_F(InterleavingTest, LookUpsAndTheTablesEndDoNotMeet) {
+  // The same with threads that do not know what deInit() is about, at moments that nobody chose.
+  _application.leaveDataAlone();
+  for (int round = 0; round < 10; ++round) {
+    start();
+    std::vector<void*> ids;
+    for (size_t i = 0; i < kOutputs; ++i) ids.push_back(bufferId(1, i));
+    std::atomic<bool> over{false};
+    std::thread returner([&] {
+      while (!over) {
+        for (void* id : ids) _session->returnIomxOutputBuffer(id);
+      }
+    });
+    std::thread feeder([&] {
+      while (!over) {
+        void* handle = nullptr;
+        void* data = nullptr;
+        if (_session->reserveInputBuffer(&handle, &data) == 0) _session->releaseInputBuffer(handle);
+        static_cast<void>(_session->portBuffersHaveBeenReturned(1));
+        static_cast<void>(feed("x"));
+      }
+    });
+    for (void* id : ids) messages().forge(_session->_node, makeFillBufferDone(id, 3));
+    _application.waitForOutputs(1);
+    _session->setThreadError(OMXI_ERR_APPLICATION);
+    EXPECT_EQ(deInit(), OMXI_ERR_APPLICATION);
+    over = true;
+    returner.join();
+    feeder.join();
+    destroy();
+    messages().forgetFreedNodes();
+  }
+}
+
+TEST_F(InterleavingTest, ARecordIsReadBeforeTheApplicationGetsIt) {
+  // The application gives the last buffer back before its callback returns, and with that the record's end
+  // mark is cleared. Looked at afterwards it would be gone, and the stream would never end.
+  start();
+  _application.onOutput([this](const Output& output) {
+    _session->returnIomxOutputBuffer(output.bufferId);
+    return 1;
+  });
+  componentProduces("the end", 0, OMX_BUFFERFLAG_EOS);
+  EXPECT_EQ(deInit(), OMXI_OK);
+  EXPECT_EQ(_application.outputTexts(), std::vector<std::string>{"the end"});
+}
+
+TEST_F(InterleavingTest, ABufferGivenBackInsideItsCallbackGoesBackOnce) {
+  // The callback returned the buffer itself and then says that the session may have it: a second fillBuffer
+  // would send the component a buffer that it has.
+  start();
+  _application.onOutput([this](const Output& output) {
+    _session->returnIomxOutputBuffer(output.bufferId);
+    return 0;
+  });
+  for (const char* text : {"a", "b", "c"}) feedThrough(text);
+  _application.onOutput(nullptr);
+  feedThrough("d");
+  require(omx().waitForCalls(Method::FillBuffer, kOutputs + 4), "the last refill");
+  EXPECT_EQ(omx().count(Method::FillBuffer), kOutputs + 4);
+  EXPECT_EQ(log(), LogLines{});
+}
+
+TEST_F(InterleavingTest, AnOutputCallbackMayWaitForAnInputBuffer) {
+  // The callback waits for the input callback, which comes behind another filled buffer. If queueing that
+  // one had to wait for the callback's end, neither would ever come.
+  start();
+  script().holdInput();
+  for (size_t i = 0; i < kInputs; ++i) ASSERT_EQ(feed("held"), 0);
+  Gate& returned = newGate();
+  std::atomic<int> fed{-9};
+  _application.onInput([&] { returned.open(); });
+  _application.onOutput([&](const Output& output) {
+    if (output.bytes == "first") {
+      returned.pass();
+      fed = feed("from the callback");
+    }
+    return 0;
+  });
+  componentProduces("first");
+  returned.waitForArrival();
+  componentProduces("second");
+  require(messages().waitForDelivered(fillBufferDone(), 2), "a filled buffer during a callback");
+  script().releaseInput(1);
+  _application.waitForOutputs(2);
+  EXPECT_EQ(fed, 0);
+}
+
+TEST_F(InterleavingTest, ACallbackGetsTheContextItWasRegisteredWith) {
+  // Replaced while buffers come: a callback that got the other's context would take it for its own.
+  Application other;
+  start();
+  std::atomic<bool> over{false};
+  std::thread registrar([&] {
+    while (!over) {
+      _session->registerInputCallback(
+          [](void*, void* context) {
+            EXPECT_EQ(context, nullptr);
+            return 0;
+          },
+          nullptr);
+      _session->registerOutputCallback(
+          [](void*, void*, unsigned, void*, void* context, unsigned) {
+            EXPECT_EQ(context, nullptr);
+            return 0;
+          },
+          nullptr);
+      other.attach(*_session);
+    }
+  });
+  for (int i = 0; i < 300; ++i) {
+    componentProduces("o");
+    static_cast<void>(feed("i"));
+  }
+  require(messages().waitForDelivered(fillBufferDone(), 300), "the outputs");
+  over = true;
+  registrar.join();
+  destroy();
+  for (const Output& output : other.outputs()) EXPECT_EQ(output.length, 1u);
+}
+
+TEST_F(InterleavingTest, PicturesInFlightComeFirstAndThenTheEnd) {
+  // Once the end of input is pending, output goes to the component no more. A component that owes more
+  // pictures than it has buffers would keep its end mark for ever: so the application lets them come first.
+  start();
+  for (size_t i = 0; i < 3 * kOutputs; ++i) feedThrough("picture");
+  endOfStream();
+  EXPECT_EQ(deInit(), OMXI_OK);
+  EXPECT_EQ(_application.outputs().size(), 3 * kOutputs + 1);
+  destroy();
+
+  start();  // what happens otherwise
+  script().holdOutput();
+  for (size_t i = 0; i < kOutputs + 1; ++i) {
+    requireEventually([this] { return busyCount(kOmxInputPort) < kInputs; }, "a free input buffer");
+    ASSERT_EQ(feed("owed"), 0);
+  }
+  ASSERT_EQ(beginEndOfInput().result(), 0);
+  Later<int> ending = beginDeInit();
+  waitForSleeper(&SessionState::endOfOutputWaiters);
+  script().passOutput();
+  _application.waitForOutputs(3 * kOutputs + 1 + kOutputs);
+  requireEventually([this] { return busyCount(kOmxOutputPort) == 0; }, "the parked buffers");
+  EXPECT_GT(script().waiting(), 0u);
+  EXPECT_FALSE(_session->_endOfOutputReached);
+  _session->setThreadError(OMXI_ERR_APPLICATION);
+  EXPECT_EQ(ending.result(), OMXI_ERR_APPLICATION);
+}
+
+}  // namespace
+}  // namespace omxtest

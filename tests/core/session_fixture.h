@@ -1,0 +1,100 @@
+// A session with a scripted component behind it and an application in front of it, and the verbs in which
+// session tests speak. Everything that may block does so on a thread of its own and with a limit.
+#pragma once
+
+#include <gtest/gtest.h>
+
+#include <deque>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include <omxhost/log.h>
+
+#include "core/omx_interface.h"
+#include "core/session_state.h"
+#include "tests/core/application.h"
+#include "tests/core/bounded.h"
+#include "tests/core/log_lines.h"
+#include "tests/support/scripted_media_server.h"
+
+namespace omxtest {
+
+using Trace = std::vector<std::string>;
+
+inline constexpr auto kRefused = RecordingOmx::kFailed;
+inline constexpr const char* kRefusedHex = "0x80000000";
+inline constexpr const char* kRefusedText = "-2147483648";
+
+// What a session's threads are about, for a test that hangs. Reads what it can get at.
+std::string describeState(OmxInterface& session);
+
+class SessionTest : public ::testing::Test {
+ protected:
+  enum class Kind { Encoder, Decoder };
+  static constexpr size_t kInputs = 4;   // buffers of the scripted components
+  static constexpr size_t kOutputs = 6;  // of the encoder
+
+  explicit SessionTest(const char* device = "msm8960");
+  ~SessionTest() override;
+
+  // --- The session's life ---
+
+  // Constructs the session; an encoder's or a decoder's component, but the session as such.
+  void construct(Kind kind = Kind::Encoder);
+  // ... connects it and registers the application.
+  void connect(Kind kind = Kind::Encoder);
+  // ... brings it to Executing.
+  void start(Kind kind = Kind::Encoder);
+  Later<int> beginInit();
+  int init() { return beginInit().result(); }
+  Later<int> beginDeInit();
+  int deInit() { return beginDeInit().result(); }
+  Later<int> beginEndOfInput(int timestamp = 0);
+  // Sends the end mark and waits until it has come out and been delivered.
+  void endOfStream(int timestamp = 0);
+  // Destroys the session, from another thread.
+  Later<bool> beginDestroy();
+  // The same for a session that cannot be gone before the test lets something in progress end: comes
+  // back once destruction has begun.
+  Later<bool> beginDestroyOfBusySession();
+  void destroy();
+  // A gate that lives as long as the session, for hooks and callbacks.
+  Gate& newGate() { return _gates.emplace_back(); }
+
+  // --- Traffic ---
+
+  int feed(const std::string& text, int timestamp = 0);
+  // Feeds and waits for the output.
+  void feedThrough(const std::string& text, int timestamp = 0);
+  // The component makes an output of its own accord.
+  void componentProduces(const std::string& text, OMX_TICKS timestamp = 0, OMX_U32 flags = 0);
+  // A message of the test's making reaches the session, and has been dealt with.
+  void deliver(const android::omx_message& message);
+  void deliverEvent(OMX_EVENTTYPE event, OMX_U32 data1, OMX_U32 data2) {
+    deliver(makeEvent(event, data1, data2));
+  }
+
+  // --- Asking ---
+
+  Script& script() { return _kind == Kind::Encoder ? _server.encoder() : _server.decoder(); }
+  RecordingOmx& omx() { return _server.omx(); }
+  MessageTap& messages() { return _server.messages(); }
+  void* bufferId(int port, size_t index) const { return _session->_portBuffers[port][index].bufferId; }
+  size_t busyCount(int port) const;
+  // The calls as text, buffers by their place: "fillBuffer out0"; without the first `from` of them.
+  Trace trace(size_t from = 0);
+  static int valueOf(sem_t& semaphore);
+  LogLines log() const { return logLines(_log); }
+  // Waits until that many threads sleep in the session's wait for ...
+  void waitForSleeper(int SessionState::*waiters, int count = 1) const;
+
+  std::deque<Gate> _gates;
+  omxhost::LogCapture _log;
+  ScriptedMediaServer _server;
+  Application _application;
+  Kind _kind = Kind::Encoder;
+  std::unique_ptr<OmxInterface> _session;
+};
+
+}  // namespace omxtest

@@ -1,0 +1,494 @@
+// Several hundred sessions, encoders and decoders side by side, on random ways through their lives: fed from
+// several threads, ended, failed, taken down or destroyed at any point. The media server delays messages; to
+// every other session it also repeats, forges and loses calls. Nothing may hang, leak or touch freed memory,
+// and a session that is treated honestly must deliver everything and end well.
+//
+// Each run has another seed; OMXBRIDGE_STRESS_SEED repeats one (threads still meet as they like), and
+// OMXBRIDGE_STRESS_SESSIONS sets the number of sessions.
+#include <stdlib.h>
+#include <string.h>
+
+#include <algorithm>
+#include <atomic>
+#include <condition_variable>
+#include <map>
+#include <random>
+#include <set>
+#include <thread>
+
+#include "decoder/omx_interface_decoder.h"
+#include "tests/core/session_fixture.h"
+
+namespace omxtest::stress {
+namespace {
+
+using Random = std::mt19937;
+
+// One of 0 to `count` - 1.
+unsigned draw(Random& random, size_t count) {
+  return static_cast<unsigned>(random() % count);
+}
+
+// True in `percent` of the cases.
+bool chance(Random& random, unsigned percent) {
+  return draw(random, 100) < percent;
+}
+
+unsigned setting(const char* name, unsigned otherwise) {
+  const char* const text = getenv(name);
+  return text != nullptr ? static_cast<unsigned>(strtoul(text, nullptr, 10)) : otherwise;
+}
+
+// What is between the sessions and their components: late and repeated messages, forged ones, failed calls.
+class Mischief {
+ public:
+  Mischief(ScriptedMediaServer& server, unsigned seed) : _server(server), _random(seed) {
+    server.messages().setFilter([this](const android::omx_message& message) { return fate(message); });
+    server.omx().failWhere([this](const Call& call) { return failsCall(call); });
+    _thread = std::thread([this] { run(); });
+  }
+  ~Mischief() {
+    _over = true;
+    _thread.join();
+    _server.messages().passAll();
+    _server.messages().releaseAll();
+    _server.omx().failNothing();
+  }
+
+  // From now on this node's messages and calls are tampered with, and messages with these buffers are forged.
+  void pester(void* node, std::vector<void*> buffers) {
+    const std::lock_guard<std::mutex> lock(_mutex);
+    _victims[node] = std::move(buffers);
+  }
+  void leaveAlone(void* node) {
+    const std::lock_guard<std::mutex> lock(_mutex);
+    _victims.erase(node);
+  }
+
+ private:
+  Fate fate(const android::omx_message& message) {
+    const std::lock_guard<std::mutex> lock(_mutex);
+    const bool victim = _victims.contains(message.node);
+    // Late messages of an honest component still come in their order: one holds up those behind it.
+    size_t& held = _held[message.node];
+    if (chance(_random, 10) || (!victim && held > 0)) {
+      ++held;
+      return Fate::Hold;
+    }
+    return victim && chance(_random, 10) ? Fate::Repeat : Fate::Pass;
+  }
+
+  // Lets one of the held messages go, some of them after their session.
+  void releaseOne() {
+    const std::vector<android::omx_message> held = _server.messages().held();
+    if (held.empty()) return;
+    size_t position = 0;
+    {
+      const std::lock_guard<std::mutex> lock(_mutex);
+      position = stress::draw(_random, held.size());
+      if (!_victims.contains(held[position].node)) {
+        const auto oldest = std::find_if(held.begin(), held.end(), [&](const android::omx_message& message) {
+          return message.node == held[position].node;
+        });
+        position = static_cast<size_t>(oldest - held.begin());
+      }
+    }
+    _server.messages().release(position);
+    const std::lock_guard<std::mutex> lock(_mutex);
+    --_held[held[position].node];
+  }
+
+  bool failsCall(const Call& call) {
+    const std::lock_guard<std::mutex> lock(_mutex);
+    return call.method != Method::FreeNode && _victims.contains(call.node) && chance(_random, 2);
+  }
+
+  void run() {
+    MessageTap& messages = _server.messages();
+    for (unsigned round = 1; !_over; ++round) {
+      if (messages.waitForHeld(1, std::chrono::milliseconds(1))) releaseOne();
+      if (const auto [node, message] = forgery(); node != nullptr) messages.forge(node, message);
+      if (round % 128 == 0) messages.forgetFreedNodes();  // each may have a thread for its late messages
+    }
+  }
+
+  std::pair<void*, android::omx_message> forgery() {
+    const std::lock_guard<std::mutex> lock(_mutex);
+    if (_victims.empty() || !chance(_random, 30)) return {nullptr, {}};
+    auto victim = _victims.begin();
+    std::advance(victim, stress::draw(_random, _victims.size()));
+    const auto& [node, buffers] = *victim;
+    void* const buffer =
+        buffers.empty() || chance(_random, 10) ? this : buffers[stress::draw(_random, buffers.size())];
+    const OMX_U32 few = stress::draw(_random, 5);
+    switch (stress::draw(_random, 10)) {
+      case 0:
+        return {node, makeEvent(static_cast<OMX_EVENTTYPE>(stress::draw(_random, 8)), few, few)};
+      case 1:
+        return {node, makeEvent(OMX_EventCmdComplete, OMX_CommandStateSet, few)};
+      case 2:
+        return {node, makeEvent(OMX_EventCmdComplete, stress::draw(_random, 5), few)};
+      case 3:
+        return {node, makeEvent(OMX_EventPortSettingsChanged, 1, 0)};
+      case 4:
+      case 5:
+      case 6:
+        return {node, makeEmptyBufferDone(buffer)};
+      default:
+        return {node, makeFillBufferDone(buffer, few, chance(_random, 10) ? OMX_BUFFERFLAG_EOS : 0)};
+    }
+  }
+
+  ScriptedMediaServer& _server;
+  std::mutex _mutex;  // guards the three below
+  Random _random;
+  std::map<void*, std::vector<void*>> _victims;
+  std::map<void*, size_t> _held;  // by node
+  std::atomic<bool> _over{false};
+  std::thread _thread;
+};
+
+// How a session's life goes on after its traffic.
+enum class Ending { EndOfStream, Failure, DestroyedAtOnce, DestroyedInDeInit, DestroyedInEndOfInput };
+constexpr Ending kEndings[] = {
+    Ending::EndOfStream,     Ending::EndOfStream,       Ending::EndOfStream,          Ending::Failure,
+    Ending::DestroyedAtOnce, Ending::DestroyedInDeInit, Ending::DestroyedInEndOfInput};
+
+// One session after the other, of one kind, on a thread of its own.
+class Lane {
+ public:
+  Lane(ScriptedMediaServer& server, Mischief& mischief, bool encoding, unsigned seed)
+      : _server(server), _mischief(mischief), _encoding(encoding), _random(seed) {}
+
+  void run(unsigned sessions) {
+    for (unsigned number = 0; number < sessions; ++number) live(number);
+  }
+
+  std::string where() const {
+    std::string text = std::string(_encoding ? "encoder " : "decoder ") + std::to_string(_number) + ", " +
+                       _phase.load() + (_honest ? "" : ", pestered") + "\n";
+    if (OmxInterface* const session = _shown) text += describeState(*session);
+    return text;
+  }
+  unsigned steps() const { return _steps; }
+  size_t pictures() const { return _pictures; }
+  unsigned streamsEnded() const { return _streamsEnded; }
+
+ private:
+  void phase(const char* name) {
+    _phase = name;
+    ++_steps;
+  }
+
+  void live(unsigned number) {
+    _number = number;
+    _honest = number % 2 == 0;
+    _fed.clear();
+    _kept.clear();
+    _application = std::make_unique<Application>();
+    // What a component is said to have given back it may still be reading or writing.
+    if (!_honest) _application->leaveDataAlone();
+    _application->onOutput([this](const Output& output) { return take(output); });
+    if (!_honest) _application->onInput([this] { useSessionInCallback(); });
+    connect();
+    if (!_honest && chance(_random, 50)) pester();
+    phase("starting");
+    Later<int> starting("init()", [session = _session] { return session->init(); });
+    awaitBegun(starting, [](const SessionState& state) {
+      return state.outputThread.joinable || state.eventThread.joinable;
+    });
+    if (_honest && chance(_random, 90)) {
+      EXPECT_EQ(starting.result(), OMXI_OK) << where();
+      goOn();
+    } else {
+      // A pestered session may never get there.
+      pester();
+      if (eventually([&] { return starting.isDone(); }, std::chrono::milliseconds(draw(_random, 20)))) {
+        goOn();
+      } else {
+        destroy();
+      }
+      phase("collecting the init() of a destroyed session");
+      starting.result();
+    }
+  }
+
+  void goOn() {
+    pester();
+    traffic();
+    end();
+  }
+
+  // Until the call is under way: one that begins after the session's end is the application's fault.
+  template <typename Begun>
+  void awaitBegun(const Later<int>& call, Begun begun) {
+    requireEventually(
+        [&] {
+          if (call.isDone()) return true;
+          const SessionState::Lock held(_session->_state->lock);
+          return begun(*_session->_state);
+        },
+        "the beginning of a call");
+  }
+
+  void connect() {
+    phase("connecting");
+    if (_encoding) {
+      _session = new OmxInterface;
+      _session->_isEncoder = true;
+      ASSERT_EQ(_session->setupIOMXConnections(), OMXI_OK);
+    } else {
+      OmxInterfaceDecoder* decoder = nullptr;
+      ASSERT_EQ(OmxInterfaceDecoder::Create(&decoder, nullptr), OMXI_OK);
+      _session = decoder;
+    }
+    _node = _session->_node;
+    _shown = _session;
+    _application->attach(*_session);
+  }
+
+  void pester() {
+    if (_honest) return;
+    std::vector<void*> buffers;
+    {
+      const SessionState::Lock held(_session->_state->lock);
+      for (const auto& port : _session->_portBuffers) {
+        for (const BufferInfo& record : port) buffers.push_back(record.bufferId);
+      }
+    }
+    _mischief.pester(_node, std::move(buffers));
+  }
+
+  Script& script() { return _encoding ? _server.encoder() : _server.decoder(); }
+
+  // Applications feed from their callbacks, and record failures there. One in eight does: nobody is fed
+  // for ever.
+  void useSessionInCallback() {
+    const unsigned draw = _draws++ % 16;
+    if (draw == 0) static_cast<void>(_session->sendInputData(nullptr, 0, 0));
+    if (draw == 8) _session->returnIomxOutputBuffer(this);
+  }
+
+  int take(const Output& output) {
+    if (!_honest) useSessionInCallback();
+    // A decoder lets nobody keep a buffer; who gives one back all the same is out of step.
+    if (output.bufferId == nullptr || _draws++ % 4 != 0 || (_honest && !_encoding)) return 0;
+    const std::lock_guard<std::mutex> lock(_mutex);
+    _kept.push_back(output.bufferId);
+    return 1;
+  }
+
+  void giveKeptBack() {
+    std::vector<void*> kept;
+    {
+      const std::lock_guard<std::mutex> lock(_mutex);
+      kept.swap(_kept);
+    }
+    for (void* id : kept) _session->returnIomxOutputBuffer(id);
+  }
+
+  void traffic() {
+    phase("feeding");
+    std::vector<std::thread> feeders;
+    const unsigned count = 1 + draw(_random, 3);
+    for (unsigned feeder = 0; feeder < count; ++feeder) {
+      feeders.emplace_back([this, feeder, seed = static_cast<unsigned>(_random())] { feed(feeder, seed); });
+    }
+    if (!_encoding && chance(_random, 40)) {
+      script().announce(16 * (1 + draw(_random, 40)), 144);
+    }
+    if (!_honest && chance(_random, 10)) script().raiseError(OMX_ErrorHardware);
+    for (std::thread& feeder : feeders) feeder.join();
+  }
+
+  void feed(unsigned feeder, unsigned seed) {
+    Random random(seed);
+    const unsigned inputs = draw(random, 12);
+    for (unsigned input = 0; input < inputs; ++input) {
+      std::string text = std::to_string(_number) + "." + std::to_string(feeder) + "." + std::to_string(input);
+      if (!_honest) text.clear();
+      const auto length = static_cast<unsigned int>(text.size());
+      int result = -1;
+      if (chance(random, 50)) {
+        result = _session->sendInputData(text.data(), length, 0);
+      } else {
+        void* handle = nullptr;
+        void* data = nullptr;
+        result = _session->reserveInputBuffer(&handle, &data);
+        if (result == 0 && chance(random, 10)) {
+          _session->releaseInputBuffer(handle);
+          continue;
+        }
+        if (result == 0) {
+          if (length > 0) memcpy(data, text.data(), length);
+          result = _session->sendInputBuffer(handle, static_cast<int>(length), 0);
+        }
+      }
+      giveKeptBack();
+      if (_honest && result == -1) {
+        --input;  // no buffer was free
+        std::this_thread::yield();
+        continue;
+      }
+      EXPECT_TRUE(!_honest || result == 0) << result << " " << where();
+      if (!_honest && chance(random, 2)) _session->setThreadError(OMXI_ERR_APPLICATION);
+      const std::lock_guard<std::mutex> lock(_mutex);
+      if (_honest) _fed.insert(text);
+    }
+  }
+
+  void end() {
+    switch (kEndings[draw(_random, std::size(kEndings))]) {
+      case Ending::EndOfStream:
+        return endStream();
+      case Ending::Failure:
+        return fail();
+      case Ending::DestroyedInDeInit:
+        return destroyDuring(
+            "deInit()", [session = _session] { return session->deInit(); },
+            [](const SessionState& state) { return state.endOfOutputWaiters > 0 || state.tearingDown; });
+      case Ending::DestroyedInEndOfInput:
+        script().holdInput();
+        destroyDuring(
+            "sendEndOfInputFlag()", [session = _session] { return session->sendEndOfInputFlag(0); },
+            [this](const SessionState&) -> bool { return _session->_endOfInputPending; });
+        return script().passInput();
+      default:
+        return destroy();
+    }
+  }
+
+  // The application's proper way out: everything comes back, and then the end.
+  void endStream() {
+    if (!_honest || _session->_omxState != OMX_StateExecuting) return destroy();
+    phase("waiting for the pictures in flight");
+    requireEventually(
+        [this] {
+          giveKeptBack();
+          return _application->outputs().size() >= _fed.size() && _session->portBuffersHaveBeenReturned(0);
+        },
+        "the pictures in flight");
+    giveKeptBack();
+    phase("ending the stream");
+    EXPECT_EQ(_session->sendEndOfInputFlag(0), 0) << where();
+    phase("deInit");
+    EXPECT_EQ(_session->deInit(), OMXI_OK) << where();
+    std::multiset<std::string> delivered;
+    for (const std::string& text : _application->outputTexts()) {
+      if (!text.empty()) delivered.insert(text);
+    }
+    EXPECT_EQ(delivered, _fed);
+    ++_streamsEnded;
+    destroy();
+  }
+
+  void fail() {
+    if (!_honest || _session->_omxState != OMX_StateExecuting) return destroy();
+    phase("failing");
+    _session->setThreadError(OMXI_ERR_APPLICATION);
+    EXPECT_EQ(_session->deInit(), OMXI_ERR_APPLICATION) << where();
+    destroy();
+  }
+
+  template <typename Begun>
+  void destroyDuring(const char* what, std::function<int()> call, Begun begun) {
+    phase(what);
+    Later<int> later(what, std::move(call));
+    awaitBegun(later, begun);
+    destroy();
+    phase("collecting the call of a destroyed session");
+    later.result();
+  }
+
+  void destroy() {
+    phase("destroying");
+    if (chance(_random, 30)) _mischief.leaveAlone(_node);  // else to the last moment
+    _shown = nullptr;
+    if (chance(_random, 50)) {
+      Later<bool>("destruction", [session = _session] {
+        delete session;
+        return true;
+      }).result();
+    } else {
+      delete _session;
+    }
+    _mischief.leaveAlone(_node);
+    _pictures += _application->outputs().size();
+  }
+
+  ScriptedMediaServer& _server;
+  Mischief& _mischief;
+  const bool _encoding;
+  Random _random;
+
+  OmxInterface* _session = nullptr;
+  void* _node = nullptr;
+  std::unique_ptr<Application> _application;
+  std::mutex _mutex;  // guards the two below
+  std::vector<void*> _kept;
+  std::multiset<std::string> _fed;
+  std::atomic<unsigned> _draws{0};
+
+  size_t _pictures = 0;
+  unsigned _streamsEnded = 0;
+
+  // For the watchdog.
+  std::atomic<unsigned> _number{0};
+  std::atomic<unsigned> _steps{0};
+  std::atomic<bool> _honest{true};
+  std::atomic<const char*> _phase{"beginning"};
+  std::atomic<OmxInterface*> _shown{nullptr};
+};
+
+TEST(StressTest, SessionsStandEveryOrderOfEvents) {
+  const unsigned seed = setting("OMXBRIDGE_STRESS_SEED", std::random_device()());
+  const unsigned sessions = setting("OMXBRIDGE_STRESS_SESSIONS", 1000);
+  printf("OMXBRIDGE_STRESS_SEED=%u\n", seed);
+  fflush(stdout);
+  RecordProperty("seed", std::to_string(seed));
+  const omxhost::LogCapture log;  // thousands of lines that nobody reads
+  ScriptedMediaServer server("msm8960");
+  {
+    Mischief mischief(server, seed);
+    Lane encoders(server, mischief, true, seed + 1);
+    Lane decoders(server, mischief, false, seed + 2);
+    const auto report = [&] {
+      fprintf(stderr, "seed %u\n%s%s", seed, encoders.where().c_str(), decoders.where().c_str());
+    };
+    hangReport() = report;
+
+    std::mutex mutex;
+    std::condition_variable ended;
+    bool over = false;
+    std::thread watchdog([&] {
+      std::unique_lock<std::mutex> lock(mutex);
+      unsigned seen = 0;
+      do {
+        const unsigned steps = encoders.steps() + decoders.steps();
+        if (seen > 0 && steps == seen) endHungTest("the next step of a session");
+        seen = steps;
+      } while (!ended.wait_for(lock, kWaitLimit, [&] { return over; }));
+    });
+    std::thread encoderThread([&] { encoders.run(sessions / 2); });
+    decoders.run(sessions / 2);
+    encoderThread.join();
+    {
+      const std::lock_guard<std::mutex> lock(mutex);
+      over = true;
+    }
+    ended.notify_all();
+    watchdog.join();
+    hangReport() = nullptr;
+    // Else it was no stress.
+    for (const Lane* lane : {&encoders, &decoders}) {
+      printf("%zu pictures, %u streams to their end\n", lane->pictures(), lane->streamsEnded());
+      EXPECT_GT(lane->pictures(), sessions);
+      EXPECT_GT(lane->streamsEnded(), sessions / 20);
+    }
+  }
+  EXPECT_EQ(server.omx().outstandingNodes(), 0u);
+  EXPECT_EQ(server.omx().outstandingBuffers(), 0u);
+}
+
+}  // namespace
+}  // namespace omxtest::stress

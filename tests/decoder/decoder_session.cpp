@@ -1,0 +1,93 @@
+#include "tests/decoder/decoder_session.h"
+
+#include <string.h>
+
+namespace omxtest {
+
+Words words(const std::vector<uint8_t>& bytes) {
+  Words result(bytes.size() / sizeof(OMX_U32));
+  if (!result.empty()) memcpy(result.data(), bytes.data(), result.size() * sizeof(OMX_U32));
+  return result;
+}
+
+// Here already: the session's threads deliver into what is gone in the base's destructor.
+DecoderSessionTest::~DecoderSessionTest() {
+  for (Gate& gate : _gates) gate.open();
+  if (_session != nullptr) destroy();
+}
+
+void DecoderSessionTest::create(const char* componentName) {
+  OmxInterfaceDecoder* created = nullptr;
+  ASSERT_EQ(OmxInterfaceDecoder::Create(&created, componentName), OMXI_OK);
+  _session.reset(created);
+  _application.attach(*_session);
+  _application.onOutput([this](const Output& output) {
+    const std::lock_guard<std::mutex> lock(_pictureMutex);
+    _pictures.push_back({output, *static_cast<const DECODEDDATAINFO*>(output.first)});
+    return _answer;
+  });
+}
+
+void DecoderSessionTest::startDecoder() {
+  const Match executing = commandComplete(OMX_CommandStateSet, OMX_StateExecuting);
+  const size_t before = messages().deliveredCount(executing);
+  ASSERT_NO_FATAL_FAILURE(create());
+  ASSERT_EQ(init(), OMXI_OK);
+  // init() comes back in the middle of that message.
+  require(messages().waitForDelivered(executing, before + 1), "the delivery of Executing");
+  waitForEvents();
+}
+
+void DecoderSessionTest::finishStream(int timestamp) {
+  const size_t before = messages().deliveredCount(eventIs(OMX_EventBufferFlag));
+  ASSERT_NO_FATAL_FAILURE(endOfStream(timestamp));
+  require(messages().waitForDelivered(eventIs(OMX_EventBufferFlag), before + 1), "the end mark's event");
+  waitForEvents();
+}
+
+void DecoderSessionTest::handleEvent(OMX_EVENTTYPE event, OMX_U32 data1, OMX_U32 data2) {
+  deliverEvent(event, data1, data2);
+  waitForEvents();
+}
+
+void DecoderSessionTest::waitForEvents() {
+  const auto idle = [this] {
+    const SessionState::Lock held(_session->_state->lock);
+    if (!_session->_state->eventThread.running) return true;
+    SimpleQueue& queue = *decoder()._queueThreadMessages;
+    queue.lock();
+    const bool empty = queue.isEmpty();
+    queue.unlock();
+    return empty && !_session->_state->handlingEvent;
+  };
+  requireEventually(idle, "the end of the event thread's work");
+}
+
+void DecoderSessionTest::waitForFills(size_t count) {
+  require(omx().waitForCalls(Method::FillBuffer, count), "a buffer given to the component");
+}
+
+void DecoderSessionTest::waitForPictures(size_t count) {
+  requireEventually([&] { return pictures().size() >= count; }, "a picture");
+}
+
+std::vector<Picture> DecoderSessionTest::pictures() const {
+  const std::lock_guard<std::mutex> lock(_pictureMutex);
+  return _pictures;
+}
+
+void DecoderSessionTest::answerOutputs(int result) {
+  const std::lock_guard<std::mutex> lock(_pictureMutex);
+  _answer = result;
+}
+
+LogLines DecoderSessionTest::sortedLog() const {
+  return sorted(log());
+}
+
+LogLines DecoderSessionTest::sorted(LogLines lines) {
+  std::sort(lines.begin(), lines.end());
+  return lines;
+}
+
+}  // namespace omxtest

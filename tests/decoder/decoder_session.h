@@ -1,0 +1,69 @@
+// The session fixture with a decoder in it: made by Create() on a posed device, its pictures collected with
+// their descriptions, and ways to know that the event thread has done its work.
+#pragma once
+
+#include <algorithm>
+#include <mutex>
+#include <vector>
+
+#include <media/IOMX.h>
+
+#include "decoder/omx_interface_decoder.h"
+#include "tests/core/session_fixture.h"
+
+namespace omxtest {
+
+inline constexpr const char* kDecoderOver = "W OMXINTERFACE - ===DataOutputThread over! dec thread!\n";
+
+// How a decoder takes the event that comes with the end of output.
+inline constexpr const char* kEndEvent = "E Unknown Event (4, 1, 1)";
+
+// Words of a record.
+using Words = std::vector<OMX_U32>;
+Words words(const std::vector<uint8_t>& bytes);
+
+// A picture as the application got it; the description is of the time of the callback.
+struct Picture {
+  Output output;
+  DECODEDDATAINFO info;
+};
+
+class DecoderSessionTest : public SessionTest {
+ protected:
+  static constexpr size_t kInputBuffers = 4;  // of the scripted decoder
+  static constexpr size_t kOutputBuffers = 8;
+  static constexpr OMX_U32 kPictureBytes = 176 * 144 * 3 / 2;
+
+  explicit DecoderSessionTest(const char* device = "msm8960") : SessionTest(device) { _kind = Kind::Decoder; }
+  ~DecoderSessionTest() override;
+
+  void create(const char* componentName = nullptr);
+  // ... and brings it to Executing, until nothing goes on any more.
+  void startDecoder();
+  OmxInterfaceDecoder& decoder() { return static_cast<OmxInterfaceDecoder&>(*_session); }
+
+  // endOfStream(), until its event has been handled too.
+  void finishStream(int timestamp = 0);
+
+  // Sends an event of the test's making, and waits until the event thread has handled it.
+  void handleEvent(OMX_EVENTTYPE event, OMX_U32 data1, OMX_U32 data2);
+  // Until the event thread has nothing to do, or has ended.
+  void waitForEvents();
+  // Until `count` fillBuffer calls have returned since the test began.
+  void waitForFills(size_t count);
+  // Until that many pictures have been delivered.
+  void waitForPictures(size_t count);
+  std::vector<Picture> pictures() const;
+  // What the application's output callback answers.
+  void answerOutputs(int result);
+  // The log without regard to its order: lines of different threads.
+  LogLines sortedLog() const;
+  static LogLines sorted(LogLines lines);
+
+ private:
+  mutable std::mutex _pictureMutex;
+  std::vector<Picture> _pictures;
+  int _answer = 0;
+};
+
+}  // namespace omxtest

@@ -1,0 +1,154 @@
+#include <gtest/gtest.h>
+
+#include <memory>
+
+#include "omxbridge/frames/scale.h"
+#include "tests/frames/harness.h"
+
+namespace frames_test {
+namespace {
+
+using namespace webrtc;
+
+void expectScaled(Content& content, Size from, Size to) {
+  SCOPED_TRACE(text(from) + " to " + text(to));
+  const Bytes src = content.bytes(reference::i420Bytes(from));
+  const std::vector<int> expected = reference::bilinear(src, from, to);
+  const Bytes dst = content.bytes(expected.size() + content.number(0, 1) * 16);
+  const std::size_t written = to.area() + std::size_t{to.width / 2} * (to.height / 2) * 2;
+  std::vector<Bytes> outputs;
+  onEveryTarget([&] {
+    ExactBuffer source(src, 0);
+    ExactBuffer target(dst, 0);
+    unsigned char* destination = target.data();
+    auto size = static_cast<unsigned>(dst.size());
+    EXPECT_EQ(ScaleBilinear(source.data(), destination, from.width, from.height, to.width, to.height, size),
+              static_cast<int>(to.height));
+    EXPECT_EQ(destination, target.data());
+    EXPECT_EQ(size, dst.size());
+    source.expect(src);
+    Bytes output(dst.size());
+    for (std::size_t i = 0; i < dst.size(); ++i) {
+      output[i] = destination[i];
+      if (i >= written) {
+        ASSERT_EQ(output[i], dst[i]) << i;
+      } else if (expected[i] >= 0) {
+        ASSERT_EQ(output[i], expected[i]) << i;
+      }
+    }
+    // Bytes that nobody wrote are nobody's business, but they are the same everywhere.
+    outputs.push_back(output);
+    EXPECT_EQ(output, outputs.front());
+  });
+}
+
+TEST(ScaleBilinearArithmetic, EqualsReferenceForEveryWidth) {
+  Content content(41);
+  forEachSize([&](Size from) {
+    expectScaled(content, from, {content.number(1, 2 * from.width), content.number(1, 2 * from.height)});
+    expectScaled(content, from, {content.number(1, from.width + 1), from.height});
+    expectScaled(content, from, {from.width, content.number(1, 3 * from.height)});
+  });
+  for (unsigned width = 1; width <= 200 && !HasFailure(); ++width) {
+    expectScaled(content, {width % 5 * 32 + 32, width % 6 + 1}, {width, width % 9 + 1});
+    expectScaled(content, {content.number(1, 200), content.number(1, 9)}, {width, 4});
+  }
+}
+
+TEST(ScaleBilinearArithmetic, EqualsReferenceForNotedRatios) {
+  Content content(42);
+  const Size sizes[] = {{64, 36}, {32, 18}, {40, 30}, {22, 18}, {128, 72},
+                        {100, 3}, {352, 8}, {1, 1},   {33, 33}};
+  for (const Size from : sizes) {
+    for (const Size to : sizes) {
+      if (!HasFailure()) expectScaled(content, from, to);
+    }
+  }
+}
+
+TEST(ScaleBilinearArithmetic, FlatValuesLoseOneWhereTheWidthChanges) {
+  const std::vector<std::uint8_t> src(64 * 32 * 3 / 2, 255);
+  std::uint8_t* destination = nullptr;
+  unsigned size = 0;
+  ASSERT_EQ(ScaleBilinear(src.data(), destination, 64, 32, 48, 32, size), 32);
+  const std::unique_ptr<std::uint8_t[]> owner(destination);
+  EXPECT_TRUE(std::all_of(destination, destination + size, [](std::uint8_t b) { return b == 254; }));
+}
+
+TEST(ScaleBilinearMemory, ReplacesADestinationThatIsTooSmall) {
+  Content content(43);
+  const Size from{48, 20}, to{31, 33};
+  const Bytes src = content.bytes(reference::i420Bytes(from));
+  const std::size_t needed = reference::i420Bytes(to);
+  for (const bool null : {true, false}) {
+    unsigned char* destination = null ? nullptr : new unsigned char[needed - 1];
+    unsigned size = null ? 1u << 20 : static_cast<unsigned>(needed) - 1;
+    EXPECT_EQ(ScaleBilinear(src.data(), destination, from.width, from.height, to.width, to.height, size), 33);
+    EXPECT_EQ(size, needed);
+    const std::unique_ptr<unsigned char[]> owner(destination);
+    // 31 x 33 and two planes of 15 x 16 leave bytes at the end.
+    for (std::size_t i = to.area() + 2 * 15 * 16; i < needed; ++i) EXPECT_EQ(destination[i], 0);
+  }
+}
+
+TEST(ScaleBilinearMemory, TakesTheSourceAsDestination) {
+  Content content(44);
+  const Size from{64, 32};
+  for (const Size to : {Size{32, 16}, Size{64, 32}, Size{96, 64}}) {
+    const Bytes src = content.bytes(reference::i420Bytes(from));
+    unsigned char* separate = nullptr;
+    unsigned separateSize = 0;
+    ScaleBilinear(src.data(), separate, from.width, from.height, to.width, to.height, separateSize);
+    const std::unique_ptr<unsigned char[]> expected(separate);
+
+    auto* memory = new unsigned char[src.size()];
+    std::copy_n(src.data(), src.size(), memory);
+    auto size = static_cast<unsigned>(src.size());
+    ScaleBilinear(memory, memory, from.width, from.height, to.width, to.height, size);
+    const std::unique_ptr<unsigned char[]> owner(memory);
+    EXPECT_TRUE(std::equal(separate, separate + separateSize, memory)) << text(to);
+  }
+}
+
+TEST(ScaleBilinearMemory, RefusesSizesWithoutTouchingAnything) {
+  std::uint8_t src[6] = {};
+  unsigned char* destination = nullptr;
+  unsigned size = 3;
+  const unsigned refused[][4] = {{0, 2, 2, 2},     {2, 0, 2, 2},     {2, 2, 0, 2},        {2, 2, 2, 0},
+                                 {65536, 2, 2, 2}, {2, 2, 65536, 1}, {2, 2, 65535, 65535}};
+  for (const auto& s : refused) EXPECT_EQ(ScaleBilinear(src, destination, s[0], s[1], s[2], s[3], size), -1);
+  EXPECT_EQ(destination, nullptr);
+  EXPECT_EQ(size, 3u);
+}
+
+TEST(Interpolator, TakesOnlyPairsThatItDoesNotSupport) {
+  interpolator scaler;
+  const auto unknown = static_cast<interpolatorType>(1);
+  EXPECT_EQ(scaler.Method(kBilinear), 1);
+  EXPECT_EQ(scaler.Method(unknown), 0);
+  EXPECT_EQ(scaler.SupportedVideoType(kI420, kI420), 0);
+  EXPECT_EQ(scaler.SupportedVideoType(kI420Alt, kI420Alt), 0);
+  EXPECT_EQ(scaler.SupportedVideoType(kYV12, kYV12), 0);
+  EXPECT_EQ(scaler.SupportedVideoType(kRGB24, kRGB24), -1);
+  EXPECT_EQ(scaler.SupportedVideoType(kI420, kYV12), -1);
+
+  std::uint8_t src[6] = {10, 20, 30, 40, 50, 60}, memory[6];
+  unsigned char* destination = memory;
+  unsigned size = 6;
+  EXPECT_EQ(scaler.Interpolate(nullptr, destination, size), -1);
+  EXPECT_EQ(scaler.Interpolate(src, destination, size), -2);
+  EXPECT_EQ(scaler.Set(2, 2, 2, 2, kRGB24, kARGB, kBilinear), 0);
+  EXPECT_EQ(scaler.Interpolate(src, destination, size), 2);
+  // Each way of being refused ends the configuration before.
+  const auto refuse = [&](unsigned width, VideoType type, interpolatorType method) {
+    ASSERT_EQ(scaler.Set(2, 2, 2, 2, kRGB24, kARGB, kBilinear), 0);
+    EXPECT_EQ(scaler.Set(2, 2, width, 2, type, type, method), -1);
+    EXPECT_EQ(scaler.Interpolate(src, destination, size), -2);
+  };
+  refuse(2, kI420, kBilinear);
+  refuse(0, kRGB24, kBilinear);
+  refuse(2, kRGB24, unknown);
+}
+
+}  // namespace
+}  // namespace frames_test

@@ -1,0 +1,151 @@
+#include "omxbridge/frames/pad.h"
+
+#include <gtest/gtest.h>
+
+#include "tests/frames/harness.h"
+
+namespace frames_test {
+namespace {
+
+using namespace webrtc;
+
+TEST(PadFrame, EqualsReferenceForEverySizeAndMargin) {
+  Content content(51);
+  forEachSize([&](Size from) {
+    Size to{from.width + content.number(0, 70), from.height + content.number(0, 70)};
+    if (content.number(0, 2) == 0) to = {from.width + 16 * content.number(0, 4), from.height + 16};
+    if (to.width == from.width && to.height == from.height) ++to.height;
+    SCOPED_TRACE(text(from) + " to " + text(to));
+    const Bytes src = content.bytes(reference::i420Bytes(from)),
+                dst = content.bytes(reference::i420Bytes(to));
+    Bytes expected = dst;
+    reference::pad(src, from, expected, to);
+    const unsigned columns = from.width / 2 + (to.width - from.width) / 2;
+    const unsigned rows = from.height / 2 + (to.height - from.height) / 2;
+    expectConversion(
+        [&](auto* in, auto* out) {
+          return PadI420Frame(in, out, from.width, from.height, to.width, to.height);
+        },
+        src, dst, expected, static_cast<int>(to.area() + 2 * columns * rows));
+  });
+}
+
+TEST(PadFrame, ChecksInOrder) {
+  std::uint8_t byte[1] = {};
+  EXPECT_EQ(PadI420Frame(byte, byte, 0, 2, 2, 2), -1);
+  EXPECT_EQ(PadI420Frame(nullptr, nullptr, 2, 2, 0, 2), -1);
+  EXPECT_EQ(PadI420Frame(nullptr, nullptr, 320, 240, 320, 240), 115200);
+  EXPECT_EQ(PadI420Frame(nullptr, byte, 2, 2, 4, 4), -1);
+  EXPECT_EQ(PadI420Frame(byte, nullptr, 2, 2, 4, 4), -1);
+  EXPECT_EQ(PadI420Frame(byte, byte, 4, 2, 2, 4), -1);
+  EXPECT_EQ(PadI420Frame(byte, byte, 2, 4, 4, 2), -1);
+  EXPECT_EQ(PadI420Frame(byte, byte, 2, 2, 0x10000, 0x10000), -1);
+  EXPECT_EQ(PadI420Frame(nullptr, nullptr, 0x10000, 0x10000, 0x10000, 0x10000), -1);
+}
+
+TEST(PadFrame, FixedSizes) {
+  Content content(52);
+  const auto expectFixed = [&](Size from, Size to, unsigned cropRows, unsigned left, unsigned top,
+                               auto&& adjust) {
+    const Bytes src = content.bytes(reference::i420Bytes(from)),
+                dst = content.bytes(reference::i420Bytes(to));
+    Bytes expected = dst;
+    std::size_t at = 0;
+    const auto plane = [&](std::size_t start, unsigned unit, std::uint8_t fill) {
+      const Size picture{from.width / unit, (from.height - 2 * cropRows) / unit};
+      reference::padPlane(src, start + cropRows / unit * picture.width, picture,
+                          (to.width - from.width) / unit, left / unit, to.height / unit - picture.height,
+                          top / unit, fill, expected, at);
+    };
+    plane(0, 1, 0);
+    plane(from.area(), 2, 127);
+    plane(from.area() * 5 / 4, 2, 127);
+    adjust(dst, expected);
+    expectConversion(
+        [&](auto* in, auto* out) { return PadI420Frame(static_cast<unsigned>(src.size()), in, out, true); },
+        src, dst, expected, static_cast<int>(dst.size()));
+  };
+  expectFixed({320, 240}, {352, 288}, 0, 16, 16, [](const Bytes& before, Bytes& after) {
+    for (std::size_t i = 352 * 288 * 5 / 4 + 1412; i < 352 * 288 * 5 / 4 + 1416; ++i) after[i] = before[i];
+  });
+  expectFixed({160, 120}, {176, 144}, 4, 0, 16, [](const Bytes&, Bytes&) {});
+  EXPECT_EQ(PadI420Frame(115200, nullptr, nullptr, false), -1);
+  EXPECT_EQ(PadI420Frame(115201, nullptr, nullptr, true), -1);
+  EXPECT_EQ(PadI420Frame(0, nullptr, nullptr, true), -1);
+}
+
+// The frame is read back from where its planes must be afterwards.
+TEST(PadBottomRows, MovesChromaAndFillsInPlace) {
+  Content content(53);
+  for (unsigned k = 0; k < 400 && !HasFailure(); ++k) {
+    const Size s{content.number(1, 40), content.number(1, 40)};
+    const unsigned added = content.number(0, 40), newArea = s.width * (s.height + added);
+    const std::size_t q = s.area() / 4, extra = s.width * added;
+    SCOPED_TRACE(text(s) + " and " + std::to_string(added));
+    const std::size_t reach = newArea + newArea / 4 + q + extra / 4;
+    const unsigned newSize = (s.height + added) * (s.width / 2 * 3);
+    const auto capacity = static_cast<unsigned>(std::max<std::size_t>({reach, newSize, s.area() * 3 / 2}));
+    const Bytes frame = content.bytes(capacity);
+    Bytes expected = frame;
+    for (std::size_t i = 0; i < q + extra / 4; ++i) {
+      expected[newArea + newArea / 4 + i] = i < q ? frame[s.area() + q + i] : 127;
+    }
+    for (std::size_t i = 0; i < q + extra / 4; ++i) expected[newArea + i] = i < q ? frame[s.area() + i] : 127;
+    for (std::size_t i = s.area(); i < newArea; ++i) expected[i] = 0;
+    unsigned outSize = 0;
+    const auto add = [&](unsigned char* buffer) {
+      outSize = 99;
+      return PadI420BottomRows(buffer, capacity, s.width, s.height, static_cast<int>(added), outSize);
+    };
+    expectInPlace(add, frame, expected, 0);
+    EXPECT_EQ(outSize, newSize);
+    // One byte less than what it has to write, and it does nothing.
+    const auto least = static_cast<unsigned>(std::max<std::size_t>(reach, newSize));
+    outSize = 99;
+    EXPECT_EQ(PadI420BottomRows(nullptr, least - 1, s.width, s.height, static_cast<int>(added), outSize), -1);
+    EXPECT_EQ(outSize, 99u);
+  }
+  unsigned outSize = 99;
+  EXPECT_EQ(PadI420BottomRows(nullptr, 1000, 4, 4, -1, outSize), -1);
+  EXPECT_EQ(PadI420BottomRows(nullptr, 1000, 0x80000000, 2, 0, outSize), -1);
+  EXPECT_EQ(PadI420BottomRows(nullptr, 1000, 0xFFFFFFFF, 0xFFFFFFFF, 0x7FFFFFFF, outSize), -1);
+  EXPECT_EQ(outSize, 99u);
+}
+
+TEST(PadBottomRows, SmallFrame) {
+  std::uint8_t buffer[36];
+  for (std::uint8_t i = 0; i < 36; ++i) buffer[i] = i;
+  unsigned outSize = 0;
+  ASSERT_EQ(PadI420BottomRows(buffer, 36, 4, 4, 2, outSize), 0);
+  EXPECT_EQ(outSize, 36u);
+  const std::uint8_t behind[] = {0, 0, 0, 0, 0, 0, 0, 0, 16, 17, 18, 19, 127, 127, 20, 21, 22, 23, 127, 127};
+  EXPECT_TRUE(std::equal(buffer + 16, buffer + 36, behind));
+  EXPECT_EQ(buffer[15], 15);
+}
+
+TEST(CutFrame, EqualsReferenceForEverySize) {
+  Content content(54);
+  forEachSize([&](Size from) {
+    const Size to{content.number(1, from.width), content.number(1, from.height)};
+    SCOPED_TRACE(text(from) + " to " + text(to));
+    const Bytes frame = content.bytes(reference::i420Bytes(from));
+    Bytes expected = frame;
+    const bool same = from.width == to.width && from.height == to.height;
+    if (!same) reference::cut(expected, from, to);
+    const unsigned result = same ? to.width * to.height * 3 / 2 : to.width / 2 * to.height * 3;
+    expectInPlace(
+        [&](auto* memory) { return CutI420Frame(memory, from.width, from.height, to.width, to.height); },
+        frame, expected, static_cast<int>(result));
+  });
+}
+
+TEST(CutFrame, RefusesWhatIsNoCut) {
+  EXPECT_EQ(CutI420Frame(nullptr, 0, 2, 2, 2), -1);
+  EXPECT_EQ(CutI420Frame(nullptr, 2, 2, 2, 0), -1);
+  EXPECT_EQ(CutI420Frame(nullptr, 4, 4, 6, 2), -1);
+  EXPECT_EQ(CutI420Frame(nullptr, 4, 4, 2, 6), -1);
+  EXPECT_EQ(CutI420Frame(nullptr, 0x10001, 0x10000, 0x10000, 0x10000), -1);
+}
+
+}  // namespace
+}  // namespace frames_test

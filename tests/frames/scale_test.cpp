@@ -1,0 +1,177 @@
+#include "omxbridge/frames/scale.h"
+
+#include <gtest/gtest.h>
+
+#include "tests/frames/harness.h"
+
+namespace frames_test {
+namespace {
+
+using namespace webrtc;
+
+struct InPlaceScaler {
+  const char* name;
+  int (*call)(unsigned width, unsigned height, unsigned char* buffer);
+  void (*reference)(Bytes& buffer, Size s);
+  int (*result)(Size s);
+};
+
+int halfRows(Size s) {
+  return static_cast<int>(s.width / 2 * s.height * 3);
+}
+
+const InPlaceScaler kInPlace[] = {
+    {"UpHalf", ScaleI420UpHalfFrame, reference::upHalf,
+     [](Size s) { return static_cast<int>(reference::i420Bytes(s)); }},
+    {"DownHalf", ScaleI420DownHalfFrame, reference::downHalf, halfRows},
+    {"Quarter", ScaleI420FrameQuarter, reference::quarter, halfRows},
+};
+
+class ScaleInPlace : public testing::TestWithParam<InPlaceScaler> {};
+INSTANTIATE_TEST_SUITE_P(Functions, ScaleInPlace, testing::ValuesIn(kInPlace),
+                         [](const auto& test) { return std::string(test.param.name); });
+
+TEST_P(ScaleInPlace, EqualsReferenceForEverySize) {
+  const InPlaceScaler& function = GetParam();
+  Content content(31);
+  forEachSize([&](Size s) {
+    SCOPED_TRACE(text(s));
+    const Bytes buffer = content.bytes(reference::i420Bytes(s));
+    Bytes expected = buffer;
+    function.reference(expected, s);
+    expectInPlace([&](auto* memory) { return function.call(s.width, s.height, memory); }, buffer, expected,
+                  function.result(s));
+  });
+  EXPECT_EQ(function.call(0, 2, nullptr), -1);
+  EXPECT_EQ(function.call(2, 0, nullptr), -1);
+  EXPECT_EQ(function.call(0xFFFFFFFF, 0xFFFFFFFF, nullptr), -1);
+}
+
+TEST(ScaleUpHalf, DoublesFromTheBytesInFront) {
+  std::uint8_t buffer[12] = {10, 20, 30, 40, 50, 60};
+  const std::uint8_t expected[12] = {10, 10, 15, 20, 25, 30, 35, 40, 45, 50, 55, 60};
+  EXPECT_EQ(ScaleI420UpHalfFrame(4, 2, buffer), 12);
+  EXPECT_TRUE(std::equal(buffer, buffer + 12, expected));
+}
+
+// --- Scalers that may grow the buffer ---
+
+struct Growing {
+  const char* name;
+  int (*call)(unsigned, unsigned, unsigned char*&, unsigned, unsigned&, unsigned&);
+  bool (*accepts)(Size s);
+  Bytes (*reference)(const Bytes& src, Size s, Size& out);
+};
+
+template <unsigned kGroup>
+Bytes enlarged(const Bytes& src, Size s, Size& out) {
+  out = {s.width / kGroup * (kGroup + 1), s.height / kGroup * (kGroup + 1)};
+  return reference::enlarge(kGroup, src, s);
+}
+
+const Growing kGrowing[] = {
+    {"Down1_3", ScaleI420Down1_3,
+     [](Size s) {
+       return s.width > 5 && s.height > 5 && s.width % 2 == 0 && s.height % 2 == 0 && s.height / 3 % 2 == 0;
+     },
+     reference::third},
+    {"Up3_2", ScaleI420Up3_2, [](Size s) { return s.width % 4 == 0 && s.height % 4 == 0; }, enlarged<2>},
+    {"Up2", ScaleI420Up2, [](Size s) { return s.width % 2 == 0 && s.height % 2 == 0; }, enlarged<1>},
+};
+
+// A buffer from new[], as the functions want it.
+struct Owned {
+  explicit Owned(const Bytes& bytes) : memory(new unsigned char[bytes.size()]) {
+    std::copy_n(bytes.data(), bytes.size(), memory);
+  }
+  ~Owned() { delete[] memory; }
+  Owned(const Owned&) = delete;
+  Owned& operator=(const Owned&) = delete;
+  unsigned char* memory;
+};
+
+class ScaleGrowing : public testing::TestWithParam<Growing> {
+ protected:
+  // capacity: what the buffer has, at least the source frame.
+  void expectScaled(const Bytes& src, Size s, std::size_t capacity) {
+    const Growing& function = GetParam();
+    SCOPED_TRACE(text(s) + " in " + std::to_string(capacity));
+    Size out{};
+    const Bytes expected = function.reference(src, s, out);
+    Bytes initial(capacity);
+    for (std::size_t i = 0; i < capacity; ++i) initial[i] = i < src.size() ? src[i] : 0x5A;
+    onEveryTarget([&] {
+      Owned buffer(initial);
+      unsigned char* const before = buffer.memory;
+      Size given{};
+      EXPECT_EQ(function.call(s.width, s.height, buffer.memory, static_cast<unsigned>(capacity), given.width,
+                              given.height),
+                static_cast<int>(expected.size()));
+      EXPECT_EQ(text(given), text(out));
+      EXPECT_EQ(buffer.memory == before, expected.size() <= capacity);
+      EXPECT_TRUE(std::equal(expected.data(), expected.data() + expected.size(), buffer.memory));
+      if (expected.size() >= capacity || expected.size() < src.size()) return;
+      EXPECT_TRUE(std::all_of(buffer.memory + expected.size(), buffer.memory + capacity,
+                              [](unsigned char b) { return b == 0x5A; }));
+    });
+  }
+};
+INSTANTIATE_TEST_SUITE_P(Functions, ScaleGrowing, testing::ValuesIn(kGrowing),
+                         [](const auto& test) { return std::string(test.param.name); });
+
+TEST_P(ScaleGrowing, EqualsReferenceAndGrowsWhereItMust) {
+  Content content(32);
+  unsigned scaled = 0;
+  forEachSize([&](Size any) {
+    const Size s{any.width * 2, any.height * 2};
+    if (!GetParam().accepts(s)) return;
+    const Bytes src = content.bytes(reference::i420Bytes(s));
+    expectScaled(src, s, src.size());
+    expectScaled(src, s, src.size() * 4 + 100);
+    ++scaled;
+  });
+  EXPECT_GT(scaled, 50u);
+}
+
+TEST_P(ScaleGrowing, RefusesWithoutTouchingAnything) {
+  const Growing& function = GetParam();
+  Content content(33);
+  for (unsigned k = 0; k < 20 * 20; ++k) {
+    const Size s{k % 20, k / 20};
+    const bool tooSmall = function.accepts(s) && s.area() != 0;
+    const Bytes src = content.bytes(1000);
+    Owned buffer(src);
+    unsigned char* const before = buffer.memory;
+    unsigned width = 7, height = 8;
+    if (!tooSmall) {
+      EXPECT_EQ(function.call(s.width, s.height, buffer.memory, 1000, width, height), -1) << text(s);
+    }
+    const auto size = static_cast<unsigned>(reference::i420Bytes(s));
+    EXPECT_EQ(function.call(s.width, s.height, buffer.memory, size - (size != 0 ? 1 : 0), width, height), -1);
+    EXPECT_EQ(buffer.memory, before);
+    EXPECT_EQ(width, 7u);
+    EXPECT_EQ(height, 8u);
+    EXPECT_TRUE(std::equal(src.data(), src.data() + src.size(), buffer.memory));
+  }
+  unsigned char* none = nullptr;
+  unsigned width = 0, height = 0;
+  EXPECT_EQ(function.call(48, 48, none, 1 << 20, width, height), -1);
+  EXPECT_EQ(function.call(0x80000000, 0x80000000, none, 0xFFFFFFFF, width, height), -1);
+}
+
+TEST(ScaleDown1_3, SizesThatItTakes) {
+  const struct {
+    unsigned width, height, outWidth, outHeight;  // 0: refused
+  } cases[] = {{176, 144, 58, 48}, {178, 150, 60, 50}, {176, 22, 0, 0}, {176, 147, 0, 0}, {4, 12, 0, 0}};
+  for (const auto& c : cases) {
+    Owned buffer(Bytes(50000));
+    unsigned width = 0, height = 0;
+    const int result = ScaleI420Down1_3(c.width, c.height, buffer.memory, 50000, width, height);
+    EXPECT_EQ(result, c.outWidth == 0 ? -1 : static_cast<int>(c.outHeight * 3 * (c.outWidth / 2)));
+    EXPECT_EQ(width, c.outWidth);
+    EXPECT_EQ(height, c.outHeight);
+  }
+}
+
+}  // namespace
+}  // namespace frames_test

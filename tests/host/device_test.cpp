@@ -1,0 +1,143 @@
+#include <gtest/gtest.h>
+#include <stdlib.h>
+
+#include <array>
+#include <set>
+#include <string>
+#include <thread>
+#include <vector>
+
+#include <cutils/properties.h>
+#include <omxhost/device.h>
+
+#include "tests/host/new_process.h"
+
+namespace {
+
+std::string platform() {
+  std::array<char, PROPERTY_VALUE_MAX> value{};
+  property_get("ro.board.platform", value.data(), "");
+  return value.data();
+}
+
+// What a reader of the file gets, "missing" where there is none.
+std::string buildId(size_t count = 4) {
+  std::string bytes(count, '#');
+  const int got = omxhost::readSocBuildId(bytes.data(), count);
+  return got < 0 ? "missing" : bytes.substr(0, static_cast<size_t>(got));
+}
+
+TEST(Device, TableNamesEachDeviceOnceWithAllThatItNeeds) {
+  std::set<std::string> names;
+  for (const omxhost::Device& each : omxhost::devices()) {
+    EXPECT_TRUE(names.insert(each.name).second) << each.name;
+    EXPECT_EQ(omxhost::findDevice(each.name), &each);
+    EXPECT_EQ(each.decoderComponent == nullptr, each.encoderComponent == nullptr) << each.name;
+    EXPECT_LT(std::string(each.boardPlatform).size(), static_cast<size_t>(PROPERTY_VALUE_MAX));
+  }
+  EXPECT_EQ(names, (std::set<std::string>{"msm7x30", "msm8x55", "msm8x60", "msm8960", "omap4", "msm-unknown",
+                                          "exynos4"}));
+  EXPECT_EQ(omxhost::findDevice("MSM8960"), nullptr);
+}
+
+TEST(Device, DefaultsToMsm8960) {
+  EXPECT_IN_NEW_PROCESS(
+      [] {
+        unsetenv("OMXBRIDGE_DEVICE");
+        EXPECT_EQ(platform(), "msm8960");
+        EXPECT_EQ(buildId(6), "M8960A");
+        EXPECT_STREQ(omxhost::posedDevice().name, "msm8960");
+      },
+      testing::Eq(""));
+}
+
+TEST(Device, IsChosenByTheEnvironmentAndSettledOnce) {
+  EXPECT_IN_NEW_PROCESS(
+      [] {
+        setenv("OMXBRIDGE_DEVICE", "omap4", 1);
+        EXPECT_EQ(buildId(), "missing");
+        setenv("OMXBRIDGE_DEVICE", "msm7x30", 1);
+        EXPECT_EQ(platform(), "omap4");
+      },
+      testing::Eq(""));
+}
+
+TEST(Device, UnknownNameIsReportedWithTheKnownOnes) {
+  EXPECT_IN_NEW_PROCESS(
+      [] {
+        setenv("OMXBRIDGE_DEVICE", "msm9999", 1);
+        unsetenv("OMXBRIDGE_LOG");
+        EXPECT_EQ(platform(), "msm8960");
+        EXPECT_EQ(platform(), "msm8960");
+      },
+      testing::ContainsRegex("^E/omxhost: .*\"msm9999\".*msm7x30.*exynos4.*msm8960\n$"));
+}
+
+TEST(Device, CodeOverrulesTheEnvironment) {
+  EXPECT_IN_NEW_PROCESS(
+      [] {
+        setenv("OMXBRIDGE_DEVICE", "msm9999", 1);  // not even looked at
+        EXPECT_FALSE(omxhost::setDevice("nothing"));
+        EXPECT_TRUE(omxhost::setDevice("msm8x60"));
+        EXPECT_EQ(platform(), "msm8x60");
+        EXPECT_EQ(buildId(), "8x60");
+        EXPECT_FALSE(omxhost::setDevice("nothing"));
+        EXPECT_EQ(platform(), "msm8x60");
+        EXPECT_TRUE(omxhost::setDevice("exynos4"));
+        EXPECT_EQ(platform(), "exynos4");
+        EXPECT_EQ(omxhost::posedDevice().decoderComponent, nullptr);
+      },
+      testing::Eq(""));
+}
+
+TEST(Device, LastWordOnThePropertyCounts) {
+  EXPECT_IN_NEW_PROCESS(
+      [] {
+        // Also when the property is written before anybody asked for the device.
+        EXPECT_EQ(property_set("ro.board.platform", "OMAP4430"), 0);
+        EXPECT_EQ(platform(), "OMAP4430");
+        EXPECT_STREQ(omxhost::posedDevice().name, "msm8960");
+        EXPECT_EQ(platform(), "OMAP4430");
+        EXPECT_TRUE(omxhost::setDevice("msm8x55"));
+        EXPECT_EQ(platform(), "msm8x55");
+      },
+      testing::Eq(""));
+}
+
+TEST(Device, BuildIdCanBeShortOrMissingUntilTheNextDevice) {
+  EXPECT_IN_NEW_PROCESS(
+      [] {
+        omxhost::setBuildId("7630\n");
+        EXPECT_EQ(buildId(), "7630");
+        EXPECT_EQ(buildId(100), "7630\n");
+        EXPECT_EQ(buildId(0), "");
+        omxhost::setBuildId("863");
+        EXPECT_EQ(buildId(), "863");
+        omxhost::setBuildId("");
+        EXPECT_EQ(buildId(), "");
+        omxhost::setBuildId(std::nullopt);
+        EXPECT_EQ(buildId(), "missing");
+        EXPECT_EQ(platform(), "msm8960");
+        EXPECT_TRUE(omxhost::setDevice("msm7x30"));
+        EXPECT_EQ(buildId(), "7x30");
+      },
+      testing::Eq(""));
+}
+
+TEST(Device, MaySettleOnManyThreadsAtOnce) {
+  EXPECT_IN_NEW_PROCESS(
+      [] {
+        setenv("OMXBRIDGE_DEVICE", "omap4", 1);
+        std::vector<std::thread> threads;
+        for (int i = 0; i < 8; ++i) {
+          threads.emplace_back([] {
+            EXPECT_EQ(platform(), "omap4");
+            EXPECT_EQ(buildId(), "missing");
+          });
+        }
+        for (std::thread& each : threads) each.join();
+      },
+      testing::Eq(""));
+}
+
+}  // namespace

@@ -1,0 +1,59 @@
+#include <gtest/gtest.h>
+
+#include <array>
+#include <string>
+
+#include <cutils/properties.h>
+
+namespace {
+
+struct Read {
+  int length;
+  std::string value;
+};
+
+// Reads into a buffer of exactly the size that callers must have, in memory that ends behind it.
+Read read(const char* key, const char* otherwise) {
+  const auto buffer = std::make_unique<std::array<char, PROPERTY_VALUE_MAX>>();
+  buffer->fill('#');
+  const int length = property_get(key, buffer->data(), otherwise);
+  return {length, std::string(buffer->data())};
+}
+
+void expectRead(const char* key, const char* otherwise, const std::string& value) {
+  const Read got = read(key, otherwise);
+  EXPECT_EQ(got.value, value);
+  EXPECT_EQ(got.length, static_cast<int>(value.size()));
+}
+
+TEST(Properties, GiveTheDefaultWhereUnsetOrEmpty) {
+  expectRead("test.unset", "fallback", "fallback");
+  expectRead("test.unset", nullptr, "");
+  EXPECT_EQ(property_set("test.value", "set"), 0);
+  expectRead("test.value", "fallback", "set");
+  expectRead("TEST.VALUE", "fallback", "fallback");
+  EXPECT_EQ(property_set("test.value", ""), 0);
+  expectRead("test.value", "fallback", "fallback");
+  EXPECT_EQ(property_set("test.value", "again"), 0);
+  EXPECT_EQ(property_set("test.value", nullptr), 0);
+  expectRead("test.value", nullptr, "");
+  expectRead(nullptr, "fallback", "fallback");
+}
+
+TEST(Properties, LimitsAreExact) {
+  const std::string value91(91, 'v');
+  const std::string key31(31, 'k');
+  EXPECT_EQ(property_set(key31.c_str(), value91.c_str()), 0);
+  expectRead(key31.c_str(), "", value91);
+
+  EXPECT_EQ(property_set(key31.c_str(), (value91 + "v").c_str()), -1);
+  expectRead(key31.c_str(), "", value91);
+  EXPECT_EQ(property_set((key31 + "k").c_str(), "value"), -1);
+  expectRead((key31 + "k").c_str(), "none", "none");
+  EXPECT_EQ(property_set("", "value"), -1);
+  EXPECT_EQ(property_set(nullptr, "value"), -1);
+
+  expectRead("test.unset", (value91 + "cut").c_str(), value91);
+}
+
+}  // namespace

@@ -1,0 +1,164 @@
+#include <gtest/gtest.h>
+#include <stdlib.h>
+
+#include <atomic>
+#include <string>
+#include <thread>
+#include <vector>
+
+#include <binder/IServiceManager.h>
+#include <binder/ProcessState.h>
+#include <media/IMediaPlayerService.h>
+#include <media/IOMX.h>
+#include <omxhost/log.h>
+#include <omxhost/services.h>
+
+#include "tests/host/new_process.h"
+
+namespace {
+
+using android::defaultServiceManager;
+using android::IBinder;
+using android::interface_cast;
+using android::sp;
+using android::String16;
+
+class Observer : public android::BnOMXObserver {
+ public:
+  void onMessage(const android::omx_message& /*msg*/) override {}
+};
+
+class PlayerService : public android::BnMediaPlayerService {
+ public:
+  sp<android::IOMX> getOMX() override { return nullptr; }
+};
+
+sp<IBinder> lookUp(const char* name) {
+  return defaultServiceManager()->getService(String16(name));
+}
+
+TEST(Interface, IsReachedThroughItsBinderAndThroughNoOther) {
+  const sp<Observer> observer = new Observer();
+  const sp<IBinder> binder = observer->asBinder();
+  EXPECT_EQ(interface_cast<android::IOMXObserver>(binder), observer);
+  EXPECT_EQ(interface_cast<android::IOMX>(binder), nullptr);
+  EXPECT_EQ(interface_cast<android::IOMXObserver>(sp<IBinder>()), nullptr);
+  EXPECT_EQ(binder->getInterfaceDescriptor(), String16("android.hardware.IOMXObserver"));
+  EXPECT_EQ(binder->localBinder()->pingBinder(), android::OK);
+  EXPECT_EQ(observer->getStrongCount(), 2) << "binder and interface are one object with one count";
+}
+
+TEST(ServiceManager, FindsReplacesListsAndRemoves) {
+  const sp<IBinder> first = (new PlayerService())->asBinder();
+  const sp<IBinder> second = (new PlayerService())->asBinder();
+  const auto manager = defaultServiceManager();
+  EXPECT_EQ(manager, defaultServiceManager());
+  EXPECT_EQ(manager->addService(String16("test.b"), first), android::OK);
+  EXPECT_EQ(manager->addService(String16("test.a"), first), android::OK);
+  EXPECT_EQ(manager->addService(String16("test.b"), second), android::OK);
+  EXPECT_EQ(lookUp("test.a"), first);
+  EXPECT_EQ(manager->checkService(String16("test.b")), second);
+  EXPECT_EQ(lookUp("test"), nullptr);
+
+  sp<android::IMediaPlayerService> typed;
+  EXPECT_EQ(android::getService(String16("test.a"), &typed), android::OK);
+  EXPECT_EQ(typed->asBinder(), first);
+  EXPECT_EQ(android::getService(String16("test.c"), &typed), android::NAME_NOT_FOUND);
+
+  EXPECT_EQ(manager->addService(String16("test.c"), nullptr), android::BAD_VALUE);
+  EXPECT_EQ(manager->addService(String16(), first), android::BAD_VALUE);
+
+  const android::Vector<String16> names = manager->listServices();
+  ASSERT_EQ(names.size(), 2U);
+  EXPECT_EQ(names[0], String16("test.a"));
+  EXPECT_EQ(names[1], String16("test.b"));
+
+  EXPECT_TRUE(omxhost::removeService(String16("test.a")));
+  EXPECT_TRUE(omxhost::removeService(String16("test.b")));
+  EXPECT_FALSE(omxhost::removeService(String16("test.b")));
+  EXPECT_EQ(lookUp("test.b"), nullptr);
+  EXPECT_EQ(typed, nullptr);
+  EXPECT_EQ(first->getStrongCount(), 1);
+  EXPECT_EQ(second->getStrongCount(), 1);
+}
+
+TEST(ServiceManager, ServicesMayLookServicesUpWhileTheyGo) {
+  class Service : public android::BBinder {
+   protected:
+    ~Service() override { EXPECT_EQ(lookUp("test.going"), nullptr); }
+  };
+  defaultServiceManager()->addService(String16("test.going"), new Service());
+  EXPECT_TRUE(omxhost::removeService(String16("test.going")));
+}
+
+TEST(ServiceManager, LoadsTheMediaServerOnceForAllWhoAskTogether) {
+  EXPECT_IN_NEW_PROCESS(
+      [] {
+        setenv("OMXBRIDGE_MEDIASERVER", FAKE_MEDIA_SERVER, 1);
+        EXPECT_EQ(lookUp("media.other"), nullptr);
+        EXPECT_EQ(defaultServiceManager()->listServices().size(), 0U) << "loaded for another name";
+        std::atomic<int> found{0};
+        std::vector<std::thread> threads;
+        for (int i = 0; i < 8; ++i) {
+          threads.emplace_back([&found] { found += lookUp("media.player") != nullptr ? 1 : 0; });
+        }
+        for (std::thread& each : threads) each.join();
+        EXPECT_EQ(found, 8);
+        EXPECT_EQ(lookUp("started twice"), nullptr);
+        // Who takes the service away means it: it is not started again.
+        EXPECT_TRUE(omxhost::removeService(String16("media.player")));
+        EXPECT_EQ(lookUp("media.player"), nullptr);
+      },
+      testing::Eq(""));
+}
+
+TEST(ServiceManager, LoadsNothingWhereSomebodyServesOrLoadingIsOff) {
+  EXPECT_IN_NEW_PROCESS(
+      [] {
+        setenv("OMXBRIDGE_MEDIASERVER", FAKE_MEDIA_SERVER, 1);
+        EXPECT_TRUE(omxhost::setLoadOnDemand(false));
+        EXPECT_EQ(lookUp("media.player"), nullptr);
+        EXPECT_FALSE(omxhost::setLoadOnDemand(true));
+        const sp<IBinder> own = (new PlayerService())->asBinder();
+        defaultServiceManager()->addService(String16("media.player"), own);
+        EXPECT_EQ(lookUp("media.player"), own);
+        EXPECT_EQ(lookUp("started"), nullptr);
+        omxhost::removeService(String16("media.player"));
+        EXPECT_NE(lookUp("media.player"), nullptr);
+        EXPECT_NE(lookUp("started"), nullptr);
+      },
+      testing::Eq(""));
+}
+
+TEST(ServiceManager, WarnsOnceWhereThereIsNoMediaServer) {
+  EXPECT_IN_NEW_PROCESS(
+      [] {
+        unsetenv("OMXBRIDGE_LOG");
+        setenv("OMXBRIDGE_MEDIASERVER", "/no/such/library.so", 1);
+        EXPECT_EQ(lookUp("media.player"), nullptr);
+        EXPECT_EQ(lookUp("media.player"), nullptr);
+      },
+      testing::ContainsRegex("^W/omxhost: no media server: [^\n]*/no/such/library.so[^\n]*\n$"));
+  EXPECT_IN_NEW_PROCESS(
+      [] {
+        unsetenv("OMXBRIDGE_LOG");
+        setenv("OMXBRIDGE_MEDIASERVER", LIBRARY_WITHOUT_ENTRY_POINT, 1);
+        EXPECT_EQ(lookUp("media.player"), nullptr);
+        EXPECT_EQ(lookUp("media.player"), nullptr);
+      },
+      testing::ContainsRegex("^W/omxhost: no media server: [^\n]*omxhost_media_server_start[^\n]*\n$"));
+}
+
+TEST(ProcessState, NotesThatTheThreadPoolWasStarted) {
+  EXPECT_IN_NEW_PROCESS(
+      [] {
+        EXPECT_FALSE(omxhost::isThreadPoolStarted());
+        EXPECT_EQ(android::ProcessState::self(), android::ProcessState::self());
+        android::ProcessState::self()->startThreadPool();
+        android::ProcessState::self()->startThreadPool();
+        EXPECT_TRUE(omxhost::isThreadPoolStarted());
+      },
+      testing::Eq(""));
+}
+
+}  // namespace

@@ -1,0 +1,195 @@
+#include <gtest/gtest.h>
+#include <stdint.h>
+
+#include <random>
+#include <set>
+#include <type_traits>
+#include <vector>
+
+#include <utils/RefBase.h>
+#include <utils/Vector.h>
+
+namespace {
+
+using android::Vector;
+
+// Knows whether it stands where it was constructed, so a byte-wise move or a use after destruction
+// shows, and registers itself, so a leak or a double destruction shows.
+class Tracked {
+ public:
+  Tracked() : Tracked(0) {}
+  explicit Tracked(int number) : value(number) { enter(); }
+  Tracked(const Tracked& other) : value(other.get()) { enter(); }
+  Tracked& operator=(const Tracked& other) {
+    value = other.get();
+    return *this;
+  }
+  ~Tracked() { EXPECT_EQ(alive().erase(this), 1U); }
+
+  int get() const {
+    EXPECT_TRUE(alive().contains(this)) << "an element is used that does not exist";
+    return value;
+  }
+
+  static std::set<const Tracked*>& alive() {
+    static std::set<const Tracked*> all;
+    return all;
+  }
+
+ private:
+  void enter() { EXPECT_TRUE(alive().insert(this).second); }
+
+  int value;
+};
+
+std::vector<int> valuesOf(const Vector<Tracked>& vector) {
+  std::vector<int> values;
+  for (const Tracked& each : vector) values.push_back(each.get());
+  return values;
+}
+
+Vector<Tracked> counting(int count) {
+  Vector<Tracked> vector;
+  for (int i = 0; i < count; ++i) vector.add(Tracked(i));
+  return vector;
+}
+
+static_assert(std::is_same_v<decltype(std::declval<Vector<int>&>()[0]), const int&>,
+              "code that writes through it does not compile on a device");
+
+TEST(Vector, FollowsAPlainModelThroughRandomOperations) {
+  std::mt19937 random(1);
+  const auto below = [&random](size_t limit) { return random() % limit; };
+  {
+    Vector<Tracked> vector;
+    std::vector<int> model;
+    for (int step = 0; step < 4000; ++step) {
+      const size_t at = below(model.size() + 1);
+      const auto where = model.begin() + static_cast<ptrdiff_t>(at);
+      const size_t count = below(5);
+      switch (below(8)) {
+        case 0:
+        case 1:
+          EXPECT_EQ(vector.add(Tracked(step)), static_cast<ssize_t>(model.size()));
+          model.push_back(step);
+          break;
+        case 2:
+          EXPECT_EQ(vector.insertAt(Tracked(step), at, count), static_cast<ssize_t>(at));
+          model.insert(where, count, step);
+          break;
+        case 3:
+          if (at + count > model.size()) {
+            EXPECT_EQ(vector.removeItemsAt(at, count), android::BAD_VALUE);
+          } else {
+            EXPECT_EQ(vector.removeItemsAt(at, count), static_cast<ssize_t>(at));
+            model.erase(where, where + static_cast<ptrdiff_t>(count));
+          }
+          break;
+        case 4:
+          if (at < model.size()) {
+            vector.editItemAt(at) = Tracked(-step);
+            model[at] = -step;
+          }
+          break;
+        case 5: {
+          const Vector<Tracked> copy(vector);
+          vector = copy;
+          break;
+        }
+        case 6:
+          if (model.size() < 100) {
+            vector.appendVector(vector);
+            const std::vector<int> copy(model);
+            model.insert(model.end(), copy.begin(), copy.end());
+          }
+          break;
+        default:
+          if (below(50) == 0) {
+            vector.clear();
+            model.clear();
+          }
+          break;
+      }
+      ASSERT_EQ(valuesOf(vector), model) << "step " << step;
+      ASSERT_GE(vector.capacity(), vector.size());
+      ASSERT_EQ(Tracked::alive().size(), model.size()) << "step " << step;
+    }
+  }
+  EXPECT_TRUE(Tracked::alive().empty());
+}
+
+TEST(Vector, TakesElementsOfItsOwn) {
+  Vector<Tracked> full = counting(4);
+  ASSERT_EQ(full.capacity(), full.size()) << "the next add must grow";
+  full.add(full[1]);
+  EXPECT_EQ(valuesOf(full), (std::vector<int>{0, 1, 2, 3, 1}));
+
+  Vector<Tracked> roomy = counting(3);
+  roomy.setCapacity(20);
+  roomy.insertAt(roomy[2], 0, 2);  // The element moves away while it is being copied.
+  roomy.insertAt(roomy[4], 5);
+  EXPECT_EQ(valuesOf(roomy), (std::vector<int>{2, 2, 0, 1, 2, 2}));
+
+  Vector<Tracked> grown = counting(4);
+  grown.insertAt(grown[3], 1, 3);
+  EXPECT_EQ(valuesOf(grown), (std::vector<int>{0, 3, 3, 3, 1, 2, 3}));
+}
+
+TEST(Vector, AddressesStayWhileNothingIsAddedAndWithinReservedCapacity) {
+  Vector<Tracked> vector;
+  ASSERT_EQ(vector.setCapacity(100), 100);
+  vector.add(Tracked(1));
+  const Tracked* const handle = &vector[0];
+  for (int i = 1; i < 100; ++i) vector.add(Tracked(i));
+  EXPECT_EQ(&vector[0], handle);
+
+  // Neither copies nor writing nor taking away at the end move anything.
+  Vector<Tracked> copy(vector);
+  copy.editItemAt(0) = Tracked(7);
+  EXPECT_EQ(&vector.editItemAt(0), handle);
+  EXPECT_EQ(vector[0].get(), 1);
+  vector.removeItemsAt(1, 99);
+  EXPECT_EQ(&vector[0], handle);
+
+  EXPECT_EQ(vector.setCapacity(5), 100);
+}
+
+TEST(Vector, RefusesWhatItCannotHoldAndStaysAsItWas) {
+  Vector<Tracked> vector = counting(3);
+  const Tracked* const first = &vector[0];
+  const size_t most = SIZE_MAX / sizeof(Tracked);
+  for (const size_t count : {SIZE_MAX, SIZE_MAX - 2, most, most - 3, most / 2 + 1}) {
+    EXPECT_EQ(vector.setCapacity(count), android::NO_MEMORY) << count;
+    EXPECT_EQ(vector.insertAt(Tracked(9), 1, count), android::NO_MEMORY) << count;
+  }
+  EXPECT_EQ(vector.insertAt(Tracked(9), 4), android::BAD_INDEX);
+  EXPECT_EQ(vector.removeAt(3), android::BAD_VALUE);
+  EXPECT_EQ(vector.removeItemsAt(1, SIZE_MAX), android::BAD_VALUE);
+  EXPECT_EQ(valuesOf(vector), (std::vector<int>{0, 1, 2}));
+  EXPECT_EQ(&vector[0], first);
+}
+
+TEST(Vector, EndsAndIterators) {
+  Vector<Tracked> vector = counting(3);
+  EXPECT_EQ(vector.top().get(), 2);
+  vector.push_front(Tracked(9));
+  vector.push();
+  vector.pop();
+  EXPECT_EQ(vector.erase(vector.begin() + 1), vector.begin() + 1);
+  EXPECT_EQ(valuesOf(vector), (std::vector<int>{9, 1, 2}));
+}
+
+TEST(Vector, CarriesReferencesThroughEveryMove) {
+  class Object : public android::RefBase {};
+  const android::sp<Object> object = new Object();
+  {
+    Vector<android::sp<Object>> vector;
+    for (int i = 0; i < 50; ++i) vector.insertAt(object, vector.size() / 2);
+    EXPECT_EQ(object->getStrongCount(), 51);
+    vector.removeItemsAt(10, 30);
+    EXPECT_EQ(object->getStrongCount(), 21);
+  }
+  EXPECT_EQ(object->getStrongCount(), 1);
+}
+
+}  // namespace

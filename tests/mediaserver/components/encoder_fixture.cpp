@@ -1,0 +1,114 @@
+#include "tests/mediaserver/components/encoder_fixture.h"
+
+#include <gtest/gtest.h>
+
+#include "host/mediaserver/components/annex_b.h"
+
+namespace componenttest {
+
+using mediaserver::kInputPort;
+using mediaserver::kOutputPort;
+
+void EncoderRun::setSize(uint32_t width, uint32_t height, uint32_t framesPerSecond) {
+  for (const OMX_U32 port : {kInputPort, kOutputPort}) {
+    auto definition = node().definition(port);
+    definition.format.video.nFrameWidth = width;
+    definition.format.video.nFrameHeight = height;
+    definition.format.video.xFramerate = framesPerSecond << 16;
+    EXPECT_EQ(node().define(port, definition), android::OK);
+  }
+}
+
+void EncoderRun::setBitRate(uint32_t bitsPerSecond, OMX_VIDEO_CONTROLRATETYPE mode) {
+  auto record = makeRecord<OMX_VIDEO_PARAM_BITRATETYPE>(kOutputPort);
+  record.eControlRate = mode;
+  record.nTargetBitrate = bitsPerSecond;
+  EXPECT_EQ(set(OMX_IndexParamVideoBitrate, record), android::OK);
+}
+
+OMX_VIDEO_PARAM_AVCTYPE EncoderRun::avc() {
+  auto record = makeRecord<OMX_VIDEO_PARAM_AVCTYPE>(kOutputPort);
+  EXPECT_EQ(get(OMX_IndexParamVideoAvc, &record), android::OK);
+  return record;
+}
+
+android::status_t EncoderRun::setAvc(const std::function<void(OMX_VIDEO_PARAM_AVCTYPE&)>& change) {
+  OMX_VIDEO_PARAM_AVCTYPE record = avc();
+  change(record);
+  return set(OMX_IndexParamVideoAvc, record);
+}
+
+android::status_t EncoderRun::changeBitRate(uint32_t bitsPerSecond) {
+  auto record = makeRecord<OMX_VIDEO_CONFIG_BITRATETYPE>(kOutputPort);
+  record.nEncodeBitrate = bitsPerSecond;
+  return setConfig(OMX_IndexConfigVideoBitrate, record);
+}
+
+android::status_t EncoderRun::changeFrameRate(uint32_t framesPerSecond) {
+  const bool ti = device().components.vendor == omxhost::Vendor::Ti;
+  auto record = makeRecord<OMX_CONFIG_FRAMERATETYPE>(ti ? kInputPort : kOutputPort);
+  record.xEncodeFramerate = framesPerSecond << 16;
+  return setConfig(OMX_IndexConfigVideoFramerate, record);
+}
+
+android::status_t EncoderRun::requestKey() {
+  auto record = makeRecord<OMX_CONFIG_INTRAREFRESHVOPTYPE>(kOutputPort);
+  record.IntraRefreshVOP = OMX_TRUE;
+  return setConfig(OMX_IndexConfigVideoIntraVOPRefresh, record);
+}
+
+android::status_t EncoderRun::rotate(int32_t degrees) {
+  auto record = makeRecord<OMX_CONFIG_ROTATIONTYPE>(kOutputPort);
+  record.nRotation = degrees;
+  return setConfig(OMX_IndexConfigCommonRotate, record);
+}
+
+Output& EncoderRun::encode(const Picture& picture) {
+  const size_t before = outputs().size();
+  send(packInput(picture, device().components.encoderInput), static_cast<int64_t>(before) * 1000);
+  awaitOutputs(before + 1);
+  return outputs().back();
+}
+
+void EncoderRun::encodeScene(uint32_t width, uint32_t height, uint32_t count) {
+  for (uint32_t i = 0; i < count; ++i) encode(scene(width, height, _next++));
+}
+
+std::vector<size_t> EncoderRun::keyFrames() const {
+  std::vector<size_t> found;
+  for (size_t i = 0; i < outputs().size(); ++i) {
+    if ((outputs()[i].flags & OMX_BUFFERFLAG_SYNCFRAME) != 0) found.push_back(i);
+  }
+  return found;
+}
+
+std::vector<Unit> EncoderRun::units() const {
+  std::vector<Unit> units;
+  for (const Output& output : outputs()) units.push_back({output.bytes, output.timestamp});
+  return units;
+}
+
+double EncoderRun::bits(size_t first, size_t count) const {
+  size_t bytes = 0;
+  for (size_t i = first; i < first + count; ++i) bytes += outputs().at(i).bytes.size();
+  return static_cast<double>(bytes) * 8;
+}
+
+std::optional<mediaserver::SequenceSet> sequenceSet(const std::vector<uint8_t>& unit) {
+  mediaserver::Bytes stream(unit);
+  for (auto nal = mediaserver::takeNal(&stream); !nal.empty(); nal = mediaserver::takeNal(&stream)) {
+    if (mediaserver::nalType(nal) == mediaserver::kNalSequenceSet) return mediaserver::readSequenceSet(nal);
+  }
+  return std::nullopt;
+}
+
+std::vector<unsigned> nalTypes(const std::vector<uint8_t>& unit) {
+  std::vector<unsigned> types;
+  mediaserver::Bytes stream(unit);
+  for (auto nal = mediaserver::takeNal(&stream); !nal.empty(); nal = mediaserver::takeNal(&stream)) {
+    types.push_back(mediaserver::nalType(nal));
+  }
+  return types;
+}
+
+}  // namespace componenttest

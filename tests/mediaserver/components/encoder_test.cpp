@@ -1,0 +1,270 @@
+// Encoding: streams that decode to the pictures that went in, on every device, and what may change while the
+// encoder runs.
+
+#include <gtest/gtest.h>
+
+#include <media/stagefright/MediaErrors.h>
+
+#include "host/mediaserver/components/vendor_records.h"
+#include "tests/mediaserver/components/encoder_fixture.h"
+
+namespace componenttest {
+namespace {
+
+using mediaserver::kInputPort;
+using mediaserver::kOutputPort;
+
+constexpr auto kUnknownError = static_cast<android::status_t>(android::UNKNOWN_ERROR);
+constexpr auto kUnsupported = static_cast<android::status_t>(android::ERROR_UNSUPPORTED);
+
+// What the units decode to, compared with what went in.
+void expectLike(const std::vector<Unit>& units, const std::vector<Picture>& pictures, double decibels) {
+  const std::vector<Decoded> decoded = decode("h264", units);
+  ASSERT_EQ(decoded.size(), pictures.size());
+  for (size_t i = 0; i < decoded.size(); ++i) {
+    EXPECT_EQ(decoded[i].picture.width, pictures[i].width);
+    EXPECT_EQ(decoded[i].picture.height, pictures[i].height);
+    EXPECT_GT(psnr(decoded[i].picture, pictures[i]), decibels) << "picture " << i;
+    // Chroma in its place, and Cb before Cr.
+    const size_t middle = pictures[i].chromaWidth() * (pictures[i].chromaHeight() / 2) + 3;
+    EXPECT_NEAR(decoded[i].picture.plane(1)[middle], pictures[i].plane(1)[middle], 12) << "picture " << i;
+    EXPECT_NEAR(decoded[i].picture.plane(2)[middle], pictures[i].plane(2)[middle], 12) << "picture " << i;
+  }
+}
+
+class EachDevice : public testing::TestWithParam<const char*> {};
+
+TEST_P(EachDevice, EncodesOnePictureToOneUnit) {
+  // 98x54: macroblocks that are cut on both sides, and no multiple of anything that layouts round to.
+  for (const auto& [width, height] : {std::pair{96U, 80U}, {98U, 54U}, {16U, 16U}}) {
+    EncoderRun run(GetParam());
+    run.setSize(width, height);
+    run.setBitRate(800000);
+    run.start();
+    const std::vector<Picture> pictures = scenes(width, height, 6);
+    for (size_t i = 0; i < pictures.size(); ++i) {
+      const Output& output = run.encode(pictures[i]);
+      EXPECT_EQ(output.timestamp, static_cast<int64_t>(i) * 1000);
+      EXPECT_EQ(output.flags, OMX_BUFFERFLAG_ENDOFFRAME | (i == 0 ? OMX_BUFFERFLAG_SYNCFRAME : 0U));
+      EXPECT_EQ(nalTypes(output.bytes),
+                i == 0 ? (std::vector<unsigned>{7, 8, 5}) : (std::vector<unsigned>{1}));
+    }
+    expectLike(run.units(), pictures, 33);
+    run.finish();
+    EXPECT_EQ(run.errors(), std::vector<std::string>{});
+  }
+}
+
+INSTANTIATE_TEST_SUITE_P(Encoder, EachDevice,
+                         testing::Values("msm7x30", "msm8x55", "msm8x60", "msm8960", "omap4", "msm-unknown"),
+                         [](const auto& test) {
+                           std::string name = test.param;
+                           std::erase(name, '-');
+                           return name;
+                         });
+
+// A width that is no multiple of 16: the client agrees on a rounded pitch, and may send rows with or without.
+TEST(Encoder, TellsTiRowsWithAGapFromRowsWithout) {
+  const std::vector<Picture> pictures = scenes(90, 48, 3);
+  for (const uint32_t pitch : {96U, 90U}) {
+    EncoderRun run("omap4");
+    auto input = run.node().definition(kInputPort);
+    input.format.video.nFrameWidth = 90;
+    input.format.video.nFrameHeight = 48;
+    input.format.video.nStride = 96;
+    input.format.video.nSliceHeight = 0;
+    input.nBufferSize = 90 * 48 * 3 / 2;
+    ASSERT_EQ(run.node().define(kInputPort, input), android::OK);
+    EXPECT_GE(run.node().definition(kInputPort).nBufferSize, 96U * 48 * 3 / 2);
+    run.setBitRate(500000);
+    run.start();
+    for (const Picture& picture : pictures) {
+      run.send(packInput(picture, omxhost::PictureLayout::TiPacked, pitch), 0);
+    }
+    run.awaitOutputs(3);
+    expectLike(run.units(), pictures, 33);
+  }
+}
+
+TEST(Encoder, RefusesWhatItCannotEncode) {
+  struct {
+    const char* device;
+    uint32_t width;
+    uint32_t height;
+    android::status_t status;
+  } const cases[] = {
+      {"msm8960", 1920, 1088, android::OK},  {"msm8960", 1088, 1920, android::OK},
+      {"msm8960", 1920, 1104, kUnsupported}, {"msm8960", 97, 80, kUnsupported},
+      {"msm8960", 96, 81, kUnsupported},     {"omap4", 0, 0, kUnsupported},
+      {"omap4", 14, 96, kUnsupported},       {"msm8x60", 0xFFFFFFFE, 16, kUnsupported},
+      {"msm8x60", 5000, 16, kUnsupported},   {"msm8x60", 0x80000000, 0x80000000, kUnsupported},
+  };
+  for (const auto& each : cases) {
+    EncoderRun run(each.device);
+    for (const OMX_U32 port : {kInputPort, kOutputPort}) {
+      const auto before = run.node().definition(port);
+      auto wanted = before;
+      wanted.format.video.nFrameWidth = each.width;
+      wanted.format.video.nFrameHeight = each.height;
+      EXPECT_EQ(run.node().define(port, wanted), each.status) << each.width << "x" << each.height;
+      const auto after = run.node().definition(port);
+      const bool taken = each.status == android::OK;
+      EXPECT_EQ(after.format.video.nFrameWidth, taken ? each.width : before.format.video.nFrameWidth);
+      EXPECT_EQ(after.format.video.nFrameHeight, taken ? each.height : before.format.video.nFrameHeight);
+    }
+  }
+}
+
+TEST(Encoder, MakesRoomForAlignedChroma) {
+  EncoderRun run("msm8x60");
+  run.setSize(176, 144);
+  EXPECT_EQ(run.node().definition(kInputPort).nBufferSize, 39296U);
+  EncoderRun plain("msm8960");
+  plain.setSize(176, 144);
+  EXPECT_EQ(plain.node().definition(kInputPort).nBufferSize, 38016U);
+}
+
+TEST(Encoder, SkipsAPictureThatIsNotWhole) {
+  EncoderRun run("msm8960");
+  run.setSize(96, 80);
+  run.start();
+  const std::vector<Picture> pictures = scenes(96, 80, 2);
+  run.encode(pictures[0]);
+  std::vector<uint8_t> cut = packInput(pictures[1], omxhost::PictureLayout::SemiPlanar);
+  cut.pop_back();
+  run.send(cut, 0);
+  run.encode(pictures[1]);
+  EXPECT_EQ(run.errors(), std::vector<std::string>{"error 0x8000100b"});
+  expectLike(run.units(), pictures, 25);
+}
+
+TEST(Encoder, PutsKeyFramesExactlyWhereTheyAreDue) {
+  struct {
+    const char* device;
+    OMX_U32 pFrames;
+    std::vector<size_t> keys;
+  } const cases[] = {
+      {"msm8960", 4, {0, 5, 10}}, {"msm8960", 0, {0, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11}},
+      {"msm8960", 0xFFFF, {0}},   {"omap4", 5, {0, 5, 10}},
+      {"omap4", 0, {0}},
+  };
+  for (const auto& each : cases) {
+    EncoderRun run(each.device);
+    run.setSize(64, 48);
+    ASSERT_EQ(run.setAvc([&](auto& avc) { avc.nPFrames = each.pFrames; }), android::OK);
+    EXPECT_EQ(run.avc().nPFrames, each.pFrames);
+    run.start();
+    run.encodeScene(64, 48, 12);
+    EXPECT_EQ(run.keyFrames(), each.keys) << each.device << " " << each.pFrames;
+    for (const size_t key : each.keys) {
+      EXPECT_EQ(nalTypes(run.outputs()[key].bytes), (std::vector<unsigned>{7, 8, 5}))
+          << "parameter sets in band";
+    }
+  }
+}
+
+TEST(Encoder, CountsKeyFramesFromTheLastOne) {
+  EncoderRun run("msm8960");
+  run.setSize(64, 48);
+  ASSERT_EQ(run.setAvc([](auto& avc) { avc.nPFrames = 5; }), android::OK);
+  run.start();
+  run.encodeScene(64, 48, 3);
+  EXPECT_EQ(run.requestKey(), android::OK);
+  run.encodeScene(64, 48, 8);  // 3 is requested, 9 is due
+  auto period = makeRecord<mediaserver::QcomIntraPeriod>(kOutputPort);
+  period.nIDRPeriod = 1;
+  period.nPFrames = 2;
+  EXPECT_EQ(run.setConfig(mediaserver::kQcomIntraPeriodIndex, period), android::OK);
+  run.encodeScene(64, 48, 6);  // 12, 15
+  auto standard = makeRecord<OMX_VIDEO_CONFIG_AVCINTRAPERIOD>(kOutputPort);
+  standard.nIDRPeriod = 0;
+  standard.nPFrames = 0xFFFFFFFF;
+  EXPECT_EQ(run.setConfig(OMX_IndexConfigVideoAVCIntraPeriod, standard), android::OK);
+  run.encodeScene(64, 48, 6);
+  EXPECT_EQ(run.keyFrames(), (std::vector<size_t>{0, 3, 9, 12, 15}));
+  period.nBFrames = 1;
+  EXPECT_EQ(run.setConfig(mediaserver::kQcomIntraPeriodIndex, period), kUnsupported);
+  EncoderRun ti("omap4");
+  EXPECT_EQ(ti.setConfig(mediaserver::kQcomIntraPeriodIndex, period), kUnknownError) << "another vendor's";
+}
+
+TEST(Encoder, TurnsPicturesWhileRunning) {
+  EncoderRun run("msm8960");
+  run.setSize(96, 64);
+  run.setBitRate(1000000);
+  ASSERT_EQ(run.rotate(270), android::OK);
+  run.start();
+  std::vector<Picture> wanted;
+  for (const int quarters : {3, 1, 2, 0}) {
+    EXPECT_EQ(run.rotate(quarters * 90), android::OK);
+    for (uint32_t i = 0; i < 2; ++i) {
+      const Picture picture = scene(96, 64, i);
+      wanted.push_back(turned(picture, quarters));
+      const auto& video = run.encode(picture).definition.format.video;
+      EXPECT_EQ(video.nFrameWidth, wanted.back().width);
+      EXPECT_EQ(video.nFrameHeight, wanted.back().height);
+    }
+  }
+  expectLike(run.units(), wanted, 33);
+  EXPECT_EQ(run.keyFrames(), (std::vector<size_t>{0, 4})) << "a new size takes a new stream";
+  for (const int32_t refused : {45, -90, 360, 1}) EXPECT_EQ(run.rotate(refused), kUnsupported) << refused;
+  EXPECT_EQ(run.errors(), std::vector<std::string>{});
+}
+
+// The same for a size that the client changes by way of the input port.
+TEST(Encoder, MakesRoomForLargerPicturesWhileRunning) {
+  EncoderRun run("msm8960");
+  run.setSize(64, 48);
+  run.setBitRate(4000000);
+  run.start();
+  std::vector<Picture> pictures = {scene(64, 48, 0)};
+  run.encode(pictures[0]);
+  run.reopenInput([&] {
+    auto input = run.node().definition(kInputPort);
+    input.format.video.nFrameWidth = 640;
+    input.format.video.nFrameHeight = 480;
+    EXPECT_EQ(run.node().define(kInputPort, input), android::OK);
+  });
+  pictures.push_back(scene(640, 480, 1));
+  EXPECT_EQ(run.encode(pictures[1]).definition.format.video.nFrameWidth, 640U);
+  EXPECT_EQ(run.reconfigurations(), 1U);
+  expectLike(run.units(), pictures, 30);
+}
+
+TEST(Encoder, EndsAStreamAndBeginsAnother) {
+  EncoderRun run("msm8960");
+  run.setSize(64, 48);
+  run.start();
+  run.encodeScene(64, 48, 2);
+  // The mark on a picture's own buffer comes out on that picture's unit.
+  run.send(packInput(scene(64, 48, 2), omxhost::PictureLayout::SemiPlanar), 7, OMX_BUFFERFLAG_EOS);
+  run.await([&] { return run.ended(); });
+  ASSERT_EQ(run.outputs().size(), 3U);
+  EXPECT_EQ(run.outputs()[2].flags, OMX_BUFFERFLAG_EOS | OMX_BUFFERFLAG_ENDOFFRAME);
+  run.encodeScene(64, 48, 2);
+  EXPECT_EQ(run.keyFrames(), (std::vector<size_t>{0, 3}));
+  run.finish();
+  EXPECT_EQ(run.outputs().size(), 5U);
+}
+
+// What the client never got cannot be referred to.
+TEST(Encoder, BeginsAnewAfterAFlushOfWhatItHad) {
+  EncoderRun run("msm8960");
+  run.setSize(64, 48);
+  run.node().toExecuting();  // and no output buffer given
+  const Picture picture = scene(64, 48, 0);
+  const std::vector<uint8_t> bytes = packInput(picture, omxhost::PictureLayout::SemiPlanar);
+  const std::string_view text(reinterpret_cast<const char*>(bytes.data()), bytes.size());
+  run.node().empty(0, text);
+  run.node().expect(omxtest::emptyBufferDone());
+  EXPECT_EQ(run.node().command(OMX_CommandFlush, kOutputPort), android::OK);
+  run.node().expectComplete(OMX_CommandFlush, kOutputPort);
+  run.node().empty(0, text);
+  run.node().fillAll();
+  run.node().expect(omxtest::fillBufferDone());
+  const std::vector<omxtest::Packet> outputs = run.node().outputs();
+  EXPECT_EQ(nalTypes(outputs.back().bytes), (std::vector<unsigned>{7, 8, 5}));
+}
+
+}  // namespace
+}  // namespace componenttest

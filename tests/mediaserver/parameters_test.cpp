@@ -1,0 +1,268 @@
+// Parameters and configurations: what ports answer, what may be written when, and how records are checked.
+
+#include <cstring>
+
+#include <media/stagefright/MediaErrors.h>
+
+#include "tests/mediaserver/node_fixture.h"
+
+namespace omxtest {
+namespace {
+
+using mediaserver::kInputPort;
+using mediaserver::kOutputPort;
+using mediaserver::kPortCount;
+using mediaserver::PortDefinition;
+
+constexpr auto kTiFormat = static_cast<OMX_COLOR_FORMATTYPE>(0x7F000100);
+
+class Parameters : public NodeTest {
+ protected:
+  template <typename Record>
+  android::status_t get(const OmxClient& node, OMX_INDEXTYPE index, Record* record) {
+    return server->getParameter(node.node(), index, record, sizeof(*record));
+  }
+  template <typename Record>
+  android::status_t set(const OmxClient& node, OMX_INDEXTYPE index, const Record& record) {
+    return server->setParameter(node.node(), index, &record, sizeof(record));
+  }
+};
+
+TEST_F(Parameters, FormatsAreEnumeratedToTheirEnd) {
+  const auto node = client();
+  for (OMX_U32 port = 0; port < kPortCount; ++port) {
+    const std::vector<OMX_U32> expected =
+        port == kInputPort ? std::vector<OMX_U32>{7, 4, 3, 5} : std::vector<OMX_U32>{21, 0x7F000100};
+    std::vector<OMX_U32> seen;
+    OMX_VIDEO_PARAM_PORTFORMATTYPE format{};
+    format.nPortIndex = port;
+    while (get(*node, OMX_IndexParamVideoPortFormat, &format) == android::OK) {
+      EXPECT_TRUE(format.eCompressionFormat == 0 || format.eColorFormat == 0);
+      EXPECT_EQ(format.xFramerate, 24u << 16);
+      seen.push_back(static_cast<OMX_U32>(format.eCompressionFormat) |
+                     static_cast<OMX_U32>(format.eColorFormat));
+      ASSERT_EQ(++format.nIndex, seen.size());
+    }
+    EXPECT_EQ(seen, expected);
+  }
+}
+
+TEST_F(Parameters, ChoosingAFormatChangesTheDefinition) {
+  const auto node = client();
+  OMX_VIDEO_PARAM_PORTFORMATTYPE format{};
+  format.nPortIndex = kOutputPort;
+  format.eColorFormat = kTiFormat;
+  EXPECT_EQ(set(*node, OMX_IndexParamVideoPortFormat, format), android::OK);
+  EXPECT_EQ(node->definition(kOutputPort).format.video.eColorFormat, kTiFormat);
+  format.eColorFormat = OMX_COLOR_FormatMonochrome;
+  EXPECT_EQ(set(*node, OMX_IndexParamVideoPortFormat, format), android::ERROR_UNSUPPORTED);
+  EXPECT_EQ(node->definition(kOutputPort).format.video.eColorFormat, kTiFormat);
+}
+
+TEST_F(Parameters, ADefinitionTakesWhatClientsMayWriteAndKeepsTheRest) {
+  const auto node = client();
+  PortDefinition wanted = node->definition(kInputPort);
+  const PortDefinition before = wanted;
+  wanted.nSize = 0;  // Kept: some clients send no size
+  wanted.eDir = OMX_DirOutput;
+  wanted.bEnabled = OMX_FALSE;
+  wanted.bPopulated = OMX_TRUE;
+  wanted.eDomain = OMX_PortDomainAudio;
+  wanted.nBufferCountMin = 7;
+  wanted.nBufferAlignment = 4096;
+  wanted.nBufferCountActual = 3;
+  wanted.format.video.cMIMEType = reinterpret_cast<OMX_STRING>(&wanted);
+  wanted.format.video.pNativeWindow = &wanted;
+  wanted.format.video.nFrameWidth = 64;
+  wanted.format.video.nFrameHeight = 48;
+  wanted.format.video.nSliceHeight = 0;
+  wanted.format.video.nBitrate = 1000;
+  wanted.format.video.eCompressionFormat = OMX_VIDEO_CodingMPEG4;
+  wanted.format.video.eColorFormat = OMX_COLOR_FormatYUV420SemiPlanar;  // of a compressed port: ignored
+  ASSERT_EQ(node->define(kInputPort, wanted), android::OK);
+
+  PortDefinition expected = before;
+  expected.nBufferCountActual = 3;
+  expected.format.video = wanted.format.video;
+  expected.format.video.cMIMEType = nullptr;
+  expected.format.video.pNativeWindow = nullptr;
+  expected.format.video.eColorFormat = OMX_COLOR_FormatUnused;
+  const PortDefinition after = node->definition(kInputPort);
+  EXPECT_EQ(std::memcmp(&after, &expected, sizeof(after)), 0);
+  // The picture's size reaches the other port.
+  EXPECT_EQ(node->definition(kOutputPort).format.video.nFrameWidth, 64u);
+  EXPECT_EQ(node->definition(kOutputPort).nBufferSize, 176u * 144 * 3 / 2);  // stride and slice height stay
+}
+
+TEST_F(Parameters, ARefusedDefinitionChangesNothing) {
+  const auto node = client();
+  const PortDefinition before = node->definition(kOutputPort);
+  struct Case {
+    const char* what;
+    void (*change)(PortDefinition*);
+    android::status_t status;
+  };
+  const Case cases[] = {
+      {"too few buffers", [](PortDefinition* d) { d->nBufferCountActual = 0; }, kUnknownError},
+      {"a colour nobody offers", [](PortDefinition* d) { d->format.video.eColorFormat = OMX_COLOR_FormatL8; },
+       android::ERROR_UNSUPPORTED},
+      {"compression on a raw port",
+       [](PortDefinition* d) { d->format.video.eCompressionFormat = OMX_VIDEO_CodingAVC; },
+       android::ERROR_UNSUPPORTED},
+      {"a port that is not there", [](PortDefinition* d) { d->nPortIndex = 2; }, kUnknownError},
+  };
+  for (const Case& test : cases) {
+    PortDefinition wanted = before;
+    wanted.format.video.nFrameWidth = 32;
+    test.change(&wanted);
+    EXPECT_EQ(set(*node, OMX_IndexParamPortDefinition, wanted), test.status) << test.what;
+    const PortDefinition after = node->definition(kOutputPort);
+    EXPECT_EQ(std::memcmp(&after, &before, sizeof(after)), 0) << test.what;
+  }
+}
+
+TEST_F(Parameters, AreWrittenInLoadedAndOnDisabledPortsAndReadAlways) {
+  struct Case {
+    OMX_STATETYPE state;
+    bool disabled;
+    bool writable;
+  };
+  const Case cases[] = {
+      {OMX_StateLoaded, false, true},     {OMX_StateIdle, false, false},    {OMX_StateIdle, true, true},
+      {OMX_StateExecuting, false, false}, {OMX_StateExecuting, true, true}, {OMX_StatePause, false, false},
+      {OMX_StatePause, true, true},
+  };
+  for (const Case& test : cases) {
+    SCOPED_TRACE(::testing::Message() << test.state << (test.disabled ? " disabled" : ""));
+    const auto node = client();
+    reach(node.get(), test.state);
+    if (test.disabled) node->command(OMX_CommandPortDisable, kOutputPort);
+    const android::status_t expected = test.writable ? android::status_t{android::OK} : kUnknownError;
+    PortDefinition definition = node->definition(kOutputPort);
+    definition.nBufferCountActual = 5;
+    EXPECT_EQ(node->define(kOutputPort, definition), expected);
+    EXPECT_EQ(node->definition(kOutputPort).nBufferCountActual, test.writable ? 5u : 2u);
+    OMX_VIDEO_PARAM_BITRATETYPE bitrate{};
+    bitrate.nPortIndex = kOutputPort;
+    EXPECT_EQ(set(*node, OMX_IndexParamVideoBitrate, bitrate), expected);
+    EXPECT_EQ(get(*node, OMX_IndexParamVideoBitrate, &bitrate), android::OK);
+    bitrate.nPortIndex = kInputPort;  // that one is enabled
+    EXPECT_EQ(set(*node, OMX_IndexParamVideoBitrate, bitrate),
+              test.state == OMX_StateLoaded ? android::status_t{android::OK} : kUnknownError);
+    OMX_VIDEO_CONFIG_BITRATETYPE config{};
+    EXPECT_EQ(server->setConfig(node->node(), OMX_IndexConfigVideoBitrate, &config, sizeof(config)),
+              android::OK);
+    EXPECT_EQ(server->getConfig(node->node(), OMX_IndexConfigVideoBitrate, &config, sizeof(config)),
+              android::OK);
+  }
+}
+
+TEST_F(Parameters, TheSizeArgumentCountsAndNotTheRecordsOwn) {
+  const auto node = client();
+  struct Case {
+    OMX_INDEXTYPE index;
+    size_t size;
+  };
+  const Case cases[] = {
+      {OMX_IndexParamPortDefinition, sizeof(PortDefinition)},
+      {OMX_IndexParamVideoPortFormat, sizeof(OMX_VIDEO_PARAM_PORTFORMATTYPE)},
+      {OMX_IndexParamCompBufferSupplier, sizeof(OMX_PARAM_BUFFERSUPPLIERTYPE)},
+      {OMX_IndexParamVideoInit, sizeof(OMX_PORT_PARAM_TYPE)},
+      {OMX_IndexParamStandardComponentRole, sizeof(OMX_PARAM_COMPONENTROLETYPE)},
+      {OMX_IndexParamVideoAvc, sizeof(OMX_VIDEO_PARAM_AVCTYPE)},
+  };
+  for (const Case& test : cases) {
+    SCOPED_TRACE(::testing::Message() << std::hex << static_cast<OMX_U32>(test.index));
+    // Exactly as large as it says, for the sanitizers to see what lies beyond.
+    for (const size_t size : {size_t{0}, size_t{4}, size_t{8}, size_t{12}, test.size - 1}) {
+      std::vector<uint8_t> record(size, 0);
+      const std::vector<uint8_t> before = record;
+      EXPECT_EQ(server->getParameter(node->node(), test.index, record.data(), size), kUnknownError) << size;
+      EXPECT_EQ(record, before) << size;
+      EXPECT_EQ(server->setParameter(node->node(), test.index, record.data(), size), kUnknownError) << size;
+    }
+    for (const OMX_U32 ownSize : {0u, 1u, 0x41700000u, 0xFFFFFFFFu}) {
+      for (const size_t size : {test.size, test.size + 8}) {
+        std::vector<uint8_t> record(size, 0);
+        std::memcpy(record.data(), &ownSize, sizeof(ownSize));
+        EXPECT_EQ(server->getParameter(node->node(), test.index, record.data(), size), android::OK);
+        EXPECT_EQ(std::memcmp(record.data(), &ownSize, sizeof(ownSize)), 0) << "the client's word";
+      }
+    }
+    EXPECT_EQ(server->getParameter(node->node(), test.index, nullptr, test.size), kUnknownError);
+    EXPECT_EQ(server->setParameter(node->node(), test.index, nullptr, test.size), kUnknownError);
+    std::vector<uint8_t> record(test.size, 0);
+    EXPECT_EQ(server->getParameter(node->node(), test.index, record.data(), SIZE_MAX), kUnknownError);
+  }
+}
+
+TEST_F(Parameters, FailuresReachClientsAsTheirTwoStatuses) {
+  const auto node = client();
+  struct Case {
+    OMX_ERRORTYPE error;
+    android::status_t status;
+  };
+  const Case cases[] = {
+      {OMX_ErrorNone, android::OK},           {OMX_ErrorUnsupportedSetting, android::ERROR_UNSUPPORTED},
+      {OMX_ErrorNoMore, kUnknownError},       {OMX_ErrorUnsupportedIndex, kUnknownError},
+      {OMX_ErrorBadParameter, kUnknownError},
+  };
+  OMX_VIDEO_PARAM_AVCTYPE record{};
+  for (const Case& test : cases) {
+    decoder.refuse(Access::GetParameter, OMX_IndexParamVideoAvc, test.error);
+    decoder.refuse(Access::SetParameter, OMX_IndexParamVideoAvc, test.error);
+    EXPECT_EQ(get(*node, OMX_IndexParamVideoAvc, &record), test.status);
+    EXPECT_EQ(set(*node, OMX_IndexParamVideoAvc, record), test.status);
+  }
+  for (const Access access :
+       {Access::GetParameter, Access::SetParameter, Access::GetConfig, Access::SetConfig}) {
+    decoder.refuse(access, OMX_IndexParamVideoH263, OMX_ErrorUnsupportedSetting);
+  }
+  EXPECT_EQ(server->getConfig(node->node(), OMX_IndexParamVideoH263, &record, sizeof(record)),
+            android::ERROR_UNSUPPORTED);
+  EXPECT_EQ(server->setConfig(node->node(), OMX_IndexParamVideoH263, &record, sizeof(record)),
+            android::ERROR_UNSUPPORTED);
+  EXPECT_EQ(get(*node, OMX_IndexParamVideoMpeg4, &record), kUnknownError) << "an index that nobody knows";
+}
+
+TEST_F(Parameters, StandardRecordsOfAComponentAreAnswered) {
+  const auto node = client();
+  OMX_PORT_PARAM_TYPE ports{};
+  EXPECT_EQ(get(*node, OMX_IndexParamVideoInit, &ports), android::OK);
+  EXPECT_EQ(ports.nPorts, 2u);
+  EXPECT_EQ(get(*node, OMX_IndexParamAudioInit, &ports), android::OK);
+  EXPECT_EQ(ports.nPorts, 0u);
+
+  OMX_PARAM_COMPONENTROLETYPE role{};
+  EXPECT_EQ(get(*node, OMX_IndexParamStandardComponentRole, &role), android::OK);
+  EXPECT_STREQ(reinterpret_cast<const char*>(role.cRole), "video_decoder.avc");
+  EXPECT_EQ(set(*node, OMX_IndexParamStandardComponentRole, role), android::OK);
+  std::memset(role.cRole, 'x', sizeof(role.cRole));  // without an end
+  EXPECT_EQ(set(*node, OMX_IndexParamStandardComponentRole, role), android::ERROR_UNSUPPORTED);
+
+  OMX_PARAM_BUFFERSUPPLIERTYPE supplier{};
+  supplier.nPortIndex = kOutputPort;
+  supplier.eBufferSupplier = OMX_BufferSupplyInput;
+  EXPECT_EQ(set(*node, OMX_IndexParamCompBufferSupplier, supplier), android::OK);
+  supplier.eBufferSupplier = OMX_BufferSupplyUnspecified;
+  EXPECT_EQ(get(*node, OMX_IndexParamCompBufferSupplier, &supplier), android::OK);
+  EXPECT_EQ(supplier.eBufferSupplier, OMX_BufferSupplyInput);
+  supplier.eBufferSupplier = static_cast<OMX_BUFFERSUPPLIERTYPE>(3);
+  EXPECT_EQ(set(*node, OMX_IndexParamCompBufferSupplier, supplier), kUnknownError);
+}
+
+TEST_F(Parameters, ExtensionsAreFoundByNameAndMetaDataIsOneOfThem) {
+  const auto node = client();
+  OMX_INDEXTYPE index{};
+  EXPECT_EQ(
+      server->getExtensionIndex(node->node(), "OMX.google.android.index.storeMetaDataInBuffers", &index),
+      android::OK);
+  EXPECT_EQ(server->getExtensionIndex(node->node(), "OMX.google.android.index.other", &index), kUnknownError);
+  EXPECT_EQ(server->storeMetaDataInBuffers(node->node(), kInputPort, OMX_FALSE), android::OK);
+  EXPECT_EQ(server->storeMetaDataInBuffers(node->node(), kInputPort, OMX_TRUE), android::ERROR_UNSUPPORTED);
+  decoder.setExtensions({});
+  EXPECT_EQ(server->storeMetaDataInBuffers(node->node(), kInputPort, OMX_FALSE), kUnknownError);
+}
+
+}  // namespace
+}  // namespace omxtest

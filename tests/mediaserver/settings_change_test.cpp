@@ -1,0 +1,179 @@
+// New output settings in mid-stream: how they are announced, what waits for the client, and that no picture
+// is lost.
+
+#include "tests/mediaserver/node_fixture.h"
+
+namespace omxtest {
+namespace {
+
+using mediaserver::kInputPort;
+using mediaserver::kOutputPort;
+
+using Words = std::vector<std::string>;
+
+class SettingsChange : public NodeTest {
+ protected:
+  // What a client does after the announcement, when `held` of its buffers are with the node.
+  static void reallocate(OmxClient* node, size_t held) {
+    const size_t before = node->messages().count(fillBufferDone());
+    EXPECT_EQ(node->command(OMX_CommandPortDisable, kOutputPort), android::OK);
+    node->expect(fillBufferDone(), before + held);
+    node->freeBuffers(kOutputPort);
+    node->expectComplete(OMX_CommandPortDisable, kOutputPort);
+    EXPECT_EQ(node->command(OMX_CommandPortEnable, kOutputPort), android::OK);
+    node->populate(kOutputPort);
+    node->expectComplete(OMX_CommandPortEnable, kOutputPort);
+  }
+
+  const Match changed = eventIs(OMX_EventPortSettingsChanged);
+};
+
+TEST_F(SettingsChange, GoesThroughDisableAndEnableAndLosesNoPicture) {
+  for (const OMX_U32 index : {0u, static_cast<OMX_U32>(OMX_IndexParamPortDefinition)}) {
+    const auto node = running();
+    node->empty(0, "small");
+    node->expect(fillBufferDone());
+    decoder.announce(
+        [](mediaserver::PortDefinition& output) {
+          output.nBufferSize = 256;
+          output.nBufferCountActual = 3;
+          output.format.video.nFrameWidth = 320;
+        },
+        index);
+    node->expect(changed);
+    node->expect(emptyBufferDone());
+    // The codec goes on working; what it makes waits.
+    node->empty(0, std::string(64, 'L'));
+    node->empty(1, "larger");
+    node->expect(emptyBufferDone(), 3);
+    settle(node.get());
+    EXPECT_EQ(node->messages().count(fillBufferDone()), 1u) << "one buffer at least is held back";
+    const mediaserver::PortDefinition definition = node->definition(kOutputPort);
+    EXPECT_EQ(definition.nBufferSize, 256u);
+    EXPECT_EQ(definition.nBufferCountActual, 3u);
+    EXPECT_EQ(definition.format.video.nFrameWidth, 320u);
+
+    node->messages().clear();
+    reallocate(node.get(), 1);
+    EXPECT_EQ(node->heard(), (Words{"filled", "complete disable 1", "complete enable 1"}));
+    node->messages().clear();
+    node->fillAll();
+    node->expect(fillBufferDone(), 2);
+    EXPECT_EQ(node->outputs()[0].text(), std::string(64, 'L'));
+    EXPECT_EQ(node->outputs()[1].text(), "larger");
+    EXPECT_EQ(decoder.configured()->at(kOutputPort).nBufferCountActual, 3u);
+  }
+}
+
+TEST_F(SettingsChange, WaitsForABufferThatCanBeHeldBack) {
+  const auto node = client();
+  node->toExecuting();
+  decoder.announce(320, 240);
+  settle(node.get());
+  EXPECT_EQ(node->messages().count(changed), 0u);
+  node->fill(1);
+  node->expect(changed);
+  EXPECT_EQ(node->messages().count(fillBufferDone()), 0u);
+  reallocate(node.get(), 1);
+  EXPECT_EQ(node->definition(kOutputPort).nBufferSize, 320u * 240 * 3 / 2);
+}
+
+TEST_F(SettingsChange, IsFollowedByNoEventBeforeTheBuffersAreBack) {
+  const auto node = running();
+  decoder.announce(320, 240);
+  node->expect(changed);
+  decoder.raiseError(OMX_ErrorStreamCorrupt);
+  node->empty(0, "", OMX_BUFFERFLAG_EOS);
+  node->expect(emptyBufferDone());
+  settle(node.get());
+  EXPECT_EQ(node->messages().count(errorIs(OMX_ErrorStreamCorrupt)), 0u);
+  EXPECT_EQ(node->messages().count(eventIs(OMX_EventBufferFlag)), 0u);
+  node->messages().clear();
+  reallocate(node.get(), 2);
+  const std::string corrupt = "error 0x8000100b";
+  EXPECT_EQ(node->heard(), (Words{"filled", "filled", corrupt, "complete disable 1", "complete enable 1"}));
+  node->fillAll();
+  node->expect(eventIs(OMX_EventBufferFlag));
+}
+
+TEST_F(SettingsChange, OfAConfigurationAloneKeepsTheBuffers) {
+  const auto node = running();
+  decoder.announce([](mediaserver::PortDefinition&) {}, OMX_IndexConfigCommonOutputCrop);
+  node->empty(0, "cropped");
+  node->expect(fillBufferDone());
+  Words heard = node->heard();
+  std::erase(heard, "emptied");
+  EXPECT_EQ(heard, (Words{"settings 1 0x700000f", "filled"}));
+}
+
+TEST_F(SettingsChange, CanFollowAnotherAndComeBehindPictures) {
+  const auto node = running();
+  node->empty(0, "before");
+  node->expect(fillBufferDone());
+  node->fill(0);
+  for (const OMX_U32 width : {320u, 64u, 640u}) {
+    node->messages().clear();
+    decoder.holdOutput();
+    decoder.produce(Packet("last of the old size"));
+    decoder.announce(width, 48);
+    decoder.produce(Packet("first of the new"));
+    decoder.passOutput();
+    node->expect(changed);
+    ASSERT_EQ(node->outputs().size(), 1u);
+    EXPECT_EQ(node->outputs().front().text(), "last of the old size");
+    reallocate(node.get(), 1);
+    EXPECT_EQ(node->definition(kOutputPort).format.video.nFrameWidth, width);
+    node->messages().clear();
+    node->fillAll();
+    node->expect(fillBufferDone());
+    EXPECT_EQ(node->outputs().front().text(), "first of the new");
+    node->fill(0);  // two are held again for the next round
+  }
+}
+
+TEST_F(SettingsChange, IsAnnouncedAgainWhenTheClientWentThroughIdleInstead) {
+  const auto node = running();
+  decoder.announce(320, 240);
+  node->expect(changed);
+  node->messages().clear();
+  node->executingToIdle();
+  EXPECT_EQ(node->messages().count(fillBufferDone()), 2u);
+  node->command(OMX_CommandStateSet, OMX_StateExecuting);
+  node->expectComplete(OMX_CommandStateSet, OMX_StateExecuting);
+  settle(node.get());
+  EXPECT_EQ(node->messages().count(changed), 0u) << "there is nothing to hold back yet";
+  node->fillAll();
+  node->expect(changed);
+  reallocate(node.get(), 2);
+}
+
+TEST_F(SettingsChange, IsSettledByGoingToLoaded) {
+  const auto node = running();
+  decoder.announce(320, 240);
+  node->expect(changed);
+  node->executingToIdle();
+  node->idleToLoaded();
+  node->messages().clear();
+  node->toExecuting();
+  node->fillAll();
+  node->empty(0, "in new buffers");
+  node->expect(fillBufferDone());
+  EXPECT_EQ(node->messages().count(changed), 0u);
+}
+
+TEST_F(SettingsChange, SurvivesAFailureToReallocate) {
+  const auto node = running();
+  decoder.announce(320, 240);
+  node->expect(changed);
+  node->command(OMX_CommandPortDisable, kOutputPort);
+  node->freeBuffers(kOutputPort);
+  node->expectComplete(OMX_CommandPortDisable, kOutputPort);
+  node->command(OMX_CommandPortEnable, kOutputPort);
+  EXPECT_EQ(node->give(kOutputPort), android::OK);
+  // And then no more. The node still stops and goes.
+  node->executingToIdle();
+  node->idleToLoaded();
+}
+
+}  // namespace
+}  // namespace omxtest

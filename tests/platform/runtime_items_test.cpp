@@ -1,0 +1,116 @@
+// What each item that can be changed while an encoder runs sends to the component, per vendor.
+#include <gtest/gtest.h>
+
+#include "tests/core/log_lines.h"
+#include "tests/encoder/encoder_rig.h"
+
+namespace {
+
+using namespace omxtest;
+
+struct Item {
+  CONFIGTYPE type;
+  unsigned long value;
+  OMX_U32 index;
+  Words record;
+};
+
+constexpr unsigned long kHuge = ~0UL;
+
+const std::vector<Item> kQcomItems = {
+    {CONFIG_BITRATE, 500000, 0x06000011, {16, kVersion, 1, 500000}},
+    {CONFIG_BITRATE, 0, 0x06000011, {16, kVersion, 1, 0}},
+    // The size word is the rate as a float.
+    {CONFIG_FRAMERATE, 15, 0x06000012, {0x41700000, kVersion, 1, 0x000F0000}},
+    {CONFIG_FRAMERATE, 30, 0x06000012, {0x41F00000, kVersion, 1, 0x001E0000}},
+    {CONFIG_FRAMERATE, 0, 0x06000012, {0, kVersion, 1, 0}},
+    {CONFIG_FRAMERATE, 65536, 0x06000012, {0x47800000, kVersion, 1, 0}},
+    // Twice these do not fit a signed word.
+    {CONFIG_FRAMERATE, 1073741824, 0x06000012, {0x4E800000, kVersion, 1, 0xFFFF8000}},
+    {CONFIG_FRAMERATE, 0xFFFFFFFF, 0x06000012, {0x4F800000, kVersion, 1, 0xFFFF8000}},
+    {CONFIG_INTRA_PERIOD, 30, 0x7F000007, {24, kVersion, 1, 1, 29, 0}},
+    {CONFIG_INTRA_PERIOD, 1, 0x7F000007, {24, kVersion, 1, 1, 0, 0}},
+    {CONFIG_INTRA_PERIOD, 0, 0x7F000007, {24, kVersion, 1, 1, 0xFFFFFFFF, 0}},
+    {CONFIG_REQUEST_IFRAME, 0, 0x06000013, {16, kVersion, 1, 1}},
+    {CONFIG_REQUEST_IFRAME, 77, 0x06000013, {16, kVersion, 1, 1}},
+    {CONFIG_ROTATION, 90, 0x0700000B, {16, kVersion, 1, 90}},
+    {CONFIG_ROTATION, kHuge, 0x0700000B, {16, kVersion, 1, 0xFFFFFFFF}},
+};
+
+const std::vector<Item> kTiItems = {
+    {CONFIG_BITRATE, 500000, 0x06000011, {16, kVersion, 1, 500000}},
+    // The input port.
+    {CONFIG_FRAMERATE, 15, 0x06000012, {16, kVersion, 0, 0x000F0000}},
+    {CONFIG_FRAMERATE, 2, 0x06000012, {16, kVersion, 0, 0x00020000}},
+    {CONFIG_FRAMERATE, 1, 0x06000012, {16, kVersion, 0, 0x00020000}},
+    {CONFIG_FRAMERATE, 0, 0x06000012, {16, kVersion, 0, 0x00020000}},
+    {CONFIG_FRAMERATE, 65537, 0x06000012, {16, kVersion, 0, 0x00010000}},
+    {CONFIG_REQUEST_IFRAME, 77, 0x06000013, {16, kVersion, 1, 1}},
+    {CONFIG_ROTATION, 270, 0x0700000B, {16, kVersion, 1, 270}},
+};
+
+struct Vendor {
+  const char* device;
+  const std::vector<Item>* items;
+};
+
+std::ostream& operator<<(std::ostream& stream, const Vendor& vendor) {
+  return stream << vendor.device;
+}
+
+class RuntimeItems : public ::testing::TestWithParam<Vendor> {};
+
+TEST_P(RuntimeItems, AreOneRecordEach) {
+  EncoderRig rig(GetParam().device);
+  ASSERT_EQ(rig.create(), 0);
+  for (const Item& item : *GetParam().items) {
+    SCOPED_TRACE(testing::Message() << "item " << item.type << " value " << item.value);
+    rig.server.omx().clearCalls();
+    EXPECT_EQ(rig.session->setConfig(item.type, item.value), 0);
+    const std::vector<Call> calls = rig.server.omx().calls();
+    ASSERT_EQ(calls.size(), 1U);
+    EXPECT_EQ(calls[0].method, Method::SetConfig);
+    EXPECT_EQ(static_cast<OMX_U32>(calls[0].index), item.index);
+    EXPECT_EQ(calls[0].size, item.record.size() * sizeof(OMX_U32));
+    EXPECT_EQ(words(calls[0].record), item.record);
+  }
+  EXPECT_EQ(logLines(rig.log), LogLines());
+}
+
+TEST_P(RuntimeItems, AreRefusedWithALineThatNamesTheIndex) {
+  EncoderRig rig(GetParam().device);
+  ASSERT_EQ(rig.create(), 0);
+  rig.server.omx().failWhere([](const Call& call) { return call.method == Method::SetConfig; });
+  for (const Item& item : *GetParam().items) {
+    rig.log.clear();
+    EXPECT_EQ(rig.session->setConfig(item.type, item.value), OMXI_ERR_SET_CONFIG);
+    char line[64];
+    snprintf(line, sizeof(line), "E ===qoxtest setConfig Error %x!", item.index);
+    EXPECT_EQ(logLines(rig.log), LogLines{line});
+  }
+}
+
+TEST_P(RuntimeItems, EndAtRotation) {
+  EncoderRig rig(GetParam().device);
+  ASSERT_EQ(rig.create(), 0);
+  rig.server.omx().clearCalls();
+  for (const int type : {5, 6, 100, 0x7FFFFFFF}) {
+    EXPECT_EQ(rig.session->setConfig(static_cast<CONFIGTYPE>(type), 1), OMXI_ERR_SET_CONFIG);
+  }
+  EXPECT_EQ(rig.server.omx().count(), 0U);
+  EXPECT_EQ(logLines(rig.log), LogLines());
+}
+
+INSTANTIATE_TEST_SUITE_P(Vendors, RuntimeItems,
+                         ::testing::Values(Vendor{"msm8960", &kQcomItems}, Vendor{"omap4", &kTiItems}),
+                         [](const auto& test) { return std::string(test.param.device); });
+
+TEST(TiRuntimeItems, TakeAnIntraPeriodWithoutACall) {
+  EncoderRig rig("omap4");
+  ASSERT_EQ(rig.create(), 0);
+  rig.server.omx().clearCalls();
+  EXPECT_EQ(rig.session->setConfig(CONFIG_INTRA_PERIOD, 30), 0);
+  EXPECT_EQ(rig.server.omx().count(), 0U);
+}
+
+}  // namespace

@@ -1,0 +1,81 @@
+#pragma once
+// One call to IOMX as a test sees it. A plain value.
+
+#include <cstdint>
+#include <cstring>
+#include <optional>
+#include <string>
+#include <type_traits>
+#include <vector>
+
+#include <media/IOMX.h>
+#include <utils/Errors.h>
+
+namespace omxtest {
+
+enum class Method {
+  LivesLocally,
+  ListNodes,
+  AllocateNode,
+  FreeNode,
+  SendCommand,
+  GetParameter,
+  SetParameter,
+  GetConfig,
+  SetConfig,
+  GetState,
+  StoreMetaDataInBuffers,
+  EnableGraphicBuffers,
+  GetGraphicBufferUsage,
+  UseBuffer,
+  UseGraphicBuffer,
+  AllocateBuffer,
+  AllocateBufferWithBackup,
+  FreeBuffer,
+  FillBuffer,
+  EmptyBuffer,
+  GetExtensionIndex,
+};
+
+// The method as it is written in IOMX.
+const char* name(Method method);
+
+// Only what the method has is filled in. Results (buffer, node, status, and the record of a get) are
+// known after the call: in hooks before it they are empty.
+struct Call {
+  Method method{};
+  size_t number = 0;  // counts all calls, from 1
+  android::IOMX::node_id node = nullptr;
+  std::string text;             // component or extension name
+  OMX_COMMANDTYPE command{};    // SendCommand
+  OMX_S32 param = 0;            // SendCommand
+  OMX_INDEXTYPE index{};        // parameters and configurations
+  std::vector<uint8_t> record;  // as sent by a set; of a get: as sent, and after success as answered
+  size_t size = 0;              // the size argument: of a record, or AllocateBuffer's
+  OMX_U32 port = 0;
+  size_t blockSize = 0;  // UseBuffer, AllocateBufferWithBackup
+  ssize_t blockOffset = 0;
+  android::IOMX::buffer_id buffer = nullptr;
+  OMX_U32 offset = 0;  // EmptyBuffer
+  OMX_U32 length = 0;
+  OMX_U32 flags = 0;
+  OMX_TICKS timestamp = 0;
+  OMX_BOOL enable = OMX_FALSE;  // StoreMetaDataInBuffers, EnableGraphicBuffers
+  bool forwarded = true;        // false: failed on request
+  android::status_t status = android::OK;
+
+  // The record as a T; nothing if it is shorter.
+  template <typename T>
+  std::optional<T> as() const {
+    static_assert(std::is_trivially_copyable_v<T>);
+    if (record.size() < sizeof(T)) return std::nullopt;
+    T value;
+    std::memcpy(&value, record.data(), sizeof(T));
+    return value;
+  }
+};
+
+// One line for a failing test's message.
+std::string describe(const Call& call);
+
+}  // namespace omxtest

@@ -1,0 +1,132 @@
+#pragma once
+// Stands between a node and its client for messages: what the node sends passes the tap, which lets it
+// through, keeps it for later, drops or repeats it, and can send messages of its own making. One tap serves
+// any number of nodes; each client's messages are delivered on a thread of its own, one at a time, and
+// never from inside a call of the test.
+// All functions may be called from any thread, also from a delivery. Matches and filters run on the nodes'
+// threads and must not call the tap.
+
+#include <chrono>
+#include <condition_variable>
+#include <cstddef>
+#include <functional>
+#include <list>
+#include <map>
+#include <mutex>
+#include <vector>
+
+#include <media/IOMX.h>
+
+namespace omxtest {
+
+enum class Fate { Pass, Hold, Drop, Repeat };  // Repeat: delivered twice
+
+using Filter = std::function<Fate(const android::omx_message&)>;
+using Match = std::function<bool(const android::omx_message&)>;
+
+// Matches for the usual kinds of messages.
+Match anyMessage();
+Match anyEvent();
+Match eventIs(OMX_EVENTTYPE event);
+Match commandComplete(OMX_COMMANDTYPE command);
+Match commandComplete(OMX_COMMANDTYPE command, OMX_U32 data);
+Match emptyBufferDone();
+Match fillBufferDone();
+
+// Messages to forge.
+android::omx_message makeEvent(OMX_EVENTTYPE event, OMX_U32 data1, OMX_U32 data2);
+android::omx_message makeEmptyBufferDone(android::IOMX::buffer_id buffer);
+android::omx_message makeFillBufferDone(android::IOMX::buffer_id buffer, OMX_U32 length, OMX_U32 flags = 0,
+                                        OMX_TICKS timestamp = 0);
+
+class MessageTap {
+ public:
+  using NodeId = android::IOMX::node_id;
+
+  MessageTap();
+  ~MessageTap();  // drops what is held, waits for deliveries in progress
+  MessageTap(const MessageTap&) = delete;
+  MessageTap& operator=(const MessageTap&) = delete;
+
+  // --- What happens to messages from now on. The latest rule that matches decides; without one they pass.
+
+  // Rules with a count end after that many messages.
+  void hold(Match match);
+  void hold(Match match, size_t count);
+  void drop(Match match);
+  void drop(Match match, size_t count);
+  void repeat(Match match);
+  void repeat(Match match, size_t count);
+  // Decides about everything that no rule matches. Null: all pass.
+  void setFilter(Filter filter);
+  // Forgets rules and filter; what is held stays held.
+  void passAll();
+
+  // --- Held messages, oldest first.
+
+  std::vector<android::omx_message> held() const;
+  [[nodiscard]] bool waitForHeld(size_t count, std::chrono::milliseconds limit) const;
+  [[nodiscard]] bool waitForHeld(size_t count) const;
+  // Delivers the held message at `position` (so reordering is a choice of positions); false if there is
+  // none. Also when its node has been freed: that is a late message.
+  bool release(size_t position = 0);
+  void releaseAll();
+  void releaseAllReversed();
+  // Drops the held message at `position`; false if there is none.
+  bool discard(size_t position = 0);
+
+  // --- Messages out of nothing. The node in the message is `node` unless it names one itself; it is
+  // delivered to `node`'s client behind what waits there, also after freeNode. False for a node that never
+  // was, or that was forgotten.
+  bool forge(NodeId node, const android::omx_message& message);
+
+  // Every message that a client has handled, in that order.
+  std::vector<android::omx_message> delivered() const;
+  size_t deliveredCount(const Match& match) const;
+  // Waits until `count` matching ones have been delivered, that is: the client's function has returned.
+  [[nodiscard]] bool waitForDelivered(const Match& match, size_t count,
+                                      std::chrono::milliseconds limit) const;
+  [[nodiscard]] bool waitForDelivered(const Match& match, size_t count = 1) const;
+
+  // Lets go of the clients of freed nodes, and of messages held for them.
+  void forgetFreedNodes();
+
+  // --- For RecordingOmx.
+
+  // The observer to give to the server in the client's place. Null when there is no thread for it.
+  android::sp<android::IOMXObserver> wrap(const android::sp<android::IOMXObserver>& client);
+  void attach(const android::sp<android::IOMXObserver>& wrapped, NodeId node);
+  // As freeNode: nothing more is delivered by itself, and no delivery is in progress (but the one that this
+  // is called from). Held messages stay.
+  void detach(NodeId node);
+
+ private:
+  class Observer;
+  class Delivery;
+  struct Link;
+  struct Rule {
+    Match match;
+    Fate fate;
+    size_t left;
+  };
+  struct Held {
+    android::sp<Observer> observer;
+    android::omx_message message;
+  };
+
+  void addRule(Match match, Fate fate, size_t count);
+  void onMessage(const android::sp<Observer>& observer, const android::omx_message& message);
+  Fate decide(const android::omx_message& message);
+  void noteDelivered(const android::omx_message& message);
+
+  mutable std::mutex _mutex;  // guards everything below; never held while a client is called
+  mutable std::condition_variable _changed;
+  std::list<Rule> _rules;  // the latest first
+  Filter _filter;
+  std::list<Held> _held;
+  std::vector<android::omx_message> _delivered;
+  std::map<NodeId, android::sp<Observer>> _live;
+  std::map<NodeId, android::sp<Observer>> _freed;
+};
+
+}  // namespace omxtest

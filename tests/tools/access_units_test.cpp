@@ -1,0 +1,252 @@
+// An H.264 byte stream cut into access units.
+#include "tools/h264/access_units.h"
+
+#include <gtest/gtest.h>
+
+#include <string>
+
+#include "tests/tools/temporary_directory.h"
+
+namespace {
+
+using namespace tool;
+using tooltest::TemporaryDirectory;
+
+// Writes the payload of a NAL unit.
+class BitWriter {
+ public:
+  BitWriter& u(unsigned int count, uint32_t value) {
+    for (unsigned int i = count; i-- > 0;) {
+      if (_used % 8 == 0) _bytes.push_back(0);
+      _bytes.back() =
+          static_cast<char>(_bytes.back() | static_cast<char>((value >> i & 1) << (7 - _used % 8)));
+      ++_used;
+    }
+    return *this;
+  }
+  BitWriter& ue(uint32_t value) {
+    unsigned int length = 0;
+    while ((value + 1) >> (length + 1) != 0) ++length;
+    return u(length, 0).u(length + 1, value + 1);
+  }
+  BitWriter& se(int32_t value) {
+    return ue(value > 0 ? static_cast<uint32_t>(value) * 2 - 1 : static_cast<uint32_t>(-value) * 2);
+  }
+  // With the stop bit and the bytes that keep start codes out.
+  std::string nal(int header) {
+    u(1, 1);
+    std::string result(1, static_cast<char>(header));
+    int zeros = 0;
+    for (const char byte : _bytes) {
+      if (zeros >= 2 && (byte & ~3) == 0) {
+        result += '\3';
+        zeros = 0;
+      }
+      zeros = byte == 0 ? zeros + 1 : 0;
+      result += byte;
+    }
+    return result;
+  }
+
+ private:
+  std::string _bytes;
+  unsigned int _used = 0;
+};
+
+constexpr int kHigh = 100;
+
+// 6 bits of frame number, order type 0 with 8 bits; `interlaced` allows fields; 25 frames a second.
+std::string sps(bool interlaced = false, uint32_t profile = 66) {
+  BitWriter bits;
+  bits.u(8, profile).u(8, 0).u(8, 31).ue(0);
+  if (profile == kHigh)
+    bits.ue(1).ue(0).ue(0).u(1, 0).u(1, 1).u(1, 1).se(2).se(-10).u(7, 0);  // a scaling list
+  bits.ue(2).ue(0).ue(4).ue(1).u(1, 0).ue(10).ue(8).u(1, interlaced ? 0 : 1);
+  if (interlaced) bits.u(1, 0);
+  bits.u(1, 1).u(1, 0);
+  bits.u(1, 1).u(4, 0).u(1, 1).u(32, 1).u(32, 50).u(1, 1);  // timing
+  return bits.nal(0x67);
+}
+
+std::string pps(uint32_t id = 0) {
+  return BitWriter().ue(id).ue(0).u(1, 0).u(1, 0).ue(0).nal(0x68);
+}
+
+struct Slice {
+  uint32_t first = 0;
+  uint32_t frame = 0;
+  uint32_t order = 0;
+  uint32_t pps = 0;
+  bool idr = false;
+  uint32_t idrId = 0;
+  bool reference = true;
+  int field = -1;  // 0 top, 1 bottom; only with interlaced parameters
+};
+
+std::string slice(const Slice& fields, bool interlaced = false) {
+  BitWriter bits;
+  bits.ue(fields.first).ue(7).ue(fields.pps).u(6, fields.frame);
+  if (interlaced) bits.u(1, fields.field >= 0 ? 1 : 0);
+  if (fields.field >= 0) bits.u(1, fields.field == 1 ? 1 : 0);
+  if (fields.idr) bits.ue(fields.idrId);
+  bits.u(8, fields.order).u(16, 0xFFFF);
+  return bits.nal(fields.idr ? 0x65 : fields.reference ? 0x61 : 0x01);
+}
+
+const std::string kDelimiter = "\x09\xF0";
+const std::string kSei = std::string("\x06\x05\x01\x80", 4);
+const std::string kPrefix = "\x6E\x80\x80";
+
+using Units = std::vector<std::vector<std::string>>;
+
+struct Cut {
+  std::vector<std::string> units;
+  std::string failure;
+  std::optional<FrameRate> rate;
+};
+
+Cut cut(const std::string& stream) {
+  const TemporaryDirectory directory;
+  auto bytes = ByteReader::open(directory.write("in", stream), {});
+  AccessUnitReader reader(std::move(bytes.value()));
+  Cut result;
+  std::vector<uint8_t> unit;
+  for (;;) {
+    const auto more = reader.next(unit);
+    if (!more.ok()) result.failure = more.failure().text;
+    if (!more.ok() || !more.value()) break;
+    result.units.emplace_back(unit.begin(), unit.end());
+  }
+  result.rate = reader.frameRate();
+  return result;
+}
+
+// The stream with start codes of either length, in turn.
+std::vector<std::string> withStartCodes(const Units& units) {
+  std::vector<std::string> result;
+  int number = 0;
+  for (const auto& unit : units) {
+    std::string bytes;
+    for (const std::string& nal : unit) bytes += std::string(number++ % 3 == 1 ? 2 : 3, '\0') + '\1' + nal;
+    result.push_back(bytes);
+  }
+  return result;
+}
+
+std::string joined(const std::vector<std::string>& parts) {
+  std::string result;
+  for (const std::string& part : parts) result += part;
+  return result;
+}
+
+TEST(AccessUnits, EndWhereThePictureEnds) {
+  const std::string idr = slice({.idr = true});
+  const struct {
+    const char* name;
+    Units units;
+  } cases[] = {
+      {"a slice a picture",
+       {{sps(), pps(), idr}, {slice({.frame = 1, .order = 2})}, {slice({.frame = 2, .order = 4})}}},
+      {"several slices",
+       {{sps(), pps(), idr, slice({.first = 40, .idr = true})},
+        {slice({.frame = 1}), slice({.first = 50, .frame = 1}), slice({.first = 60, .frame = 1})}}},
+      {"slices in any order",
+       {{sps(), pps(), slice({.first = 40, .idr = true}), idr},
+        {slice({.first = 9, .frame = 1}), slice({.first = 0, .frame = 1})}}},
+      {"a lost first slice", {{sps(), pps(), idr}, {slice({.first = 30, .frame = 1, .order = 2})}}},
+      {"redundant slices", {{sps(), pps(), idr, idr, idr}, {slice({.frame = 1})}}},
+      {"key frames side by side", {{sps(), pps(), idr}, {slice({.idr = true, .idrId = 1})}, {idr}}},
+      {"no references",
+       {{sps(), pps(), idr},
+        {slice({.order = 2, .reference = false})},
+        {slice({.order = 4, .reference = false})}}},
+      {"parameter sets again",
+       {{sps(), pps(), idr}, {sps(), pps(), slice({.idr = true, .idrId = 1})}, {sps(), idr}}},
+      {"other picture parameters", {{sps(), pps(), pps(1), idr}, {slice({.pps = 1, .idr = true})}}},
+      {"delimiters and messages",
+       {{kDelimiter, sps(), pps(), kSei, idr},
+        {kDelimiter, slice({.frame = 1})},
+        {kSei, slice({.frame = 2})},
+        {kDelimiter, kSei, slice({.frame = 3})}}},
+      {"prefixes before each slice",
+       {{sps(), pps(), kPrefix, idr, kPrefix, slice({.first = 9, .idr = true})},
+        {kPrefix, slice({.frame = 1})},
+        {kPrefix, kSei, slice({.frame = 2})}}},
+      {"end of sequence", {{sps(), pps(), idr, "\x0A"}, {sps(), pps(), idr}}},
+      {"a scaling list",
+       {{sps(false, kHigh), pps(), idr}, {slice({.frame = 1}), slice({.first = 5, .frame = 1})}}},
+  };
+  for (const auto& each : cases) {
+    const std::vector<std::string> expected = withStartCodes(each.units);
+    const Cut result = cut(joined(expected));
+    EXPECT_EQ(result.units, expected) << each.name;
+    EXPECT_EQ(result.failure, "") << each.name;
+    EXPECT_EQ(result.rate, (FrameRate{25, 1})) << each.name;
+  }
+}
+
+TEST(AccessUnits, EndWithEachField) {
+  const std::string top = slice({.idr = true, .field = 0}, true);
+  const std::string bottom = slice({.frame = 0, .order = 1, .field = 1}, true);
+  const std::string frame = slice({.frame = 1, .order = 2}, true);
+  const auto expected = withStartCodes({{sps(true), pps(), top}, {bottom}, {frame}});
+  EXPECT_EQ(cut(joined(expected)).units, expected);
+}
+
+TEST(AccessUnits, GoByTheFirstMacroblockWhereParametersAreMissing) {
+  const std::string idr = slice({.idr = true});
+  const auto expected =
+      withStartCodes({{idr, slice({.first = 7, .idr = true})}, {slice({.frame = 0})}, {slice({})}});
+  const Cut result = cut(joined(expected));
+  EXPECT_EQ(result.units, expected);
+  EXPECT_EQ(result.rate, std::nullopt);
+}
+
+TEST(AccessUnits, SurviveStreamsThatAreDamagedOrNone) {
+  const auto units = withStartCodes({{sps(), pps(), slice({.idr = true})}, {slice({.frame = 1})}});
+  const std::string good = joined(units);
+  EXPECT_EQ(cut("garbage" + good).units, units);
+  EXPECT_EQ(cut(std::string(100000, '\0') + good).units.size(), 2U);
+  for (const std::string& none : {std::string(), std::string("\0\0\1", 3), std::string(100, '\0'),
+                                  std::string(200000, 'x'), "\0\0\1" + sps() + std::string("\0\0\1\x68", 4),
+                                  joined(withStartCodes({{sps(), pps(), kSei, kDelimiter}}))}) {
+    const Cut result = cut(none);
+    EXPECT_TRUE(result.units.empty());
+    EXPECT_NE(result.failure.find("Annex B"), std::string::npos) << result.failure;
+  }
+  // Cut at every byte, and with every byte broken: no more than the reader's own checks are asked here.
+  for (size_t i = 0; i < good.size(); ++i) {
+    const Cut shortened = cut(good.substr(0, i));
+    EXPECT_LE(shortened.units.size(), 2U);
+    EXPECT_LE(joined(shortened.units).size(), i);
+    for (const char broken : {'\0', '\xFF', '\1'}) {
+      std::string damaged = good;
+      damaged[i] = broken;
+      EXPECT_LE(joined(cut(damaged).units).size(), good.size());
+    }
+  }
+}
+
+TEST(AccessUnits, AreReadOverTheEdgesOfTheBuffer) {
+  // Slices of many lengths put start codes at every place of the reader's chunks.
+  Units units{{sps(), pps(), slice({.idr = true}) + std::string(65500, 'x')}};
+  for (uint32_t i = 1; i < 60; ++i) {
+    units.push_back({slice({.frame = i}) + std::string(65536 - 20 + i, 'y')});
+  }
+  const auto expected = withStartCodes(units);
+  EXPECT_EQ(cut(joined(expected)).units, expected);
+}
+
+TEST(AccessUnits, TellPicturesFromParametersAlone) {
+  const auto bytes = [](const std::string& text) { return std::vector<uint8_t>(text.begin(), text.end()); };
+  const auto parameters = bytes(joined(withStartCodes({{sps(false, kHigh), pps()}})));
+  EXPECT_FALSE(holdsPicture(parameters));
+  EXPECT_FALSE(holdsPicture({}));
+  EXPECT_TRUE(holdsPicture(bytes(joined(withStartCodes({{sps(), pps(), slice({.idr = true})}})))));
+  const auto info = findSequenceInfo(parameters);
+  ASSERT_TRUE(info);
+  EXPECT_EQ(toText(*info), "High, level 3.1");
+  EXPECT_FALSE(findSequenceInfo(bytes(joined(withStartCodes({{slice({})}})))));
+}
+
+}  // namespace

@@ -1,0 +1,182 @@
+// Calls and decodings on every emulated device, with the real components: what comes out, and what the
+// report says of it.
+#include <gtest/gtest.h>
+#include <signal.h>
+
+#include <cmath>
+#include <nlohmann/json.hpp>
+#include <ostream>
+
+#include "tests/tools/process.h"
+
+namespace {
+
+using namespace tooltest;
+using nlohmann::json;
+
+constexpr int kInput = 3;
+constexpr int kOutput = 4;
+constexpr int kInterrupted = 130;
+constexpr size_t kHeadBytes = 6;  // "FRAME" and a line feed
+
+json report(std::vector<std::string> arguments) {
+  arguments.emplace_back("--json");
+  const Ended run = runTool(arguments);
+  EXPECT_EQ(run.exitCode, 0) << run.err;
+  EXPECT_EQ(run.err, "");
+  return json::parse(run.out, nullptr, false);
+}
+
+// How many pictures a Y4M file holds; -1 where it is not whole.
+long picturesIn(const std::string& path, size_t pictureBytes) {
+  const std::string content = contentOf(path);
+  const size_t head = content.find('\n') + 1;
+  const size_t each = kHeadBytes + pictureBytes;
+  if (!content.starts_with("YUV4MPEG2 ") || (content.size() - head) % each != 0) return -1;
+  for (size_t at = head; at < content.size(); at += each) {
+    if (content.compare(at, kHeadBytes, "FRAME\n") != 0) return -1;
+  }
+  return static_cast<long>((content.size() - head) / each);
+}
+
+struct DeviceCase {
+  const char* name;
+  double psnr;  // dB, at least
+};
+
+void PrintTo(const DeviceCase& device, std::ostream* stream) {
+  *stream << device.name;
+}
+
+class CallOn : public testing::TestWithParam<DeviceCase> {};
+
+TEST_P(CallOn, LosesNothingAndKeepsItsQualityAndRate) {
+  const json figures = report({"call", "-d", GetParam().name, "-n", std::to_string(CALL_FRAMES)});
+  EXPECT_EQ(figures["device"], GetParam().name);
+  EXPECT_EQ(figures["frames_in"], CALL_FRAMES);
+  EXPECT_EQ(figures["frames_encoded"], CALL_FRAMES);
+  EXPECT_EQ(figures["frames_decoded"], CALL_FRAMES);
+  EXPECT_EQ(figures["frames_dropped"], 0);
+  EXPECT_EQ(figures["frames_out_of_order"], 0);
+  EXPECT_EQ(figures["bitrate_target"], 1'000'000);
+  EXPECT_NEAR(figures["bitrate_reached"], 1e6, 1e5);
+  EXPECT_GE(figures["psnr_y"], GetParam().psnr);
+  EXPECT_LT(figures["psnr_y"], 60) << "no lossy coder does that";
+  EXPECT_GT(figures["latency_ms"]["p50"], 0);
+  EXPECT_LE(figures["latency_ms"]["p50"], figures["latency_ms"]["p95"]);
+  EXPECT_LE(figures["latency_ms"]["p95"], figures["latency_ms"]["p99"]);
+  EXPECT_GT(figures["cpu_seconds"], 0);
+}
+
+TEST_P(CallOn, WritesAStreamThatDecodesToThePicturesItWrote) {
+  const TemporaryDirectory directory;
+  const std::string stream = directory.file("coded.264");
+  const std::string called = directory.file("called.y4m");
+  const std::string decoded = directory.file("decoded.y4m");
+  const json figures = report({"call", "-d", GetParam().name, "-s", "320x176", "--fps", "25", "-n", "40",
+                               "-k", "10", "-p", "high", "--stream", stream, "-o", called});
+  EXPECT_EQ(figures["frames_decoded"], 40);
+  EXPECT_EQ(figures["profile"], std::string(GetParam().name) == "msm7x30" ? 66 : 100);
+  EXPECT_EQ(picturesIn(called, 320 * 176 * 3 / 2), 40);
+  const json again = report({"decode", "-d", GetParam().name, stream, "-o", decoded, "--fps", "25"});
+  EXPECT_EQ(again["access_units"], 40);
+  EXPECT_EQ(again["frames_decoded"], 40);
+  EXPECT_TRUE(contentOf(called) == contentOf(decoded));
+  EXPECT_EQ(directory.names().size(), 3U);
+}
+
+INSTANTIATE_TEST_SUITE_P(Device, CallOn,
+                         testing::Values(DeviceCase{"msm7x30", 35}, DeviceCase{"msm8x55", 35},
+                                         DeviceCase{"msm8x60", 28}, DeviceCase{"msm8960", 35},
+                                         DeviceCase{"omap4", 35}),
+                         [](const auto& instance) { return std::string(instance.param.name); });
+
+TEST(Call, TakesItsOwnOutputBackInEveryForm) {
+  const TemporaryDirectory directory;
+  const std::string y4m = directory.file("a.y4m");
+  const std::string raw = directory.file("a.yuv");
+  report({"call", "-s", "64x48", "-n", "9", "--fps", "29.97", "-o", y4m});
+  const json fromFile = report({"call", y4m, "-o", raw});
+  EXPECT_EQ(fromFile["frames_decoded"], 9);
+  EXPECT_EQ(fromFile["fps"], 29.97);
+  const json fromRaw = report({"call", raw, "-s", "64x48", "-n", "7", "--fps", "12"});
+  EXPECT_EQ(fromRaw["frames_in"], 7);
+
+  const Ended piped = runTool({"call", "-", "-o", "-"}, {.in = y4m});
+  EXPECT_EQ(piped.exitCode, 0) << piped.err;
+  EXPECT_EQ(picturesIn(directory.write("piped.y4m", piped.out), 64 * 48 * 3 / 2), 9);
+  EXPECT_NE(piped.err.find("Decoded        9"), std::string::npos) << piped.err;
+}
+
+TEST(Call, GoesOnWithACutInputAndSaysSo) {
+  const TemporaryDirectory directory;
+  report({"call", "-s", "64x48", "-n", "9", "-o", directory.file("a.y4m")});
+  const std::string content = contentOf(directory.file("a.y4m"));
+  const std::string cut = directory.write("cut.y4m", content.substr(0, content.size() - 100));
+  const std::string output = directory.file("b.y4m");
+  const Ended run = runTool({"call", cut, "-o", output});
+  EXPECT_EQ(run.exitCode, kInput);
+  EXPECT_NE(run.err.find("cut.y4m: ends in the middle of picture 8"), std::string::npos) << run.err;
+  EXPECT_NE(run.out.find("Decoded        8"), std::string::npos) << run.out;
+  EXPECT_EQ(picturesIn(output, 64 * 48 * 3 / 2), 8);
+}
+
+TEST(Call, EndsCleanlyAtCtrlC) {
+  const TemporaryDirectory directory;
+  const std::string output = directory.file("a.y4m");
+  // The stream on standard output shows that the call runs.
+  Process tool({"call", "-n", "1000000000", "-r", "--stream", "-", "-o", output});
+  ASSERT_TRUE(tool.waitForOutput(std::string_view("\0\0\1", 3)));
+  EXPECT_FALSE(std::filesystem::exists(output));
+  tool.signal(SIGINT);
+  const Ended run = tool.finish();
+  EXPECT_EQ(run.exitCode, kInterrupted) << run.err;
+  EXPECT_NE(run.err.find("Dropped        0"), std::string::npos) << run.err;
+  EXPECT_GE(picturesIn(output, 640 * 480 * 3 / 2), 1);
+  EXPECT_EQ(directory.names(), std::vector<std::string>{"a.y4m"});
+}
+
+TEST(Call, EndsWhenNobodyReadsItsOutput) {
+  const TemporaryDirectory directory;
+  Process tool({"call", "-n", "1000000000", "-o", "-", "--stream", directory.file("a.264")});
+  ASSERT_TRUE(tool.waitForOutput("FRAME"));
+  tool.closeOutput();
+  const Ended run = tool.finish();
+  EXPECT_EQ(run.exitCode, kOutput);
+  EXPECT_NE(run.err.find("standard output: whoever was reading it has gone"), std::string::npos) << run.err;
+  EXPECT_TRUE(directory.names().empty());
+}
+
+TEST(Call, ShowsProgressOnATerminalOnly) {
+  const Ended terminal =
+      runTool({"call", "-s", "64x48", "-n", "30", "--fps", "100", "-r"}, {.terminal = true});
+  EXPECT_EQ(terminal.exitCode, 0);
+  EXPECT_NE(terminal.err.find("/30 frames"), std::string::npos) << terminal.err;
+  EXPECT_EQ(runTool({"call", "-s", "64x48", "-n", "30"}).err, "");
+}
+
+TEST(Decode, TakesDamageAndReportsPicturesThatChangeTheirSize) {
+  const TemporaryDirectory directory;
+  report({"call", "-s", "64x48", "-n", "20", "--stream", directory.file("a.264")});
+  report({"call", "-s", "96x64", "-n", "20", "--stream", directory.file("b.264")});
+  const std::string small = contentOf(directory.file("a.264"));
+  const std::string large = contentOf(directory.file("b.264"));
+
+  const std::string both = directory.write("both.264", small + large);
+  const std::string raw = directory.file("both.yuv");
+  const json figures = report({"decode", both, "-o", raw});
+  EXPECT_EQ(figures["frames_decoded"], 40);
+  EXPECT_EQ(figures["size_changes"], 1);
+  EXPECT_EQ(contentOf(raw).size(), size_t{20 * (64 * 48 + 96 * 64) * 3 / 2});
+  const Ended y4m = runTool({"decode", both, "-o", directory.file("both.y4m")});
+  EXPECT_EQ(y4m.exitCode, kOutput);
+  EXPECT_NE(y4m.err.find("--format raw"), std::string::npos) << y4m.err;
+  EXPECT_FALSE(std::filesystem::exists(directory.file("both.y4m")));
+
+  std::string damaged = large;
+  for (size_t i = damaged.size() / 4; i < damaged.size(); i += 97) damaged[i] = static_cast<char>(i);
+  const Ended run = runTool({"decode", directory.write("damaged.264", damaged), "--json"});
+  EXPECT_TRUE(run.exitCode == 0 || run.exitCode == kInput) << run.err;
+}
+
+}  // namespace

@@ -1,0 +1,164 @@
+// The command line as a user meets it: what it refuses and how, help, lists, exit codes.
+#include <gtest/gtest.h>
+#include <signal.h>
+
+#include <nlohmann/json.hpp>
+#include <set>
+
+#include "tests/tools/process.h"
+
+namespace {
+
+using namespace tooltest;
+using nlohmann::json;
+
+constexpr int kUsage = 2;
+constexpr int kInput = 3;
+constexpr int kOutput = 4;
+constexpr int kDevice = 5;
+constexpr int kInterrupted = 130;
+
+bool contains(const std::string& text, std::string_view part) {
+  return text.find(part) != std::string::npos;
+}
+
+TEST(CommandLine, RefusesWhatItDoesNotUnderstandAndSaysWhatItTakes) {
+  const struct {
+    std::vector<std::string> arguments;
+    const char* complaint;
+  } cases[] = {
+      {{}, "subcommand is required"},
+      {{"sing"}, "subcommand is required"},
+      {{"call", "--loud"}, "--loud"},
+      {{"call", "a", "b"}, "b"},
+      {{"call", "--size", "640"}, "\"640\" is not a size as 640x480"},
+      {{"call", "--size", "641x480"}, "641x480 is an odd size"},
+      {{"call", "--fps", "0"}, "\"0\" is not a rate"},
+      {{"call", "--bitrate", "1G"}, "\"1G\" is not a rate from 1k to 1000M"},
+      {{"call", "--profile", "extended"}, "is not baseline, main or high"},
+      {{"call", "--frames", "0"}, "is not a number from 1 on"},
+      {{"call", "--frames", "99999999999999999999"}, "is not a number from 1 on"},
+      {{"call", "--refs", "17"}, "is not a number from 1 to 16"},
+      {{"call", "--entropy", "huffman"}, "cabac"},
+      {{"call", "--format", "avi"}, "y4m"},
+      {{"call", "--device", "nokia"}, "no device \"nokia\"; there are msm7x30, "},
+      {{"call", "-o", "-", "--stream", "-"}, "cannot both go to -"},
+      {{"call", "-o", "a", "--stream", "a"}, "cannot both go to a"},
+      {{"call", "-o", "-", "--json"}, "--json needs standard output for itself"},
+      {{"decode"}, "INPUT is required"},
+      {{"decode", "a", "--bitrate", "1M"}, "--bitrate"},
+  };
+  for (const auto& each : cases) {
+    SCOPED_TRACE(each.arguments.empty() ? "" : each.arguments.back());
+    const Ended run = runTool(each.arguments);
+    EXPECT_EQ(run.exitCode, kUsage);
+    EXPECT_TRUE(contains(run.err, each.complaint)) << run.err;
+    EXPECT_EQ(run.out, "");
+  }
+  const Ended run = runTool({"devices"}, {.environment = {"OMXBRIDGE_DEVICE=nokia"}});
+  EXPECT_EQ(run.exitCode, kUsage);
+  EXPECT_TRUE(contains(run.err, "OMXBRIDGE_DEVICE: no device \"nokia\"")) << run.err;
+}
+
+TEST(CommandLine, HelpsWithExamplesAndExitCodes) {
+  for (const std::vector<std::string>& arguments :
+       {std::vector<std::string>{"--help"}, {"call", "--help"}, {"decode", "-h"}, {"devices", "--help"}}) {
+    const Ended run = runTool(arguments);
+    EXPECT_EQ(run.exitCode, 0);
+    EXPECT_EQ(run.err, "");
+    EXPECT_TRUE(contains(run.out, "Usage: omxbridge")) << run.out;
+  }
+  EXPECT_TRUE(contains(runTool({"--help"}).out, "Exit codes:"));
+  EXPECT_TRUE(contains(runTool({"call", "--help"}).out, "Examples:"));
+  EXPECT_TRUE(contains(runTool({"decode", "--help"}).out, "  130  interrupted"));
+  EXPECT_EQ(runTool({"--version"}).exitCode, 0);
+}
+
+TEST(CommandLine, ListsTheDevices) {
+  const auto list = json::parse(runTool({"devices", "--json", "-d", "omap4"}).out)["devices"];
+  ASSERT_GE(list.size(), 6U);
+  size_t chosen = 0;
+  for (const auto& device : list) {
+    if (!device["chosen"]) continue;
+    ++chosen;
+    EXPECT_EQ(device["name"], "omap4");
+    EXPECT_EQ(device["hardware_version"], 5);
+    EXPECT_EQ(device["decoder"], "OMX.TI.DUCATI1.VIDEO.DECODER==");
+  }
+  EXPECT_EQ(chosen, 1U);
+  const Ended table = runTool({"devices"});
+  EXPECT_EQ(table.exitCode, 0);
+  EXPECT_TRUE(contains(table.out, "* msm8960 ")) << table.out;
+  EXPECT_TRUE(contains(table.out, "4 (MSM8x60)")) << table.out;
+}
+
+TEST(CommandLine, ListsTheComponentsAndWhatTheyAreUsedFor) {
+  const Ended run = runTool({"components", "--json", "-d", "omap4"});
+  ASSERT_EQ(run.exitCode, 0) << run.err;
+  const json object = json::parse(run.out);
+  EXPECT_EQ(object["device"], "omap4");
+  std::set<std::string> uses;
+  for (const auto& component : object["components"]) {
+    EXPECT_TRUE(component["available"]);
+    if (!component["use"].is_null()) uses.insert(component["use"]);
+  }
+  EXPECT_EQ(uses, (std::set<std::string>{"decoder", "encoder"}));
+  EXPECT_TRUE(contains(runTool({"components"}).out, "hardware version 1")) << run.out;
+
+  const Ended none = runTool({"components", "-d", "exynos4"});
+  EXPECT_EQ(none.exitCode, 0) << none.err;
+  EXPECT_TRUE(contains(none.out, "no components")) << none.out;
+  const Ended noServer =
+      runTool({"components"}, {.environment = {"OMXBRIDGE_MEDIASERVER=/missing", "OMXBRIDGE_LOG=silent"}});
+  EXPECT_EQ(noServer.exitCode, kDevice);
+  EXPECT_TRUE(contains(noServer.err, "OMXBRIDGE_MEDIASERVER")) << noServer.err;
+}
+
+TEST(CommandLine, NamesTheFileThatIsWrong) {
+  const TemporaryDirectory directory;
+  const std::string text = directory.write("notes.txt", "nothing of interest, but rather long");
+  const std::string empty = directory.write("empty", "");
+  const struct {
+    std::vector<std::string> arguments;
+    int exitCode;
+    std::string name;
+  } cases[] = {
+      {{"call", directory.file("missing")}, kInput, "missing"},
+      {{"call", text}, kInput, "notes.txt"},
+      {{"call", empty}, kInput, "empty"},
+      {{"call", "-"}, kInput, "standard input"},
+      {{"call", text, "--size", "64x64"}, kInput, "notes.txt"},
+      {{"call", directory.file("")}, kInput, directory.file("")},
+      {{"decode", text}, kInput, "notes.txt"},
+      {{"decode", empty}, kInput, "empty"},
+      {{"call", "-o", directory.file("no/a.y4m")}, kOutput, "no/a.y4m"},
+      {{"call", "--stream", "/dev/full"}, kOutput, "/dev/full"},
+      {{"call", "-o", "/dev/full"}, kOutput, "/dev/full"},
+      {{"call", "-d", "exynos4"}, kDevice, "exynos4"},
+      {{"call", "-s", "8192x16", "-n", "1"}, kDevice, "8192x16"},
+  };
+  for (const auto& each : cases) {
+    SCOPED_TRACE(each.arguments.back());
+    const Ended run = runTool(each.arguments);
+    EXPECT_EQ(run.exitCode, each.exitCode) << run.err;
+    EXPECT_TRUE(contains(run.err, "omxbridge: ")) << run.err;
+    EXPECT_TRUE(contains(run.err, each.name)) << run.err;
+  }
+  EXPECT_EQ(directory.names().size(), 2U) << "left behind";
+  EXPECT_EQ(runTool({"devices"}, {.out = "/dev/full"}).exitCode, kOutput);
+}
+
+TEST(CommandLine, EndsAtCtrlCWhileItWaitsForInput) {
+  for (const int number : {SIGINT, SIGTERM}) {
+    const TemporaryDirectory directory;
+    Process tool({"call", "-", "-o", directory.file("a.y4m")}, {.inPipe = true});
+    tool.send("YUV4MPEG2 W64 H64 F30:1\n");
+    ASSERT_TRUE(tool.waitForOutput("Components"));
+    tool.signal(number);
+    const Ended run = tool.finish();
+    EXPECT_EQ(run.exitCode, kInterrupted) << run.err;
+    EXPECT_TRUE(directory.names().empty());
+  }
+}
+
+}  // namespace

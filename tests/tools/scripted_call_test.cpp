@@ -1,0 +1,325 @@
+// The pipeline of a call between components that do what the test says: their encoder puts a slice header
+// before the raw picture, their decoder takes it off again.
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <functional>
+#include <ostream>
+#include <thread>
+
+#include <omxhost/log.h>
+
+#include "tests/support/scripted_media_server.h"
+#include "tests/tools/temporary_directory.h"
+#include "tools/commands/call.h"
+#include "tools/commands/decode.h"
+
+namespace {
+
+using namespace tool;
+using omxtest::Packet;
+using tooltest::contentOf;
+using tooltest::TemporaryDirectory;
+
+constexpr Size kSize{64, 48};
+const std::vector<uint8_t> kSliceHeader{0, 0, 0, 1, 0x65, 0x88};
+const std::vector<uint8_t> kParameters{0, 0, 0, 1, 0x67, 66, 0, 31, 0, 0, 0, 1, 0x68, 1};
+
+// Gray pictures, one after the other, until it is told to end.
+class GraySource : public FrameSource {
+ public:
+  explicit GraySource(uint64_t count, FrameRate rate = {30, 1}) : _count(count), _traits{.rate = rate} {}
+
+  Size size() const override { return kSize; }
+  const VideoTraits& traits() const override { return _traits; }
+  std::optional<uint64_t> frameCount() const override { return _count; }
+  Result<bool> next(Picture& picture) override {
+    if (_read == failAt) return Failure{ExitCode::Input, "broken off"};
+    if (_read == _count) return false;
+    picture.resize(kSize);
+    std::fill(picture.bytes.begin(), picture.bytes.end(), static_cast<uint8_t>(_read++));
+    if (onRead) onRead(_read);
+    return true;
+  }
+
+  std::optional<uint64_t> failAt;
+  std::function<void(uint64_t read)> onRead;
+
+ private:
+  const uint64_t _count;
+  const VideoTraits _traits;
+  uint64_t _read = 0;
+};
+
+// msm8x55 is the device with the smallest decoder buffers of plain layout.
+struct CallRig {
+  CallRig() {
+    server.encoder().onInput([](const Packet& input) { return std::vector<Packet>{coded(input)}; });
+    server.decoder().onInput([](const Packet& input) { return std::vector<Packet>{decoded(input)}; });
+    // The decoder's pictures are small; its buffers stay those of the size that every session sets up.
+    OMX_PARAM_PORTDEFINITIONTYPE output{};
+    output.nSize = sizeof(output);
+    output.nPortIndex = mediaserver::kOutputPort;
+    output.eDir = OMX_DirOutput;
+    output.nBufferCountActual = 8;
+    output.nBufferCountMin = 1;
+    output.nBufferSize = 640 * 480 * 3 / 2;
+    output.format.video.nFrameWidth = static_cast<OMX_U32>(kSize.width);
+    output.format.video.nFrameHeight = static_cast<OMX_U32>(kSize.height);
+    server.decoder().answer(OMX_IndexParamPortDefinition, output);
+  }
+
+  static Packet coded(const Packet& input) {
+    Packet output = input;
+    if (!input.bytes.empty())
+      output.bytes.insert(output.bytes.begin(), kSliceHeader.begin(), kSliceHeader.end());
+    return output;
+  }
+  static Packet decoded(const Packet& input) {
+    Packet output = input;
+    const size_t picture = std::min(output.bytes.size(), pictureBytes(kSize));
+    output.bytes.erase(output.bytes.begin(), output.bytes.end() - static_cast<ptrdiff_t>(picture));
+    return output;
+  }
+
+  Result<CallReport> run(GraySource& source) { return runCall(settings, source, enough); }
+  // For calls that have to end well.
+  CallFigures figures(GraySource& source) {
+    const auto report = run(source);
+    if (report.ok()) return report.value().figures;
+    ADD_FAILURE() << report.failure().text;
+    return {};
+  }
+  // For calls that must not.
+  Failure failure(GraySource& source) {
+    const auto report = run(source);
+    if (!report.ok()) return report.failure();
+    ADD_FAILURE() << "no failure";
+    return {ExitCode::Done, ""};
+  }
+
+  omxhost::LogCapture log;
+  omxtest::ScriptedMediaServer server{"msm8x55"};
+  const TemporaryDirectory directory;
+  CallSettings settings;
+  std::stop_source enough;
+};
+
+void expectText(const Failure& failure, const char* part) {
+  EXPECT_NE(failure.text.find(part), std::string::npos) << failure.text;
+}
+
+TEST(ScriptedCall, BringsEveryPictureToTheOtherEndInOrder) {
+  CallRig rig;
+  rig.settings.streamPath = rig.directory.file("coded.264");
+  rig.settings.picturesPath = rig.directory.file("decoded.yuv");
+  GraySource source(60);
+  const CallFigures figures = rig.figures(source);
+  EXPECT_EQ(figures.framesIn, 60U);
+  EXPECT_EQ(figures.framesEncoded, 60U);
+  EXPECT_EQ(figures.framesDecoded, 60U);
+  EXPECT_EQ(figures.framesDropped(), 0U);
+  EXPECT_EQ(figures.framesOutOfOrder, 0U);
+  EXPECT_EQ(figures.psnr, 100);
+  EXPECT_GT(figures.latencies.p50, 0);
+  EXPECT_LE(figures.latencies.p50, figures.latencies.p99);
+  EXPECT_EQ(figures.streamBytes, 60 * (pictureBytes(kSize) + kSliceHeader.size()));
+  EXPECT_EQ(contentOf(rig.settings.streamPath).size(), figures.streamBytes);
+  const std::string decoded = contentOf(rig.settings.picturesPath);
+  ASSERT_EQ(decoded.size(), 60 * pictureBytes(kSize));
+  for (size_t i = 0; i < 60; ++i) EXPECT_EQ(decoded[i * pictureBytes(kSize)], static_cast<char>(i));
+}
+
+TEST(ScriptedCall, EndsTheInputOnlyWhenThePicturesAreBack) {
+  CallRig rig;
+  rig.server.encoder().setDelay(std::chrono::milliseconds(2));
+  rig.server.decoder().setDelay(std::chrono::milliseconds(2));
+  std::vector<size_t> filledAtEnd;
+  rig.server.omx().before(omxtest::Method::EmptyBuffer, [&](const omxtest::Call& call) {
+    if ((call.flags & OMX_BUFFERFLAG_EOS) == 0) return;
+    filledAtEnd.push_back(rig.server.messages().deliveredCount(omxtest::fillBufferDone()));
+  });
+  GraySource source(30);
+  EXPECT_EQ(rig.figures(source).framesDecoded, 30U);
+  // Both ends had delivered everything: the encoder's 30, then its last empty one and the decoder's 30.
+  ASSERT_EQ(filledAtEnd.size(), 2U);
+  EXPECT_GE(filledAtEnd[0], 30U);
+  EXPECT_GE(filledAtEnd[1], 60U);
+}
+
+TEST(ScriptedCall, CountsWhatTheEncoderDropsAndStillEnds) {
+  CallRig rig;
+  rig.server.encoder().onInput([](const Packet& input) {
+    const bool isDropped = !input.bytes.empty() && input.bytes[0] % 5 == 4;  // by its gray; the last one too
+    return isDropped ? std::vector<Packet>() : std::vector<Packet>{CallRig::coded(input)};
+  });
+  GraySource source(20);
+  const CallFigures figures = rig.figures(source);
+  EXPECT_EQ(figures.framesIn, 20U);
+  EXPECT_EQ(figures.framesEncoded, 16U);
+  EXPECT_EQ(figures.framesDecoded, 16U);
+  EXPECT_EQ(figures.framesDropped(), 4U);
+  EXPECT_EQ(figures.framesOutOfOrder, 0U);
+  EXPECT_EQ(figures.psnr, 100) << "compared with another picture than its own";
+}
+
+TEST(ScriptedCall, SendsParametersThatComeAloneWithTheNextPicture) {
+  CallRig rig;
+  rig.settings.streamPath = rig.directory.file("coded.264");
+  rig.server.encoder().onInput([](const Packet& input) {
+    std::vector<Packet> outputs{CallRig::coded(input)};
+    if (input.timestamp == 0) {
+      Packet parameters;
+      parameters.bytes = kParameters;
+      parameters.flags = OMX_BUFFERFLAG_CODECCONFIG;
+      outputs.insert(outputs.begin(), parameters);
+    }
+    return outputs;
+  });
+  GraySource source(5);
+  const auto report = rig.run(source);
+  ASSERT_TRUE(report.ok()) << report.failure().text;
+  EXPECT_EQ(report.value().figures.framesEncoded, 5U);
+  EXPECT_EQ(report.value().figures.framesDecoded, 5U);
+  ASSERT_TRUE(report.value().sequence);
+  EXPECT_EQ(toText(*report.value().sequence), "Baseline, level 3.1");
+  EXPECT_EQ(rig.server.decoder().inputs().front().bytes.size(),
+            kParameters.size() + kSliceHeader.size() + pictureBytes(kSize));
+  EXPECT_EQ(contentOf(rig.settings.streamPath).size(), report.value().figures.streamBytes);
+}
+
+TEST(ScriptedCall, MatchesTimeStampsThatHaveWrappedAround) {
+  CallRig rig;
+  GraySource source(40, FrameRate{1, 300});  // 3 hours and 20 minutes; 32 bits hold 71 minutes
+  const CallFigures figures = rig.figures(source);
+  EXPECT_EQ(figures.framesDecoded, 40U);
+  EXPECT_EQ(figures.framesOutOfOrder, 0U);
+  EXPECT_EQ(figures.psnr, 100);
+}
+
+TEST(ScriptedCall, DropsInRealTimeWhatFindsNoFreeBuffer) {
+  CallRig rig;
+  rig.settings.realTime = true;
+  rig.server.encoder().holdInput();
+  GraySource source(30, FrameRate{1000, 1});
+  source.onRead = [&rig](uint64_t read) {
+    if (read == 20) rig.server.encoder().passInput();
+  };
+  const CallFigures figures = rig.figures(source);
+  EXPECT_EQ(figures.framesIn, 30U);
+  EXPECT_GE(figures.framesDropped(), 10U);
+  EXPECT_GE(figures.framesDecoded, 4U) << "what was in the buffers";
+  EXPECT_EQ(figures.framesDecoded + figures.framesDropped(), 30U);
+  EXPECT_EQ(figures.framesOutOfOrder, 0U);
+  EXPECT_EQ(figures.psnr, 100);
+}
+
+TEST(ScriptedCall, EndsEarlyWithWhatItHas) {
+  CallRig rig;
+  rig.settings.picturesPath = rig.directory.file("decoded.yuv");
+  GraySource source(1000);
+  source.onRead = [&rig](uint64_t read) {
+    if (read == 10) rig.enough.request_stop();
+  };
+  const CallFigures figures = rig.figures(source);
+  EXPECT_EQ(figures.framesIn, 9U);
+  EXPECT_EQ(figures.framesDecoded, 9U);
+  EXPECT_EQ(contentOf(rig.settings.picturesPath).size(), 9 * pictureBytes(kSize));
+}
+
+TEST(ScriptedCall, StopsWhileItWaitsForABuffer) {
+  CallRig rig;
+  rig.server.encoder().holdInput();
+  const std::jthread stopper([&rig] {
+    EXPECT_TRUE(rig.server.omx().waitForCalls(omxtest::Method::EmptyBuffer, 4));  // all buffers
+    rig.enough.request_stop();
+    rig.server.encoder().passInput();
+  });
+  GraySource source(1000);
+  const CallFigures figures = rig.figures(source);
+  EXPECT_GE(figures.framesDecoded, 4U);
+  EXPECT_EQ(figures.framesDropped(), 0U);
+}
+
+TEST(ScriptedCall, GoesOnWithWhatThereIsWhenTheInputBreaksOff) {
+  CallRig rig;
+  GraySource source(1000);
+  source.failAt = 7;
+  const auto report = rig.run(source);
+  ASSERT_TRUE(report.ok()) << report.failure().text;
+  EXPECT_EQ(report.value().figures.framesDecoded, 7U);
+  ASSERT_TRUE(report.value().inputFailure);
+  EXPECT_EQ(report.value().inputFailure->text, "broken off");
+}
+
+struct FailureCase {
+  const char* name;
+  std::function<void(CallRig& rig)> provoke;
+  ExitCode code;
+  const char* text;
+};
+
+void PrintTo(const FailureCase& failure, std::ostream* stream) {
+  *stream << failure.name;
+}
+
+class FailingCall : public testing::TestWithParam<FailureCase> {};
+
+TEST_P(FailingCall, EndsWithAMessageAndLeavesNoFile) {
+  CallRig rig;
+  rig.settings.streamPath = rig.directory.file("coded.264");
+  rig.settings.picturesPath = rig.directory.file("decoded.y4m");
+  GetParam().provoke(rig);
+  GraySource source(1000);
+  const Failure failure = rig.failure(source);
+  EXPECT_EQ(failure.code, GetParam().code);
+  expectText(failure, GetParam().text);
+  EXPECT_TRUE(rig.directory.names().empty());
+}
+
+std::vector<Packet> oneOutput(const Packet& input, size_t bytes) {
+  Packet output = input;
+  output.bytes.resize(bytes);
+  std::copy(kSliceHeader.begin(), kSliceHeader.end(), output.bytes.begin());
+  return {output};
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    ScriptedCall, FailingCall,
+    testing::Values(
+        FailureCase{"EncoderNotCreated",
+                    [](CallRig& rig) {
+                      rig.server.encoder().refuse(omxtest::Access::SetParameter, OMX_IndexParamVideoBitrate);
+                    },
+                    ExitCode::Device, "the encoder of device msm8x55 cannot be created"},
+        FailureCase{"NoMediaServer", [](CallRig& rig) { rig.server.unregister(); }, ExitCode::Device,
+                    "libomxmediaserver.so"},
+        FailureCase{"DecoderNotStarted",
+                    [](CallRig& rig) { rig.server.omx().fail(omxtest::Method::SendCommand); },
+                    ExitCode::Device, "the decoder of device msm8x55 cannot be started"},
+        FailureCase{"EncoderRefusesInput",
+                    [](CallRig& rig) { rig.server.omx().fail(omxtest::Method::EmptyBuffer, 4); },
+                    ExitCode::Failed, "refused"},
+        FailureCase{"DecoderFailsWhileItRuns",
+                    [](CallRig& rig) {
+                      rig.server.omx().after(omxtest::Method::EmptyBuffer, [&rig](const omxtest::Call& call) {
+                        if (call.number > 100) rig.server.decoder().raiseError(OMX_ErrorHardware);
+                      });
+                    },
+                    ExitCode::Failed, "the decoder of device msm8x55 has failed"},
+        FailureCase{"CodedPictureTooLarge",
+                    [](CallRig& rig) {
+                      rig.server.encoder().editPort(mediaserver::kOutputPort,
+                                                    [](auto& port) { port.nBufferSize = 80'000; });
+                      rig.server.encoder().onInput(
+                          [](const Packet& input) { return oneOutput(input, 70'000); });
+                    },
+                    ExitCode::Failed,
+                    "a coded picture of 70000 bytes is larger than the input buffers of the decoder"},
+        FailureCase{"PicturesCannotBeWritten", [](CallRig& rig) { rig.settings.picturesPath = "/dev/full"; },
+                    ExitCode::Output, "/dev/full: no space left"},
+        FailureCase{"StreamCannotBeWritten", [](CallRig& rig) { rig.settings.streamPath = "/dev/full"; },
+                    ExitCode::Output, "/dev/full: no space left"}),
+    [](const auto& instance) { return std::string(instance.param.name); });
+
+}  // namespace

@@ -1,0 +1,50 @@
+// A call with both ends in this process:
+//
+//   source -> encoder -> link -> decoder -> writer
+//     main   |        |        |         |  <- threads: the main one feeds the encoder; the encoder's
+//            |  its output     |            output thread queues what it made; the link's thread keeps the
+//            |  thread    link's thread     stream and feeds the decoder; the decoder's output thread
+//            |                              compares each picture with its source and writes it
+//
+// What was sent is found again by its time stamp, which travels through both components.
+#pragma once
+
+#include <stdint.h>
+
+#include <memory>
+#include <optional>
+#include <stop_token>
+#include <string>
+
+#include "tools/base/failure.h"
+#include "tools/commands/call_book.h"
+#include "tools/files/frame_source.h"
+#include "tools/h264/headers.h"
+#include "tools/session/session.h"
+
+namespace tool {
+
+struct CallSettings {
+  EncoderSettings encoder;     // size and rate are the source's
+  uint64_t frameLimit = 0;     // 0: all that the source has
+  bool realTime = false;       // paced by the frame rate; pictures that find no free buffer are dropped
+  std::string streamPath;      // the coded stream (Annex B); empty: not kept
+  std::string picturesPath;    // the decoded pictures; empty: not kept
+  std::string picturesFormat;  // see createPictureWriter()
+};
+
+struct CallReport {
+  CallFigures figures;
+  EncoderSettings encoder;
+  std::optional<SequenceInfo> sequence;  // what the stream says of itself
+  int hardwareVersion = 0;
+  double wallSeconds = 0;
+  double cpuSeconds = 0;  // of the whole process, all threads, components included
+  Outcome inputFailure;   // the input broke off; the call went on with what there was
+};
+
+// Runs the call on the calling thread. `enough` is requested to end it early, by Ctrl-C from outside and by
+// a failure from inside; the source stops reading at it. Files get their names only at a good end.
+Result<CallReport> runCall(const CallSettings& settings, FrameSource& source, std::stop_source& enough);
+
+}  // namespace tool

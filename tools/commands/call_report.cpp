@@ -1,0 +1,88 @@
+#include "tools/commands/call_report.h"
+
+#include <inttypes.h>
+
+#include <nlohmann/json.hpp>
+
+#include <omxhost/device.h>
+
+#include "tools/base/text.h"
+#include "tools/commands/devices.h"
+
+namespace tool {
+
+namespace {
+
+double reachedBitRate(const CallReport& report) {
+  const double seconds = static_cast<double>(report.figures.framesIn) / report.encoder.rate.perSecond();
+  return seconds > 0 ? static_cast<double>(report.figures.streamBytes) * 8 / seconds : 0;
+}
+
+nlohmann::ordered_json orNull(const char* name) {
+  return name != nullptr ? nlohmann::ordered_json(name) : nullptr;
+}
+
+std::string row(const char* label, const std::string& value) {
+  return formatted("%-14s %s\n", label, value.c_str());
+}
+
+std::string rateText(FrameRate rate) {
+  return formatted("%.4g frames/s", rate.perSecond());
+}
+
+}  // namespace
+
+std::string callSummary(const CallReport& report, const WrittenFiles& files) {
+  const CallFigures& figures = report.figures;
+  const auto count = [](uint64_t number) { return formatted("%" PRIu64, number); };
+  std::string text;
+  text += row("Video", formatted("%dx%d, %s", report.encoder.size.width, report.encoder.size.height,
+                                 rateText(report.encoder.rate).c_str()));
+  if (report.sequence) text += row("Stream", toText(*report.sequence));
+  text += row("Frames in", count(figures.framesIn));
+  text += row("Encoded", count(figures.framesEncoded));
+  text += row("Decoded", count(figures.framesDecoded));
+  text += row("Dropped", count(figures.framesDropped()));
+  if (figures.framesOutOfOrder > 0) text += row("Out of order", count(figures.framesOutOfOrder));
+  text += row("Bit rate", formatted("%.1f kbit/s asked, %.1f kbit/s reached",
+                                    bitRateTarget(report.encoder) / 1e3, reachedBitRate(report) / 1e3));
+  text += row("PSNR", formatted("%.2f dB (luma, mean)", figures.psnr));
+  text += row("Latency", formatted("p50 %.1f ms, p95 %.1f ms, p99 %.1f ms", figures.latencies.p50,
+                                   figures.latencies.p95, figures.latencies.p99));
+  text += row("CPU time", formatted("%.2f s in %.2f s, %.1f frames/s", report.cpuSeconds, report.wallSeconds,
+                                    static_cast<double>(figures.framesIn) / report.wallSeconds));
+  for (const auto& [label, path] : files) text += row(label.c_str(), path);
+  return text;
+}
+
+std::string callJson(const CallReport& report, bool interrupted) {
+  const CallFigures& figures = report.figures;
+  const omxhost::Device& device = omxhost::posedDevice();
+  nlohmann::ordered_json object;
+  object["device"] = device.name;
+  object["hardware_version"] = report.hardwareVersion;
+  object["encoder"] = orNull(device.encoderComponent);
+  object["decoder"] = orNull(device.decoderComponent);
+  object["width"] = report.encoder.size.width;
+  object["height"] = report.encoder.size.height;
+  object["fps"] = rounded(report.encoder.rate.perSecond());
+  object["profile"] = report.sequence ? nlohmann::ordered_json(report.sequence->profile) : nullptr;
+  object["level"] = report.sequence ? nlohmann::ordered_json(report.sequence->level / 10.0) : nullptr;
+  object["frames_in"] = figures.framesIn;
+  object["frames_encoded"] = figures.framesEncoded;
+  object["frames_decoded"] = figures.framesDecoded;
+  object["frames_dropped"] = figures.framesDropped();
+  object["frames_out_of_order"] = figures.framesOutOfOrder;
+  object["bitrate_target"] = bitRateTarget(report.encoder);
+  object["bitrate_reached"] = rounded(reachedBitRate(report));
+  object["psnr_y"] = rounded(figures.psnr);
+  object["latency_ms"] = {{"p50", rounded(figures.latencies.p50)},
+                          {"p95", rounded(figures.latencies.p95)},
+                          {"p99", rounded(figures.latencies.p99)}};
+  object["cpu_seconds"] = rounded(report.cpuSeconds);
+  object["wall_seconds"] = rounded(report.wallSeconds);
+  object["interrupted"] = interrupted;
+  return object.dump() + "\n";
+}
+
+}  // namespace tool
