@@ -63,6 +63,12 @@ void DecoderSessionTest::waitForEvents() {
   requireEventually(idle, "the end of the event thread's work");
 }
 
+void DecoderSessionTest::feedThrough(const std::string& text, int timestamp) {
+  const size_t before = pictures().size();
+  ASSERT_NO_FATAL_FAILURE(SessionTest::feedThrough(text, timestamp));
+  waitForPictures(before + 1);
+}
+
 void DecoderSessionTest::waitForFills(size_t count) {
   require(omx().waitForCalls(Method::FillBuffer, count), "a buffer given to the component");
 }

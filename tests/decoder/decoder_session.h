@@ -50,6 +50,8 @@ class DecoderSessionTest : public SessionTest {
   // Until the event thread has nothing to do, or has ended.
   void waitForEvents();
   // Until `count` fillBuffer calls have returned since the test began.
+  // Also waits until the picture is among pictures(): the application counts an output before it handles it.
+  void feedThrough(const std::string& text, int timestamp = 0);
   void waitForFills(size_t count);
   // Until that many pictures have been delivered.
   void waitForPictures(size_t count);
