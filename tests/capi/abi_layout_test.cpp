@@ -14,7 +14,7 @@
 #include "platform/board_platform_wrapper.h"
 #include "platform/qcom_board_platform_wrapper.h"
 #include "platform/ti_board_platform_wrapper.h"
-#include "tests/capi/c_records.h"
+#include "tests/capi/c_program.h"
 
 namespace {
 
@@ -31,42 +31,17 @@ constexpr bool ascending(const size_t (&offsets)[count]) {
 }
 
 #define AT(member) offsetof(OmxInterface, member)
-static_assert(ascending({AT(_portBuffers),
-                         AT(_componentName),
-                         AT(_portBufferMode),
-                         AT(_threadError),
-                         AT(_inputClosed),
-                         AT(_endOfOutputReached),
-                         AT(_deinitDone),
-                         AT(_portReconfiguring),
-                         AT(_queueOutputData),
-                         AT(_omx),
-                         AT(_node),
-                         AT(_observer),
-                         AT(_mpMemHeap),
-                         AT(_memoryDealer),
-                         AT(_inputCallback),
-                         AT(_inputCallbackContext),
-                         AT(_outputCallback),
-                         AT(_outputCallbackContext),
-                         AT(_outputConvertBuffer),
-                         AT(_outputConvertBufferSize),
-                         AT(_omxState),
-                         AT(_outputThread),
-                         AT(_semStateChanged),
-                         AT(_semEventQueued),
-                         AT(_semReserved3),
-                         AT(_semOutputDataReady),
-                         AT(_semInputBuffersReturned),
-                         AT(_semOutputBuffersReturned),
-                         AT(_semEndOfOutput),
-                         AT(_semInputBufferFree),
-                         AT(_semReserved9),
-                         AT(_portFrameSize),
-                         AT(_endOfInputPending),
-                         AT(_platformWrapper),
-                         AT(_isEncoder),
-                         AT(_state)}));
+// clang-format off
+static_assert(ascending({
+    AT(_portBuffers), AT(_componentName), AT(_portBufferMode), AT(_threadError), AT(_inputClosed),
+    AT(_endOfOutputReached), AT(_deinitDone), AT(_portReconfiguring), AT(_queueOutputData), AT(_omx),
+    AT(_node), AT(_observer), AT(_mpMemHeap), AT(_memoryDealer), AT(_inputCallback),
+    AT(_inputCallbackContext), AT(_outputCallback), AT(_outputCallbackContext), AT(_outputConvertBuffer),
+    AT(_outputConvertBufferSize), AT(_omxState), AT(_outputThread), AT(_semStateChanged),
+    AT(_semEventQueued), AT(_semReserved3), AT(_semOutputDataReady), AT(_semInputBuffersReturned),
+    AT(_semOutputBuffersReturned), AT(_semEndOfOutput), AT(_semInputBufferFree), AT(_semReserved9),
+    AT(_portFrameSize), AT(_endOfInputPending), AT(_platformWrapper), AT(_isEncoder), AT(_state)}));
+// clang-format on
 // The semaphores are one behind the other, and nothing comes behind the session's own state.
 static_assert(AT(_semReserved9) - AT(_semStateChanged) == 8 * sizeof(sem_t));
 static_assert(AT(_state) + sizeof(void*) == sizeof(OmxInterface));
@@ -117,64 +92,53 @@ int slot(Function Class::*operation) {
   return isVirtual ? static_cast<int>(offset / static_cast<ptrdiff_t>(sizeof(void*))) : -1;
 }
 
-TEST(VirtualSlots, OfSessionsAreWhereBinariesCallThem) {
+TEST(VirtualSlots, AreWhereBinariesCallThem) {
+  using Base = OmxInterface;
+  using Wrapper = CBoardPlatformWrapper;
   // 0 and 1 are the destructor's two forms.
-  EXPECT_EQ(slot(&OmxCodecObserverDelegate::setObserver), 2);
-  EXPECT_EQ(slot(&OmxCodecObserverDelegate::onOmxObserverEmptyBufferDone), 6);
-  EXPECT_EQ(slot(&OmxInterface::setObserver), 2);
-  EXPECT_EQ(slot(&OmxInterface::setMPmemInfo), 3);
-  EXPECT_EQ(slot(&OmxInterface::onOmxObserverEvent), 4);
-  EXPECT_EQ(slot(&OmxInterface::onOmxObserverFillBufferDone), 5);
-  EXPECT_EQ(slot(&OmxInterface::onOmxObserverEmptyBufferDone), 6);
-  EXPECT_EQ(slot(&OmxInterface::onEvent), 7);
-  EXPECT_EQ(slot(&OmxInterface::init), 8);
-  EXPECT_EQ(slot(&OmxInterface::deInit), 9);
-  EXPECT_EQ(slot(&OmxInterface::callOutputCallbackFunction), 10);
-  EXPECT_EQ(slot(&OmxInterfaceDecoder::onOmxObserverEvent), 4);
-  EXPECT_EQ(slot(&OmxInterfaceDecoder::onEvent), 7);
-  EXPECT_EQ(slot(&OmxInterfaceDecoder::init), 8);
-  EXPECT_EQ(slot(&OmxInterfaceDecoder::callOutputCallbackFunction), 10);
-
-  for (const int operation :
-       {slot(&OmxInterface::setupIOMXConnections), slot(&OmxInterfaceEncoder::setConfig),
-        slot(&OmxInterfaceDecoder::getBufferNum)}) {
-    EXPECT_EQ(operation, -1) << "one more slot than binaries know";
-  }
-}
-
-TEST(VirtualSlots, OfWrappersAreWhereBinariesCallThem) {
-  EXPECT_EQ(slot(&CBoardPlatformWrapper::configureEncoder), 0);
-  EXPECT_EQ(slot(&CBoardPlatformWrapper::setConfig), 1);
-  EXPECT_EQ(slot(&CBoardPlatformWrapper::setPictureOrder), 2);
-  EXPECT_EQ(slot(&CBoardPlatformWrapper::setInputPackingFormat), 3);
-  EXPECT_EQ(slot(&CBoardPlatformWrapper::setOutputColorFormat), 4);
-  EXPECT_EQ(slot(&CQcomBoardPlatformWrapper::setInputPackingFormat), 3);
-  EXPECT_EQ(slot(&CTIBoardPlatformWrapper::setOutputColorFormat), 4);
+  const std::pair<int, int> slots[] = {{slot(&OmxCodecObserverDelegate::setObserver), 2},
+                                       {slot(&Base::setObserver), 2},
+                                       {slot(&Base::setMPmemInfo), 3},
+                                       {slot(&Base::onOmxObserverEvent), 4},
+                                       {slot(&Base::onOmxObserverFillBufferDone), 5},
+                                       {slot(&Base::onOmxObserverEmptyBufferDone), 6},
+                                       {slot(&OmxCodecObserverDelegate::onOmxObserverEmptyBufferDone), 6},
+                                       {slot(&Base::onEvent), 7},
+                                       {slot(&Base::init), 8},
+                                       {slot(&Base::deInit), 9},
+                                       {slot(&Base::callOutputCallbackFunction), 10},
+                                       {slot(&OmxInterfaceDecoder::onOmxObserverEvent), 4},
+                                       {slot(&OmxInterfaceDecoder::onEvent), 7},
+                                       {slot(&OmxInterfaceDecoder::init), 8},
+                                       {slot(&OmxInterfaceDecoder::callOutputCallbackFunction), 10},
+                                       {slot(&Base::setupIOMXConnections), -1},
+                                       {slot(&OmxInterfaceEncoder::setConfig), -1},
+                                       {slot(&OmxInterfaceDecoder::getBufferNum), -1},
+                                       {slot(&Wrapper::configureEncoder), 0},
+                                       {slot(&Wrapper::setConfig), 1},
+                                       {slot(&Wrapper::setPictureOrder), 2},
+                                       {slot(&Wrapper::setInputPackingFormat), 3},
+                                       {slot(&Wrapper::setOutputColorFormat), 4},
+                                       {slot(&CQcomBoardPlatformWrapper::setInputPackingFormat), 3},
+                                       {slot(&CTIBoardPlatformWrapper::setOutputColorFormat), 4}};
+  for (const auto& [found, expected] : slots) EXPECT_EQ(found, expected) << &found - &slots[0].first;
 }
 
 TEST(Records, AreLaidOutAlikeInCAndCPlusPlus) {
   using webrtc::VideoCodec;
   using webrtc::VideoCodecH264;
-  const size_t layout[] = {
-#include "tests/capi/record_layout.inl"
-  };
+  const size_t layout[] = RECORD_LAYOUT;
   ASSERT_EQ(std::size(layout), cRecordLayoutCount);
   for (size_t i = 0; i < cRecordLayoutCount; ++i) EXPECT_EQ(layout[i], cRecordLayout[i]) << "number " << i;
+  // Places that the records' readers go by.
+  static_assert(offsetof(VideoCodecH264, profile) == 8 && offsetof(VideoCodecH264, keyFrameInterval) == 12);
+  static_assert(offsetof(VideoCodecH264, referenceFrames) == 32);
+  static_assert(offsetof(VideoCodecH264, entropyCoding) == 36);
+  static_assert(offsetof(VideoCodecH264, transform8x8) == 37);
+  static_assert(offsetof(VideoCodec, payloadName) == 4 && offsetof(VideoCodec, payloadType) == 36);
+  static_assert(offsetof(VideoCodec, width) == 38 && offsetof(VideoCodec, height) == 40);
+  static_assert(offsetof(VideoCodec, startBitrate) == 44 && offsetof(VideoCodec, maxFramerate) == 56);
+  static_assert(offsetof(VideoCodec, codecSpecific) == 60 && sizeof(DECODEDDATAINFO) == 7 * 4);
 }
-
-// The places in words that the records' readers go by.
-static_assert(offsetof(webrtc::VideoCodecH264, profile) == 8);
-static_assert(offsetof(webrtc::VideoCodecH264, keyFrameInterval) == 12);
-static_assert(offsetof(webrtc::VideoCodecH264, referenceFrames) == 32);
-static_assert(offsetof(webrtc::VideoCodecH264, entropyCoding) == 36);
-static_assert(offsetof(webrtc::VideoCodecH264, transform8x8) == 37);
-static_assert(offsetof(webrtc::VideoCodec, payloadName) == 4);
-static_assert(offsetof(webrtc::VideoCodec, payloadType) == 36);
-static_assert(offsetof(webrtc::VideoCodec, width) == 38);
-static_assert(offsetof(webrtc::VideoCodec, height) == 40);
-static_assert(offsetof(webrtc::VideoCodec, startBitrate) == 44);
-static_assert(offsetof(webrtc::VideoCodec, maxFramerate) == 56);
-static_assert(offsetof(webrtc::VideoCodec, codecSpecific) == 60);
-static_assert(sizeof(DECODEDDATAINFO) == 7 * 4);
 
 }  // namespace

@@ -21,6 +21,11 @@ struct Seen {
   unsigned int length;  // of the encoder's output to come, bytes
 };
 
+typedef struct VideoCodec VideoCodec;
+typedef struct VideoCodecH264 VideoCodecH264;
+const size_t cRecordLayout[] = RECORD_LAYOUT;
+const size_t cRecordLayoutCount = sizeof(cRecordLayout) / sizeof(cRecordLayout[0]);
+
 #define CHECK(condition)               \
   do {                                 \
     if (!(condition)) return __LINE__; \
@@ -81,16 +86,9 @@ static int onDecoded(void* info, void* data, unsigned int length, void* bufferId
 }
 
 int runEncoderInC(unsigned int length) {
-  struct VideoCodec codec;
-  memset(&codec, 0, sizeof(codec));
-  codec.codecType = kVideoCodecH264;
-  codec.width = kWidth;
-  codec.height = kHeight;
-  codec.startBitrate = 500;
+  VideoCodec codec = {.codecType = kVideoCodecH264, .width = kWidth, .height = kHeight, .startBitrate = 500};
   codec.maxFramerate = 30;
   codec.codecSpecific.H264.profile = 66;
-  codec.codecSpecific.H264.keyFrameInterval = 30;
-  codec.codecSpecific.H264.referenceFrames = 1;
 
   struct Seen seen;
   initSeen(&seen);

@@ -10,7 +10,7 @@
 #include <vector>
 
 #include "core/omx_interface.h"
-#include "omxbridge/decoded_picture.h"
+#include "tests/core/bounded.h"
 
 namespace omxtest {
 
@@ -29,38 +29,81 @@ class Application {
   using OutputHandler = std::function<int(const Output&)>;
 
   // Registers both callbacks with this object as their context.
-  void attach(OmxInterface& session);
+  void attach(OmxInterface& session) {
+    session.registerInputCallback(&Application::inputCallback, this);
+    session.registerOutputCallback(&Application::outputCallback, this);
+  }
 
   // What the callbacks do after noting the call; an output handler's value is the callback's result (0
   // without one). May block.
-  void onOutput(OutputHandler handler);
-  void onInput(std::function<void()> handler);
+  void onOutput(OutputHandler handler) {
+    const std::lock_guard<std::mutex> lock(_mutex);
+    _outputHandler = std::move(handler);
+  }
+  void onInput(std::function<void()> handler) {
+    const std::lock_guard<std::mutex> lock(_mutex);
+    _inputHandler = std::move(handler);
+  }
   // For tests whose forged messages make the session deliver what the component is still writing.
   void leaveDataAlone() { _readsData = false; }
 
-  std::vector<Output> outputs() const;
-  std::vector<std::string> outputTexts() const;
-  // How often the input callback was called, and the session that the last call named.
-  size_t inputCallbacks() const;
-  void* inputSession() const;
+  std::vector<Output> outputs() const {
+    const std::lock_guard<std::mutex> lock(_mutex);
+    return _outputs;
+  }
+  std::vector<std::string> outputTexts() const {
+    std::vector<std::string> texts;
+    for (const Output& output : outputs()) texts.push_back(output.bytes);
+    return texts;
+  }
+  // The session that each call of the input callback named.
+  std::vector<void*> inputCallbacks() const {
+    const std::lock_guard<std::mutex> lock(_mutex);
+    return _inputs;
+  }
 
   // End the program where the limit passes.
-  void waitForOutputs(size_t count) const;
-  void waitForInputCallbacks(size_t count) const;
-
-  static int inputCallback(void* session, void* context);
-  static int outputCallback(void* first, void* data, unsigned int length, void* bufferId, void* context,
-                            unsigned int timestamp);
+  void waitForOutputs(size_t count) const {
+    std::unique_lock<std::mutex> lock(_mutex);
+    require(_changed.wait_for(lock, kWaitLimit, [&] { return _outputs.size() >= count; }), "an output");
+  }
+  void waitForInputCallbacks(size_t count) const {
+    std::unique_lock<std::mutex> lock(_mutex);
+    require(_changed.wait_for(lock, kWaitLimit, [&] { return _inputs.size() >= count; }),
+            "an input callback");
+  }
 
  private:
+  static int inputCallback(void* session, void* context) {
+    auto& self = *static_cast<Application*>(context);
+    std::unique_lock<std::mutex> lock(self._mutex);
+    self._inputs.push_back(session);
+    self._changed.notify_all();
+    const auto handler = self._inputHandler;
+    lock.unlock();
+    if (handler) handler();
+    return 1;  // the session ignores it
+  }
+  static int outputCallback(void* first, void* data, unsigned int length, void* bufferId, void* context,
+                            unsigned int timestamp) {
+    auto& self = *static_cast<Application*>(context);
+    Output output{first, data, {}, length, bufferId, timestamp};
+    if (data != nullptr && self._readsData) output.bytes.assign(static_cast<const char*>(data), length);
+    std::unique_lock<std::mutex> lock(self._mutex);
+    self._outputs.push_back(output);
+    self._changed.notify_all();
+    const OutputHandler handler = self._outputHandler;
+    lock.unlock();
+    return handler ? handler(output) : 0;
+  }
+
   std::atomic<bool> _readsData{true};
   mutable std::mutex _mutex;  // guards everything below; not held in handlers
   mutable std::condition_variable _changed;
   OutputHandler _outputHandler;
   std::function<void()> _inputHandler;
   std::vector<Output> _outputs;
-  size_t _inputCallbacks = 0;
-  void* _inputSession = nullptr;
+  std::vector<void*> _inputs;
 };
 
 }  // namespace omxtest

@@ -10,84 +10,50 @@
 #include "core/omx_interface.h"
 #include "platform/board_platform_wrapper.h"
 #include "platform/hardware_version.h"
-#include "platform/soc_build_id.h"
 
 namespace {
 
-struct PlatformCase {
-  const char* property;
+struct Vendor {
   int type;
   const char* decoder;
   const char* encoder;
+  int modes[3];  // of every input, of a decoder's output, of an encoder's; unchanged without a wrapper
 };
+constexpr Vendor kQcom{
+    BOARD_PLATFORM_QCOM, "OMX.qcom.video.decoder.avc", "OMX.qcom.video.encoder.avc", {1, 0, 1}};
+constexpr Vendor kTi{
+    BOARD_PLATFORM_TI, "OMX.TI.DUCATI1.VIDEO.DECODER==", "OMX.TI.DUCATI1.VIDEO.H264E", {0, 0, 0}};
+constexpr Vendor kOther{BOARD_PLATFORM_OTHER, nullptr, nullptr, {7, 7, 7}};
 
-std::ostream& operator<<(std::ostream& stream, const PlatformCase& each) {
-  return stream << '"' << each.property << '"';
-}
-
-constexpr const char* kQcomDecoder = "OMX.qcom.video.decoder.avc";
-constexpr const char* kQcomEncoder = "OMX.qcom.video.encoder.avc";
-constexpr const char* kTiDecoder = "OMX.TI.DUCATI1.VIDEO.DECODER==";
-constexpr const char* kTiEncoder = "OMX.TI.DUCATI1.VIDEO.H264E";
+using PlatformCase = std::pair<const char*, Vendor>;
 
 class BoardPlatformTest : public ::testing::TestWithParam<PlatformCase> {};
 
-TEST_P(BoardPlatformTest, IsDetectedFromTheProperty) {
-  property_set("ro.board.platform", GetParam().property);
-  EXPECT_EQ(CBoardPlatformWrapper::GetBoardPlatformType(), GetParam().type);
-  EXPECT_STREQ(CBoardPlatformWrapper::getHardwareDecodeCodecIdentifierString(), GetParam().decoder);
-  EXPECT_STREQ(CBoardPlatformWrapper::getHardwareEncodeCodecIdentifierString(), GetParam().encoder);
-  CBoardPlatformWrapper* const wrapper =
-      CBoardPlatformWrapper::CreateBoardPlatformWrapper(nullptr, nullptr, nullptr);
-  EXPECT_EQ(wrapper != nullptr, GetParam().type != BOARD_PLATFORM_OTHER);
-  CBoardPlatformWrapper::Destroy(wrapper);
-
-  // Once detected it stays.
-  property_set("ro.board.platform", GetParam().type == BOARD_PLATFORM_TI ? "msm8960" : "omap4430");
-  EXPECT_EQ(CBoardPlatformWrapper::GetBoardPlatformType(), GetParam().type);
+TEST_P(BoardPlatformTest, IsDetectedFromThePropertyOnce) {
+  const auto& [property, vendor] = GetParam();
+  property_set("ro.board.platform", property);
+  EXPECT_EQ(CBoardPlatformWrapper::GetBoardPlatformType(), vendor.type);
+  property_set("ro.board.platform", vendor.type == BOARD_PLATFORM_TI ? "msm8960" : "omap4430");
+  EXPECT_EQ(CBoardPlatformWrapper::GetBoardPlatformType(), vendor.type);
+  EXPECT_STREQ(CBoardPlatformWrapper::getHardwareDecodeCodecIdentifierString(), vendor.decoder);
+  EXPECT_STREQ(CBoardPlatformWrapper::getHardwareEncodeCodecIdentifierString(), vendor.encoder);
+  for (const bool encoder : {false, true}) {
+    OmxInterface session;
+    session._isEncoder = encoder;
+    session.setPortBufferModes(7, 7);
+    auto* const wrapper = CBoardPlatformWrapper::CreateBoardPlatformWrapper(&session, nullptr, nullptr);
+    EXPECT_EQ(wrapper != nullptr, vendor.type != BOARD_PLATFORM_OTHER);
+    EXPECT_EQ(session._portBufferMode[kOmxInputPort], vendor.modes[0]);
+    EXPECT_EQ(session._portBufferMode[kOmxOutputPort], vendor.modes[encoder ? 2 : 1]);
+    CBoardPlatformWrapper::Destroy(wrapper);
+  }
 }
 
-INSTANTIATE_TEST_SUITE_P(
-    Properties, BoardPlatformTest,
-    ::testing::Values(PlatformCase{"MSM8960", BOARD_PLATFORM_QCOM, kQcomDecoder, kQcomEncoder},
-                      PlatformCase{"msm7627a", BOARD_PLATFORM_QCOM, kQcomDecoder, kQcomEncoder},
-                      PlatformCase{"msm", BOARD_PLATFORM_QCOM, kQcomDecoder, kQcomEncoder},
-                      PlatformCase{"OMAP4", BOARD_PLATFORM_TI, kTiDecoder, kTiEncoder},
-                      PlatformCase{"omap3", BOARD_PLATFORM_TI, kTiDecoder, kTiEncoder},
-                      PlatformCase{"oma", BOARD_PLATFORM_OTHER, nullptr, nullptr},
-                      PlatformCase{"xmsm", BOARD_PLATFORM_OTHER, nullptr, nullptr},
-                      PlatformCase{"exynos4", BOARD_PLATFORM_OTHER, nullptr, nullptr},
-                      PlatformCase{"", BOARD_PLATFORM_OTHER, nullptr, nullptr}));
-
-struct ModeCase {
-  const char* property;
-  bool isEncoder;
-  int input;
-  int output;
-};
-
-std::ostream& operator<<(std::ostream& stream, const ModeCase& each) {
-  return stream << each.property << (each.isEncoder ? " encoder" : " decoder");
-}
-
-class BufferModeTest : public ::testing::TestWithParam<ModeCase> {};
-
-TEST_P(BufferModeTest, IsSetByTheWrapper) {
-  property_set("ro.board.platform", GetParam().property);
-  OmxInterface session;
-  session._isEncoder = GetParam().isEncoder;
-  session.setPortBufferModes(7, 7);
-  CBoardPlatformWrapper* const wrapper =
-      CBoardPlatformWrapper::CreateBoardPlatformWrapper(&session, nullptr, nullptr);
-  EXPECT_EQ(session._portBufferMode[kOmxInputPort], GetParam().input);
-  EXPECT_EQ(session._portBufferMode[kOmxOutputPort], GetParam().output);
-  CBoardPlatformWrapper::Destroy(wrapper);
-}
-
-INSTANTIATE_TEST_SUITE_P(Sessions, BufferModeTest,
-                         ::testing::Values(ModeCase{"msm8960", true, 1, 1}, ModeCase{"msm8960", false, 1, 0},
-                                           ModeCase{"omap4430", true, 0, 0},
-                                           ModeCase{"omap4430", false, 0, 0}));
+INSTANTIATE_TEST_SUITE_P(Properties, BoardPlatformTest,
+                         ::testing::Values(PlatformCase("MSM8960", kQcom), PlatformCase("msm7627a", kQcom),
+                                           PlatformCase("msm", kQcom), PlatformCase("OMAP4", kTi),
+                                           PlatformCase("omap3", kTi), PlatformCase("oma", kOther),
+                                           PlatformCase("xmsm", kOther), PlatformCase("", kOther)));
 
 TEST(HardwareBaseVersionTest, FollowsThePropertyAndThenTheBuildId) {
   const struct {

@@ -6,7 +6,6 @@
 #include <stdio.h>
 #include <stdlib.h>
 
-#include <chrono>
 #include <condition_variable>
 #include <functional>
 #include <future>
@@ -23,14 +22,11 @@ inline std::function<void()>& hangReport() {
   return report;
 }
 
-[[noreturn]] inline void endHungTest(const char* where) {
-  fprintf(stderr, "HANG: %s did not come within the limit\n", where);
+inline void require(bool came, const char* what) {
+  if (came) return;
+  fprintf(stderr, "HANG: %s did not come within the limit\n", what);
   if (hangReport()) hangReport()();
   abort();
-}
-
-inline void require(bool came, const char* what) {
-  if (!came) endHungTest(what);
 }
 
 template <typename Predicate>
@@ -66,14 +62,14 @@ class Gate {
   ~Gate() { open(); }
   void pass() {
     std::unique_lock<std::mutex> lock(_mutex);
-    ++_arrived;
+    _arrived = true;
     _changed.notify_all();
     require(_changed.wait_for(lock, kWaitLimit, [this] { return _open; }), "opening a gate");
   }
-  // Until that many threads have come to the gate.
-  void waitForArrival(int count = 1) {
+  // Until a thread has come to the gate.
+  void waitForArrival() {
     std::unique_lock<std::mutex> lock(_mutex);
-    require(_changed.wait_for(lock, kWaitLimit, [&] { return _arrived >= count; }), "arrival at a gate");
+    require(_changed.wait_for(lock, kWaitLimit, [this] { return _arrived; }), "arrival at a gate");
   }
   void open() {
     const std::lock_guard<std::mutex> lock(_mutex);
@@ -84,7 +80,7 @@ class Gate {
  private:
   std::mutex _mutex;
   std::condition_variable _changed;
-  int _arrived = 0;
+  bool _arrived = false;
   bool _open = false;
 };
 

@@ -4,128 +4,148 @@
 #include <errno.h>
 #include <pthread.h>
 
-#include <atomic>
 #include <mutex>
 #include <new>
 #include <utility>
 
+namespace faults {
+
 namespace {
 
-using Form = faults::FailedAllocation::Form;
+// Accessed atomically, also by a malloc() that is called before the program is up: no constructors.
+size_t g_failing[4];  // by function; 0: none
 
-std::atomic<size_t> g_failingSizes[2];   // by form; 0: none
-std::atomic<int> g_threadsToFailure{0};  // 0: none
-
-std::atomic<size_t>& failingSize(Form form) {
-  return g_failingSizes[form == Form::Throws ? 1 : 0];
+size_t& failing(Failing function) {
+  return g_failing[static_cast<size_t>(function)];
 }
 
 // True for the one allocation that is to fail.
-bool failsNow(size_t size, Form form) {
+__attribute__((no_sanitize("address", "thread", "undefined"))) bool failsNow(Failing function, size_t size) {
+  size_t* const place = &g_failing[static_cast<size_t>(function)];
   size_t expected = size;
-  return size != 0 && failingSize(form).compare_exchange_strong(expected, 0);
+  return size != 0 && __atomic_load_n(place, __ATOMIC_SEQ_CST) == size &&
+         __atomic_compare_exchange_n(place, &expected, size_t{0}, false, __ATOMIC_SEQ_CST, __ATOMIC_SEQ_CST);
 }
 
 bool threadFailsNow() {
-  int left = g_threadsToFailure;
-  while (left > 0 && !g_threadsToFailure.compare_exchange_weak(left, left - 1)) {
+  size_t* const place = &failing(Failing::Thread);
+  size_t left = __atomic_load_n(place, __ATOMIC_SEQ_CST);
+  while (left > 0 &&
+         !__atomic_compare_exchange_n(place, &left, left - 1, false, __ATOMIC_SEQ_CST, __ATOMIC_SEQ_CST)) {
   }
   return left == 1;
 }
 
-std::mutex g_hookMutex;  // guards the two below
-faults::ThreadHook::Entry g_hookedEntry = nullptr;
-std::function<void()> g_hook;
-
-void runThreadHook(faults::ThreadHook::Entry entry) {
-  std::function<void()> hook;
-  {
-    const std::lock_guard<std::mutex> lock(g_hookMutex);
-    if (entry == g_hookedEntry) hook = g_hook;
+// Code that runs when something is done to one object.
+template <typename Object, typename... Arguments>
+class Hook {
+ public:
+  void set(Object object, std::function<void(Arguments...)> run) {
+    const std::lock_guard<std::mutex> lock(_mutex);
+    _object = object;
+    _run = std::move(run);
   }
-  if (hook) hook();
-}
+  void call(Object object, Arguments... arguments) {
+    std::unique_lock<std::mutex> lock(_mutex);
+    if (object != _object) return;
+    const auto run = _run;
+    lock.unlock();
+    run(arguments...);
+  }
+
+ private:
+  std::mutex _mutex;  // guards both
+  Object _object = nullptr;
+  std::function<void(Arguments...)> _run;
+};
+
+Hook<ThreadHook::Entry> g_threadHook;
+Hook<sem_t*, SemaphoreCall> g_semaphoreHook;
 
 }  // namespace
 
-namespace faults {
-
-FailedAllocation::FailedAllocation(size_t size, Form form) : _form(form) {
-  failingSize(form) = size;
+Fault::Fault(Failing function, size_t number) : _function(function) {
+  __atomic_store_n(&failing(function), number, __ATOMIC_SEQ_CST);
+}
+Fault::~Fault() {
+  __atomic_store_n(&failing(_function), size_t{0}, __ATOMIC_SEQ_CST);
+}
+bool Fault::happened() const {
+  return __atomic_load_n(&failing(_function), __ATOMIC_SEQ_CST) == 0;
 }
 
-FailedAllocation::~FailedAllocation() {
-  failingSize(_form) = 0;
+ThreadHook::ThreadHook(Entry entry, std::function<void()> run) {
+  g_threadHook.set(entry, std::move(run));
 }
-
-bool FailedAllocation::happened() const {
-  return failingSize(_form) == 0;
-}
-
-FailedThread::FailedThread(int nth) {
-  g_threadsToFailure = nth;
-}
-
-FailedThread::~FailedThread() {
-  g_threadsToFailure = 0;
-}
-
-bool FailedThread::happened() const {
-  return g_threadsToFailure == 0;
-}
-
-ThreadHook::ThreadHook(Entry entry, std::function<void()> before) {
-  const std::lock_guard<std::mutex> lock(g_hookMutex);
-  g_hookedEntry = entry;
-  g_hook = std::move(before);
-}
-
 ThreadHook::~ThreadHook() {
-  const std::lock_guard<std::mutex> lock(g_hookMutex);
-  g_hookedEntry = nullptr;
-  g_hook = nullptr;
+  g_threadHook.set(nullptr, nullptr);
+}
+
+SemaphoreHook::SemaphoreHook(sem_t& semaphore, std::function<void(SemaphoreCall)> run) {
+  g_semaphoreHook.set(&semaphore, std::move(run));
+}
+SemaphoreHook::~SemaphoreHook() {
+  g_semaphoreHook.set(nullptr, nullptr);
 }
 
 }  // namespace faults
+
+using faults::Failing;
 
 // Memory still comes from the library's (or a sanitizer's) own form, and goes back to it.
 void* operator new(size_t size) {
   using New = void* (*)(size_t);
   static const auto next = reinterpret_cast<New>(dlsym(RTLD_NEXT, "_Znwm"));
-  if (failsNow(size, Form::Throws)) throw std::bad_alloc();
+  if (faults::failsNow(Failing::New, size)) throw std::bad_alloc();
   return next(size);
 }
 
 void* operator new(size_t size, const std::nothrow_t& /*unused*/) noexcept {
-  if (failsNow(size, Form::ReturnsNull)) return nullptr;
-  try {
-    return ::operator new(size);
-  } catch (const std::bad_alloc&) {
-    return nullptr;
-  }
+  return faults::failsNow(Failing::NothrowNew, size) ? nullptr : ::operator new(size);
 }
 
 void* operator new(size_t size, std::align_val_t alignment, const std::nothrow_t& /*unused*/) noexcept {
-  if (failsNow(size, Form::ReturnsNull)) return nullptr;
-  try {
-    return ::operator new(size, alignment);
-  } catch (const std::bad_alloc&) {
-    return nullptr;
-  }
+  return faults::failsNow(Failing::NothrowNew, size) ? nullptr : ::operator new(size, alignment);
 }
 
-// Where a sanitizer is part of the executable, its own form is behind this name.
-extern "C" int __interceptor_pthread_create(pthread_t*, const pthread_attr_t*, void* (*)(void*), void*)
+// Where a sanitizer is part of the executable, its own forms are behind these names.
+#define REPLACED extern "C" __attribute__((visibility("default")))
+extern "C" {
+void* __interceptor_malloc(size_t size) __attribute__((weak));
+void* __libc_malloc(size_t size);
+int __interceptor_pthread_create(pthread_t*, const pthread_attr_t*, void* (*)(void*), void*)
     __attribute__((weak));
+int __interceptor_sem_wait(sem_t*) __attribute__((weak));
+int __interceptor_sem_post(sem_t*) __attribute__((weak));
+}
 
-extern "C" __attribute__((visibility("default"))) int pthread_create(pthread_t* thread,
-                                                                     const pthread_attr_t* attributes,
-                                                                     void* (*entry)(void*), void* argument) {
-  runThreadHook(entry);
-  if (threadFailsNow()) return EAGAIN;
-  using Create = int (*)(pthread_t*, const pthread_attr_t*, void* (*)(void*), void*);
-  static const auto next = __interceptor_pthread_create != nullptr
-                               ? &__interceptor_pthread_create
-                               : reinterpret_cast<Create>(dlsym(RTLD_NEXT, "pthread_create"));
-  return next(thread, attributes, entry, argument);
+template <typename Function>
+Function* next(Function* interceptor, const char* name) {
+  return interceptor != nullptr ? interceptor : reinterpret_cast<Function*>(dlsym(RTLD_NEXT, name));
+}
+
+// Called before the program, and the sanitizers, are up: nothing in here may need them.
+REPLACED __attribute__((no_sanitize("address", "thread", "undefined"))) void* malloc(size_t size) {
+  if (faults::failsNow(Failing::Malloc, size)) return nullptr;
+  return __interceptor_malloc != nullptr ? __interceptor_malloc(size) : __libc_malloc(size);
+}
+
+REPLACED int pthread_create(pthread_t* thread, const pthread_attr_t* attributes, void* (*entry)(void*),
+                            void* argument) {
+  faults::g_threadHook.call(entry);
+  if (faults::threadFailsNow()) return EAGAIN;
+  static auto* const create = next(&__interceptor_pthread_create, "pthread_create");
+  return create(thread, attributes, entry, argument);
+}
+
+REPLACED int sem_wait(sem_t* semaphore) {
+  faults::g_semaphoreHook.call(semaphore, faults::SemaphoreCall::Wait);
+  static auto* const wait = next(&__interceptor_sem_wait, "sem_wait");
+  return wait(semaphore);
+}
+
+REPLACED int sem_post(sem_t* semaphore) noexcept {
+  faults::g_semaphoreHook.call(semaphore, faults::SemaphoreCall::Post);
+  static auto* const post = next(&__interceptor_sem_post, "sem_post");
+  return post(semaphore);
 }

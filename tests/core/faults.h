@@ -1,50 +1,49 @@
 // The system below the product on request: the next allocation of a size fails, or the next thread; a thread
-// is made when the test says. It concerns the whole process and ends with the object.
+// is made, or a semaphore used, when the test says. All of it concerns the whole process and ends with the
+// object; one object of a kind at a time.
 // The test executable replaces the functions concerned (faults.cpp), so the product runs as it ships.
 #pragma once
 
+#include <semaphore.h>
 #include <stddef.h>
 
+#include <atomic>
 #include <functional>
 
 namespace faults {
 
-// Fails the next allocation of exactly `size` bytes, on any thread: of those that return null then
-// (new (std::nothrow)), or of those that throw.
-class FailedAllocation {
+// The functions that can be made to fail once.
+enum class Failing { New, NothrowNew, Malloc, Thread };
+
+// Fails the next allocation of exactly `number` bytes on any thread, or the `number`-th pthread_create()
+// from now on, counting from 1; 0: none.
+class Fault {
  public:
-  enum class Form { ReturnsNull, Throws };
-  explicit FailedAllocation(size_t size, Form form = Form::ReturnsNull);
-  ~FailedAllocation();
-  FailedAllocation(const FailedAllocation&) = delete;
-  FailedAllocation& operator=(const FailedAllocation&) = delete;
+  Fault(Failing function, size_t number);
+  ~Fault();
+  Fault(const Fault&) = delete;
+  Fault& operator=(const Fault&) = delete;
 
   bool happened() const;
 
  private:
-  const Form _form;
+  const Failing _function;
 };
 
-// Fails the n-th pthread_create() from now on, counting from 1.
-class FailedThread {
- public:
-  explicit FailedThread(int nth = 1);
-  ~FailedThread();
-  FailedThread(const FailedThread&) = delete;
-  FailedThread& operator=(const FailedThread&) = delete;
-
-  bool happened() const;
-};
-
-// Runs `before` on the creating thread, which it may block, just before each thread with that entry is made.
-// One at a time.
+// Runs `run` on the calling thread, which it may block, just before each thread with that entry is made.
 class ThreadHook {
  public:
   using Entry = void* (*)(void*);
-  ThreadHook(Entry entry, std::function<void()> before);
+  ThreadHook(Entry entry, std::function<void()> run);
   ~ThreadHook();
-  ThreadHook(const ThreadHook&) = delete;
-  ThreadHook& operator=(const ThreadHook&) = delete;
+};
+
+// Runs `run` on the calling thread, which it may block, just before each wait for that semaphore, or post.
+enum class SemaphoreCall { Wait, Post };
+class SemaphoreHook {
+ public:
+  SemaphoreHook(sem_t& semaphore, std::function<void(SemaphoreCall)> run);
+  ~SemaphoreHook();
 };
 
 }  // namespace faults

@@ -1,6 +1,12 @@
-// Feeding: the copying and the zero-copy way.
+// Feeding: the copying and the zero-copy way, the end mark, and the input buffers that come back.
 #include <limits.h>
 #include <string.h>
+
+#include <atomic>
+#include <map>
+#include <thread>
+
+#include <utils/String8.h>
 
 #include "tests/core/session_fixture.h"
 
@@ -8,6 +14,7 @@ namespace omxtest {
 namespace {
 
 constexpr OMX_U32 kCapacity = 38016;  // of an encoder's input buffer
+constexpr const char* kShuttingDown = "E OMXINTERFACE - Client Shutting Down: Input Data ignored";
 
 class InputTest : public SessionTest {
  protected:
@@ -21,65 +28,54 @@ class InputTest : public SessionTest {
     EXPECT_EQ(_session->reserveInputBuffer(&buffer.handle, &buffer.data), 0);
     return buffer;
   }
-  // Keeps the component from returning input, and lets all but `left` buffers go to it.
-  void holdInputAllBut(size_t left) {
-    script().holdInput();
-    for (size_t i = left; i < kInputs; ++i) ASSERT_EQ(feed("held"), 0);
-    ASSERT_EQ(busyCount(kOmxInputPort), kInputs - left);
+  void expectNothingReserved(int result) {
+    Reserved buffer{this, this};
+    EXPECT_EQ(_session->reserveInputBuffer(&buffer.handle, &buffer.data), result);
+    EXPECT_TRUE(buffer.handle == nullptr && buffer.data == nullptr);
   }
-  std::string lastCall() { return trace().back(); }
 };
 
 TEST_F(InputTest, CopiesDataIntoTheFirstFreeBuffer) {
-  start();
+  connect();
+  expectNothingReserved(-1);  // none was allocated
+  EXPECT_EQ(feed("x"), -1);
+  ASSERT_EQ(init(), OMXI_OK);
   script().holdInput();
   const size_t before = omx().count();
   EXPECT_EQ(feed("one", 10), 0);
   EXPECT_EQ(feed("two!", -1), 0);
   EXPECT_EQ(feed("", INT_MIN), 0);
   EXPECT_EQ(_session->sendInputData(nullptr, 0, INT_MAX), 0);
+  EXPECT_EQ(feed("none left"), -1);
+  expectNothingReserved(-1);
   EXPECT_EQ(trace(before),
             (Trace{"emptyBuffer in0 0+3 flags 0x0 time 10", "emptyBuffer in1 0+4 flags 0x0 time -1",
                    "emptyBuffer in2 0+0 flags 0x0 time -2147483648",
                    "emptyBuffer in3 0+0 flags 0x0 time 2147483647"}));
   EXPECT_EQ(_session->_portBuffers[0][0].length, kCapacity);  // only the zero-copy sends note theirs
-  EXPECT_EQ(feed("none left"), -1);
-  EXPECT_EQ(omx().count(), before + 4);
   script().passInput();
   ASSERT_TRUE(script().waitForInputs(4));
   EXPECT_EQ(script().inputs()[1].text(), "two!");
-  EXPECT_EQ(script().inputs()[1].timestamp, -1);
   EXPECT_EQ(log(), LogLines{});
 }
 
-TEST_F(InputTest, PrefersTheLowestFreeBuffer) {
+TEST_F(InputTest, SendsReservedBuffersInPlaceTheLowestFirst) {
   start();
   script().holdInput();
-  const Reserved first = reserve();
-  const Reserved second = reserve();
-  EXPECT_EQ(first.data, _session->_portBuffers[0][0].data);
-  EXPECT_NE(second.data, first.data);
-  _session->releaseInputBuffer(first.handle);
-  const Reserved again = reserve();
-  EXPECT_EQ(again.handle, first.handle);
-  EXPECT_EQ(busyCount(kOmxInputPort), 2u);
-}
-
-TEST_F(InputTest, SendsReservedBuffersInPlace) {
-  start();
-  script().holdInput();
-  const size_t before = omx().count();
+  const Reserved released = reserve();
+  EXPECT_EQ(released.data, _session->_portBuffers[0][0].data);
+  const Reserved part = reserve();
+  _session->releaseInputBuffer(released.handle);
   const Reserved whole = reserve();
+  EXPECT_EQ(whole.handle, released.handle);
+  EXPECT_EQ(busyCount(0), 2u);
+  const size_t before = omx().count();
   memset(whole.data, 'x', kCapacity);
   EXPECT_EQ(_session->sendInputBuffer(whole.handle, static_cast<int>(kCapacity), -7), 0);
-  EXPECT_EQ(_session->_portBuffers[0][0].length, kCapacity);
-  const Reserved part = reserve();
   memcpy(part.data, "part", 4);
   EXPECT_EQ(_session->sendInputBuffer(part.handle, 4, 8), 0);
   EXPECT_EQ(_session->_portBuffers[0][1].length, 4u);
-  const Reserved last = reserve();
-  memcpy(last.data, "never sent", 10);
-  EXPECT_EQ(_session->sendFinalBuffer(last.handle, 9), 0);
+  EXPECT_EQ(_session->sendFinalBuffer(reserve().handle, 9), 0);
   EXPECT_EQ(_session->_portBuffers[0][2].length, 0u);
   EXPECT_EQ(trace(before),
             (Trace{"emptyBuffer in0 0+38016 flags 0x10 time -7", "emptyBuffer in1 0+4 flags 0x10 time 8",
@@ -88,30 +84,7 @@ TEST_F(InputTest, SendsReservedBuffersInPlace) {
   ASSERT_TRUE(script().waitForInputs(3));
   EXPECT_EQ(script().inputs()[0].text(), std::string(kCapacity, 'x'));
   EXPECT_EQ(script().inputs()[1].text(), "part");
-  EXPECT_FALSE(_session->_endOfInputPending);  // that is the end-of-input flag's
-  EXPECT_FALSE(_session->_inputClosed);
-}
-
-TEST_F(InputTest, RefusesAtOnceWhenNoBufferIsFree) {
-  void* handle = this;
-  void* data = this;
-  connect();
-  EXPECT_EQ(_session->reserveInputBuffer(&handle, &data), -1);  // none was allocated
-  EXPECT_EQ(handle, nullptr);
-  EXPECT_EQ(data, nullptr);
-  EXPECT_EQ(feed("x"), -1);
-  ASSERT_EQ(init(), OMXI_OK);
-  holdInputAllBut(0);
-  handle = data = this;
-  EXPECT_EQ(_session->reserveInputBuffer(&handle, &data), -1);
-  EXPECT_EQ(handle, nullptr);
-  EXPECT_EQ(data, nullptr);
-  EXPECT_EQ(feed("x"), -1);
-  EXPECT_EQ(log(), LogLines{});
-  EXPECT_EQ(_session->reserveInputBuffer(nullptr, &data), -1);
-  EXPECT_EQ(_session->reserveInputBuffer(&handle, nullptr), -1);
-  const std::string nowhere = "E OMXINTERFACE - Nowhere to put the reserved buffer";
-  EXPECT_EQ(log(), (LogLines{nowhere, nowhere}));
+  EXPECT_FALSE(_session->_endOfInputPending || _session->_inputClosed);  // that is the end-of-input flag's
 }
 
 TEST_F(InputTest, RefusesWhatABufferDoesNotHold) {
@@ -121,37 +94,24 @@ TEST_F(InputTest, RefusesWhatABufferDoesNotHold) {
   EXPECT_EQ(_session->sendInputData(data.data(), kCapacity + 1, 0), -1);
   EXPECT_EQ(_session->sendInputData(data.data(), UINT_MAX, 0), -1);
   EXPECT_EQ(_session->sendInputData(nullptr, 1, 0), -1);
-  EXPECT_EQ(log().size(), 3u);
-  EXPECT_EQ(busyCount(kOmxInputPort), 0u);  // what was free stays free
-
+  EXPECT_EQ(log().back(), "E OMXINTERFACE - Input of 1 bytes at (nil) refused: a buffer holds 38016");
+  EXPECT_EQ(busyCount(0), 0u);  // what was free stays free
   const Reserved buffer = reserve();
   for (const int length : {-1, INT_MIN, static_cast<int>(kCapacity) + 1, INT_MAX}) {
     EXPECT_EQ(_session->sendInputBuffer(buffer.handle, length, 0), -1);
   }
   EXPECT_EQ(log().size(), 7u);
   EXPECT_EQ(log()[3], "E OMXINTERFACE - -1 bytes do not fit an input buffer of 38016");
-  for (const std::string& line : log()) EXPECT_EQ(line.find("E OMXINTERFACE - "), 0u) << line;
-  EXPECT_EQ(busyCount(kOmxInputPort), 1u);
+  EXPECT_EQ(busyCount(0), 1u);
   EXPECT_EQ(omx().count(), before);
   // A send leaves its length in the record; the buffer holds as much as before.
   EXPECT_EQ(_session->sendInputBuffer(buffer.handle, 1, 0), 0);
-  requireEventually([this] { return busyCount(kOmxInputPort) == 0; }, "the input buffer");
+  waitForBusy(0, 0);
   EXPECT_EQ(_session->inputBufferCapacity(), kCapacity);
   EXPECT_EQ(_session->sendInputData(data.data(), kCapacity, 0), 0);
 }
 
-TEST_F(InputTest, DoesNotCopyToABufferWithoutAnAddress) {
-  start();
-  _session->_portBuffers[0].editItemAt(0).data = nullptr;  // as of a component in another process
-  const size_t before = omx().count();
-  EXPECT_EQ(feed("x"), -1);
-  EXPECT_EQ(log(), LogLines{"E OMXINTERFACE - Input refused: the component's buffer has no address here"});
-  EXPECT_EQ(busyCount(kOmxInputPort), 0u);
-  EXPECT_EQ(omx().count(), before);
-  EXPECT_EQ(feed(""), 0);
-}
-
-TEST_F(InputTest, RefusesHandlesThatAreNoneOfItsOwn) {
+TEST_F(InputTest, RefusesHandlesThatAreNoneOfItsOwnAndBuffersWithoutAnAddress) {
   start();
   const Reserved good = reserve();
   BufferInfo foreign;
@@ -161,7 +121,7 @@ TEST_F(InputTest, RefusesHandlesThatAreNoneOfItsOwn) {
   for (void* handle : {static_cast<void*>(nullptr), static_cast<void*>(&foreign), good.data,
                        static_cast<void*>(table + 1), static_cast<void*>(table - sizeof(BufferInfo)),
                        static_cast<void*>(table + kInputs * sizeof(BufferInfo)),
-                       static_cast<void*>(&_session->_portBuffers[1].editItemAt(0)), bufferId(0, 0)}) {
+                       static_cast<void*>(outputRecord(0)), bufferId(0, 0)}) {
     EXPECT_EQ(_session->sendInputBuffer(handle, 1, 0), -1);
     EXPECT_EQ(_session->sendFinalBuffer(handle, 0), -1);
     _session->releaseInputBuffer(handle);
@@ -169,41 +129,173 @@ TEST_F(InputTest, RefusesHandlesThatAreNoneOfItsOwn) {
   }
   EXPECT_EQ(log().size(), lines);
   for (const std::string& line : log()) EXPECT_NE(line.find("is no input buffer of this session"), line.npos);
+  EXPECT_EQ(busyCount(0), 1u);
+  _log.clear();
+  void* pointer = nullptr;
+  EXPECT_EQ(_session->reserveInputBuffer(nullptr, &pointer), -1);
+  EXPECT_EQ(_session->reserveInputBuffer(&pointer, nullptr), -1);
+  _session->_portBuffers[0].editItemAt(1).data = nullptr;  // as of a component in another process
+  EXPECT_EQ(feed("x"), -1);
+  const std::string nowhere = "E OMXINTERFACE - Nowhere to put the reserved buffer";
+  EXPECT_EQ(log(), (LogLines{nowhere, nowhere,
+                             "E OMXINTERFACE - Input refused: the component's buffer has no address here"}));
+  EXPECT_EQ(busyCount(0), 1u);
   EXPECT_EQ(omx().count(), before);
-  EXPECT_EQ(busyCount(kOmxInputPort), 1u);
+  EXPECT_EQ(feed(""), 0);
 }
 
 TEST_F(InputTest, ReportsWhatTheComponentRefuses) {
-  using Send = std::function<int()>;
   const std::string tail = std::string("::emptyBuffer failed w/ error ") + kRefusedHex + " \n";
-  Reserved buffer;
-  const struct {
-    const char* name;
-    bool reserving;
-    Send send;
-    int result;
-    std::string line;
-  } cases[] = {
-      {"copy", false, [&] { return feed("x"); }, -2, "E OMXINTERFACE - ETB" + tail},
-      {"in place", true, [&] { return _session->sendInputBuffer(buffer.handle, 1, 0); }, -1,
-       "E OMXINTERFACE - SEND INPUT BUFFER" + tail},
-      {"final", true, [&] { return _session->sendFinalBuffer(buffer.handle, 0); }, -1,
-       "E OMXINTERFACE - ETB" + tail},
-      {"end mark", false, [&] { return beginEndOfInput().result(); }, -2, "E OMXINTERFACE - ETB" + tail},
-  };
+  const LogLines refused{"E OMXINTERFACE - ETB" + tail};
   start();
-  size_t out = 0;
+  const Reserved first = reserve();
+  const Reserved second = reserve();
+  const struct {
+    std::function<int()> send;
+    int result;
+    LogLines log;
+  } cases[] = {
+      {[&] { return feed("x"); }, -2, refused},
+      {[&] { return _session->sendInputBuffer(first.handle, 1, 0); },
+       -1,
+       {"E OMXINTERFACE - SEND INPUT BUFFER" + tail}},
+      {[&] { return _session->sendFinalBuffer(second.handle, 0); }, -1, refused},
+      {[&] { return beginEndOfInput().result(); }, -2, refused},
+  };
   for (const auto& each : cases) {
-    SCOPED_TRACE(each.name);
     _log.clear();
-    if (each.reserving) buffer = reserve();
     omx().fail(Method::EmptyBuffer);
     EXPECT_EQ(each.send(), each.result);
-    EXPECT_EQ(log(), LogLines{each.line});
-    EXPECT_EQ(busyCount(kOmxInputPort), ++out);  // it is not free again
+    EXPECT_EQ(log(), each.log);
     EXPECT_FALSE(_session->_inputClosed);
   }
+  EXPECT_EQ(busyCount(0), 4u);  // none is free again
   EXPECT_TRUE(_session->_endOfInputPending);
+}
+
+TEST_F(InputTest, ClosesWithTheEndMarkButForWhatWasReserved) {
+  start();
+  script().holdInput();
+  const Reserved first = reserve();
+  const Reserved second = reserve();
+  const size_t before = omx().count();
+  EXPECT_EQ(beginEndOfInput(-5).result(), 0);
+  EXPECT_TRUE(_session->_inputClosed);
+  expectNothingReserved(-2);
+  EXPECT_EQ(log(), LogLines{kShuttingDown});
+  EXPECT_EQ(feed("dropped without a word"), 0);
+  EXPECT_EQ(_session->sendInputBuffer(first.handle, 0, 1), 0);
+  EXPECT_EQ(_session->sendFinalBuffer(second.handle, 2), 0);
+  EXPECT_EQ(trace(before),
+            (Trace{"emptyBuffer in2 0+0 flags 0x1 time -5", "emptyBuffer in0 0+0 flags 0x10 time 1",
+                   "emptyBuffer in1 0+0 flags 0x1 time 2"}));
+  EXPECT_EQ(log(), LogLines{kShuttingDown});
+}
+
+TEST_F(InputTest, WaitsForAFreeBufferForTheEndMark) {
+  // A buffer comes free in one of two ways.
+  for (const bool returned : {true, false}) {
+    start();
+    const Reserved kept = reserve();
+    holdInputAllBut(1);
+    const size_t before = omx().count();
+    Later<int> ending = beginEndOfInput(3);
+    waitForSleeper(&SessionState::inputFreeWaiters);
+    EXPECT_EQ(omx().count(), before);
+    EXPECT_TRUE(_session->_endOfInputPending);
+    EXPECT_FALSE(_session->_inputClosed);
+    if (returned) script().releaseInput(1);
+    if (!returned) _session->releaseInputBuffer(kept.handle);
+    EXPECT_EQ(ending.result(), 0);
+    EXPECT_EQ(trace(before),
+              Trace{std::string("emptyBuffer in") + (returned ? "1" : "0") + " 0+0 flags 0x1 time 3"});
+    destroy();
+    script().passInput();
+  }
+}
+
+TEST_F(InputTest, TellsTheApplicationOfEachBufferThatIsFreeAgain) {
+  start();
+  holdInputAllBut(0);
+  std::atomic<int> fed{-9};
+  _application.onInput([&] { fed = feed("from the callback"); });
+  script().releaseInput(1);
+  requireEventually([&] { return fed != -9; }, "the input callback");
+  EXPECT_EQ(fed, 0);
+  _application.onInput(nullptr);
+  script().passInput();
+  waitForBusy(0, 0);
+  _application.waitForInputCallbacks(5);
+  EXPECT_EQ(_application.inputCallbacks(), std::vector<void*>(5, _session.get()));
+  EXPECT_EQ(valueOf(_session->_semInputBufferFree), 0);  // nobody waits for one
+  EXPECT_EQ(valueOf(_session->_semInputBuffersReturned), 0);
+}
+
+TEST_F(InputTest, WarnsOfABufferReturnedTwiceAndFailsForOneItDoesNotKnow) {
+  connect();
+  deliver(makeEmptyBufferDone(this));  // no table yet
+  EXPECT_EQ(_session->threadError(), OMXI_ERR_BUFFER_NOT_FOUND);
+  ASSERT_EQ(init(), OMXI_OK);
+  for (void* id : {static_cast<void*>(nullptr), bufferId(1, 0)}) deliver(makeEmptyBufferDone(id));
+  EXPECT_EQ(log(), LogLines(3, "E OMXINTERFACE - Buffer not found in buffer vector.\n"));
+  EXPECT_EQ(_application.inputCallbacks().size(), 3u);
+  _log.clear();
+  _session->_threadError = OMXI_OK;
+  void* const id = bufferId(0, 2);
+  deliver(makeEmptyBufferDone(id));
+  EXPECT_EQ(log(), LogLines{android::String8::format("W OMXINTERFACE - We already own input buffer %p, yet "
+                                                     "received an EMPTY_BUFFER_DONE.",
+                                                     id)
+                                .string()});
+  EXPECT_EQ(_application.inputCallbacks().size(), 4u);
+  EXPECT_EQ(_session->threadError(), OMXI_OK);
+}
+
+TEST_F(InputTest, TellsWhoeverWaitsForTheInputBuffersOrTheEndMark) {
+  start();
+  script().holdInput();
+  for (const char* text : {"a", "b"}) ASSERT_EQ(feed(text), 0);
+  const auto posts = [this](size_t index) {
+    deliver(makeEmptyBufferDone(bufferId(0, index)));
+    return std::pair(valueOf(_session->_semInputBuffersReturned), valueOf(_session->_semInputBufferFree));
+  };
+  _session->_portReconfiguring = true;
+  EXPECT_FALSE(_session->portBuffersHaveBeenReturned(0));
+  EXPECT_EQ(posts(0), std::pair(0, 0));  // one is still out
+  EXPECT_EQ(posts(1), std::pair(1, 0));
+  EXPECT_TRUE(_session->portBuffersHaveBeenReturned(0));
+  EXPECT_FALSE(_session->portBuffersHaveBeenReturned(1));
+  _session->_portReconfiguring = false;
+  EXPECT_EQ(posts(1), std::pair(1, 0));
+  _session->_endOfOutputReached = true;
+  EXPECT_EQ(posts(1), std::pair(2, 0));
+  _session->_endOfInputPending = true;
+  EXPECT_EQ(posts(1), std::pair(3, 1));
+}
+
+TEST_F(InputTest, LetsSeveralThreadsFeed) {
+  start();
+  // Two threads that took the same buffer would send the component a buffer that it has.
+  constexpr int kThreads = 4;
+  constexpr int kEach = 200;
+  std::vector<std::thread> feeders;
+  for (int thread = 0; thread < kThreads; ++thread) {
+    feeders.emplace_back([this, thread] {
+      for (int i = 0; i < kEach;) {
+        const int result = feed(std::to_string(thread) + ":" + std::to_string(i), i);
+        EXPECT_TRUE(result == 0 || result == -1) << result;
+        if (result == 0) ++i;
+        if (result == -1) std::this_thread::yield();
+      }
+    });
+  }
+  for (std::thread& feeder : feeders) feeder.join();
+  ASSERT_TRUE(script().waitForInputs(kThreads * kEach));
+  std::map<char, int> next;
+  for (const Packet& input : script().inputs()) {
+    EXPECT_EQ(input.text().substr(2), std::to_string(next[input.text()[0]]++));
+  }
+  EXPECT_EQ(log(), LogLines{});
 }
 
 }  // namespace

@@ -1,79 +1,50 @@
-// init() and deInit(): the calls in their order, and what they wait for.
+// init() and deInit(): the calls in their order, what they wait for, and what a refused call leaves behind.
+#include "tests/core/faults.h"
 #include "tests/core/session_fixture.h"
 
 namespace omxtest {
 namespace {
 
-constexpr const char* kOutputThreadOver = "W OMXINTERFACE - ===DataOutputThread over! enc thread!\n";
+using LifecycleTest = SessionTest;
 
-// The calls by which a component of 4 input and `outputs` output buffers gets to Executing.
-Trace startingCalls(const char* inputCall, const std::string& inputSize, const char* outputCall,
-                    const std::string& outputSize, size_t outputs) {
+TEST_F(LifecycleTest, GoesToExecutingAndBackToLoadedAndFreesEverything) {
+  connect();
+  omx().clearCalls();
+  EXPECT_EQ(init(), OMXI_OK);
   Trace calls{"sendCommand state 2", "getParameter definition of port 0"};
   for (const char* place : {"in0", "in1", "in2", "in3"}) {
-    calls.push_back(std::string(inputCall) + " " + place + " of " + inputSize);
+    calls.push_back(std::string("useBuffer ") + place + " of 38016");
   }
   calls.emplace_back("getParameter definition of port 1");
-  for (size_t i = 0; i < outputs; ++i) {
-    calls.push_back(std::string(outputCall) + " out" + std::to_string(i) + " of " + outputSize);
-  }
+  for (int i = 0; i < 6; ++i) calls.push_back("useBuffer out" + std::to_string(i) + " of 65536");
   calls.emplace_back("sendCommand state 3");
-  for (size_t i = 0; i < outputs; ++i) calls.push_back("fillBuffer out" + std::to_string(i));
-  return calls;
-}
+  for (int i = 0; i < 6; ++i) calls.push_back("fillBuffer out" + std::to_string(i));
+  EXPECT_EQ(trace(), calls);
+  EXPECT_EQ(_session->_omxState, OMX_StateExecuting);
+  EXPECT_EQ(busyCount(0), 0u);
+  EXPECT_EQ(busyCount(1), kOutputs);
 
-class LifecycleTest : public SessionTest {
- protected:
-  using SessionTest::SessionTest;
-
-  void expectStart(Kind kind, const Trace& calls) {
-    connect(kind);
-    const size_t before = omx().count();
-    EXPECT_EQ(init(), OMXI_OK);
-    EXPECT_EQ(trace(before), calls);
-    EXPECT_EQ(_session->_omxState, OMX_StateExecuting);
-    EXPECT_EQ(busyCount(kOmxInputPort), 0u);
-    EXPECT_EQ(busyCount(kOmxOutputPort), _session->_portBuffers[kOmxOutputPort].size());
-  }
-};
-
-class TiLifecycleTest : public LifecycleTest {
- protected:
-  TiLifecycleTest() : LifecycleTest("omap4") {}
-};
-
-TEST_F(LifecycleTest, StartsAQualcommEncoderWithItsOwnMemory) {
-  expectStart(Kind::Encoder, startingCalls("useBuffer", "38016", "useBuffer", "65536", 6));
-}
-
-TEST_F(LifecycleTest, StartsAQualcommDecoderWithOutputOfTheComponents) {
-  expectStart(Kind::Decoder, startingCalls("useBuffer", "65536", "allocateBufferWithBackup", "38016", 8));
-}
-
-TEST_F(TiLifecycleTest, StartsATiEncoderWithMemoryOfTheComponents) {
-  expectStart(Kind::Encoder,
-              startingCalls("allocateBufferWithBackup", "38016", "allocateBufferWithBackup", "65536", 6));
-}
-
-TEST_F(LifecycleTest, GoesBackToLoadedAndFreesEverything) {
-  start();
-  feedThrough("a picture", 5);
   endOfStream(6);
-  const size_t before = omx().count();
+  calls = trace();
   EXPECT_EQ(deInit(), OMXI_OK);
-  EXPECT_EQ(trace().size() - before, 12u);
-  EXPECT_EQ(trace(before),
-            (Trace{"sendCommand state 2", "sendCommand state 1", "freeBuffer 1 out5", "freeBuffer 1 out4",
-                   "freeBuffer 1 out3", "freeBuffer 1 out2", "freeBuffer 1 out1", "freeBuffer 1 out0",
-                   "freeBuffer 0 in3", "freeBuffer 0 in2", "freeBuffer 0 in1", "freeBuffer 0 in0"}));
+  for (const char* call :
+       {"sendCommand state 2", "sendCommand state 1", "freeBuffer 1 out5", "freeBuffer 1 out4",
+        "freeBuffer 1 out3", "freeBuffer 1 out2", "freeBuffer 1 out1", "freeBuffer 1 out0",
+        "freeBuffer 0 in3", "freeBuffer 0 in2", "freeBuffer 0 in1", "freeBuffer 0 in0"}) {
+    calls.emplace_back(call);
+  }
+  EXPECT_EQ(trace(), calls);
   EXPECT_EQ(_session->_omxState, OMX_StateLoaded);
   EXPECT_TRUE(_session->_deinitDone);
   EXPECT_EQ(_session->_platformWrapper, nullptr);
-  const size_t ended = omx().count();
+  EXPECT_EQ(deInit(), OMXI_OK);  // a second one does nothing
+  _session->setThreadError(OMXI_ERR_APPLICATION);
+  EXPECT_EQ(deInit(), OMXI_ERR_APPLICATION);
+  EXPECT_EQ(trace(), calls);
   destroy();
-  EXPECT_EQ(trace(ended), Trace{"freeNode"});
-  EXPECT_EQ(omx().buffersFreedWithNode(), 0u);
-  EXPECT_EQ(log(), LogLines{kOutputThreadOver});
+  calls.emplace_back("freeNode");
+  EXPECT_EQ(trace(), calls);
+  EXPECT_EQ(log(), LogLines{kEncoderOver});
 }
 
 TEST_F(LifecycleTest, WaitsForTheEndOfOutputBeforeItGoesIdle) {
@@ -95,12 +66,12 @@ TEST_F(LifecycleTest, WaitsForEachStateThatItAsksFor) {
   for (const OMX_U32 state : {OMX_StateIdle, OMX_StateExecuting}) {
     require(messages().waitForHeld(1), "the completion of a state");
     waitForSleeper(&SessionState::stateWaiters);
-    EXPECT_EQ(omx().count(Method::SendCommand), state - 1);
     // A late or doubled completion of another state is not the one that is waited for.
     deliverEvent(OMX_EventCmdComplete, OMX_CommandStateSet, state - 1);
     deliverEvent(OMX_EventCmdComplete, OMX_CommandFlush, state);
-    EXPECT_FALSE(starting.isDone());
+    requireEventually([this] { return valueOf(_session->_semStateChanged) == 0; }, "a look at the state");
     waitForSleeper(&SessionState::stateWaiters);
+    EXPECT_FALSE(starting.isDone());
     EXPECT_EQ(omx().count(Method::SendCommand), state - 1);
     EXPECT_TRUE(messages().release());
   }
@@ -116,27 +87,10 @@ TEST_F(LifecycleTest, WaitsForTheOutputBuffersBeforeItFreesThem) {
   require(messages().waitForHeld(kOutputs - 1), "the buffers of a component that goes Idle");
   waitForSleeper(&SessionState::outputReturnWaiters);
   EXPECT_EQ(omx().count(Method::FreeBuffer), 0u);
-  messages().releaseAllReversed();
+  while (messages().release(messages().held().size() - 1)) {
+  }
   EXPECT_EQ(ending.result(), OMXI_OK);
   EXPECT_EQ(omx().count(Method::FreeBuffer), kInputs + kOutputs);
-}
-
-TEST_F(LifecycleTest, ReturnsTheRecordedFailureWithoutWaitingForTheEndOfOutput) {
-  start();
-  _session->setThreadError(OMXI_ERR_EVENT_ERROR);
-  EXPECT_EQ(deInit(), OMXI_ERR_EVENT_ERROR);
-  EXPECT_TRUE(_session->_deinitDone);
-}
-
-TEST_F(LifecycleTest, DoesNothingWhenItHasEndedBefore) {
-  start();
-  endOfStream();
-  ASSERT_EQ(deInit(), OMXI_OK);
-  const size_t before = omx().count();
-  EXPECT_EQ(deInit(), OMXI_OK);
-  _session->setThreadError(OMXI_ERR_APPLICATION);
-  EXPECT_EQ(deInit(), OMXI_ERR_APPLICATION);
-  EXPECT_EQ(omx().count(), before);
 }
 
 TEST_F(LifecycleTest, TellsTheApplicationOfAFailure) {
@@ -148,32 +102,141 @@ TEST_F(LifecycleTest, TellsTheApplicationOfAFailure) {
   _application.onInput([&] { seen = _session->threadError(); });
   _session->setThreadError(OMXI_ERR_EVENT_ERROR);
   EXPECT_EQ(seen, OMXI_ERR_EVENT_ERROR);  // it can be read when the callback comes
-  EXPECT_EQ(_application.inputCallbacks(), 1u);
-  EXPECT_EQ(_application.inputSession(), _session.get());
   _session->registerInputCallback(nullptr, nullptr);
   _session->setThreadError(OMXI_ERR_APPLICATION);
-  EXPECT_EQ(_application.inputCallbacks(), 1u);
+  EXPECT_EQ(_application.inputCallbacks(), std::vector<void*>{_session.get()});
 }
 
 TEST_F(LifecycleTest, FollowsTheComponentsStateAndLogsItsErrors) {
   connect();
+  int posts = 0;
   for (const int state : {OMX_StateIdle, OMX_StateExecuting, OMX_StatePause, OMX_StateLoaded}) {
-    const int posts = valueOf(_session->_semStateChanged);
     deliverEvent(OMX_EventCmdComplete, OMX_CommandStateSet, static_cast<OMX_U32>(state));
     EXPECT_EQ(_session->_omxState, state);
-    EXPECT_EQ(valueOf(_session->_semStateChanged), posts + 1);
+    EXPECT_EQ(valueOf(_session->_semStateChanged), ++posts);
   }
-  const int posts = valueOf(_session->_semStateChanged);
   deliverEvent(OMX_EventCmdComplete, OMX_CommandPortDisable, 1);
   deliverEvent(OMX_EventPortSettingsChanged, 1, 0);
-  deliverEvent(OMX_EventBufferFlag, 1, 1);
-  EXPECT_EQ(log(), LogLines{});
   deliverEvent(OMX_EventError, 0x80001001, 7);
   EXPECT_EQ(log(), LogLines{"E OMXINTERFACE - Event error = -2147479551(0x80001001), data2 7 \n"});
   EXPECT_EQ(_session->_omxState, OMX_StateLoaded);
   EXPECT_EQ(valueOf(_session->_semStateChanged), posts);
   EXPECT_EQ(_session->threadError(), OMXI_OK);
-  EXPECT_EQ(_application.inputCallbacks(), 0u);
+  EXPECT_TRUE(_application.inputCallbacks().empty());
+}
+
+// --- Refusals ---
+
+struct InitFailure {
+  Method method;
+  size_t nth;
+  int result;
+  std::string line;  // empty: none
+  size_t inputs;     // records that stay
+  size_t outputs;
+  size_t calls;  // of that init()
+};
+
+class InitFailureTest : public SessionTest, public ::testing::WithParamInterface<InitFailure> {};
+
+TEST_P(InitFailureTest, StopsAndLeavesWhatWasDone) {
+  const InitFailure& expected = GetParam();
+  connect();
+  omx().clearCalls();
+  omx().fail(expected.method, expected.nth);
+  EXPECT_EQ(init(), expected.result);
+  EXPECT_EQ(log(), expected.line.empty() ? LogLines{} : LogLines{expected.line});
+  EXPECT_EQ(omx().count(), expected.calls) << ::testing::PrintToString(trace());
+  EXPECT_EQ(_session->_portBuffers[0].size(), expected.inputs);
+  EXPECT_EQ(_session->_portBuffers[1].size(), expected.outputs);
+  EXPECT_EQ(_session->threadError(), OMXI_OK);
+  // The output thread waits on, and destruction ends it.
+  destroy();
+  EXPECT_EQ(log().back(), kEncoderOver);
+}
+
+const std::string kNoDefinition =
+    "E OMXINTERFACE - ALLOCATE BUFFERS: Could not get port definition: -2147483648";
+std::string noMemory(int port, int buffer) {
+  return "E OMXINTERFACE - Could not allocate memory: port " + std::to_string(port) + " buffer " +
+         std::to_string(buffer) + " error -2147483648(0x80000000)\n";
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Calls, InitFailureTest,
+    ::testing::Values(InitFailure{Method::SendCommand, 1, 20, "", 0, 0, 1},
+                      InitFailure{Method::GetParameter, 1, 13, kNoDefinition, 0, 0, 2},
+                      InitFailure{Method::UseBuffer, 3, 15, noMemory(0, 2), 2, 0, 5},
+                      InitFailure{Method::GetParameter, 2, 13, kNoDefinition, 4, 0, 7},
+                      InitFailure{Method::UseBuffer, 6, 15, noMemory(1, 1), 4, 1, 9},
+                      InitFailure{Method::SendCommand, 2, 21, "", 4, 6, 14},
+                      InitFailure{Method::FillBuffer, 3, 8,
+                                  "E OMXINTERFACE - fillBuffer failed w/ error 0x80000000", 4, 6, 17}));
+
+TEST_F(LifecycleTest, StartsAgainWithTheThreadOfAFailedStart) {
+  connect();
+  const size_t before = omx().count();
+  {
+    const faults::Fault failed(faults::Failing::Thread, 1);
+    EXPECT_EQ(_session->init(), OMXI_ERR_CREATE_OUTPUT_THREAD);
+  }
+  EXPECT_EQ(omx().count(), before);
+  EXPECT_EQ(log(), LogLines{});
+  omx().fail(Method::SendCommand, 1);
+  ASSERT_EQ(init(), OMXI_ERR_SEND_COMMAND_STATE);
+  const pthread_t thread = _session->_outputThread;
+  EXPECT_EQ(init(), OMXI_OK);
+  EXPECT_TRUE(pthread_equal(thread, _session->_outputThread));
+  feedThrough("delivered");
+}
+
+TEST_F(LifecycleTest, CanBeTakenDownAgainAfterARefusal) {
+  start();
+  _application.onOutput([](const Output&) { return 1; });
+  feedThrough("kept");
+  _session->setThreadError(OMXI_ERR_EVENT_ERROR);  // recorded, so nobody waits for the end of output
+  size_t before = omx().count();
+  omx().fail(Method::SendCommand, 1);
+  EXPECT_EQ(deInit(), OMXI_ERR_SEND_COMMAND_STATE);
+  EXPECT_EQ(log().back(), std::string("E Error Sending Idle State: ") + kRefusedText + "\n");
+  _session->returnIomxOutputBuffer(_application.outputs()[0].bufferId);  // the component goes on
+  EXPECT_EQ(trace(before), (Trace{"sendCommand state 2 failed", "fillBuffer out0"}));
+  omx().fail(Method::SendCommand, 2);
+  EXPECT_EQ(deInit(), OMXI_ERR_SEND_COMMAND_STATE);
+  EXPECT_EQ(log().back(), std::string("E OMXINTERFACE - Error Sending Loaded State: ") + kRefusedText + "\n");
+  EXPECT_EQ(omx().count(Method::FreeBuffer), 0u);
+  EXPECT_NE(_session->_platformWrapper, nullptr);
+  EXPECT_FALSE(_session->_deinitDone);
+  before = omx().count();
+  EXPECT_EQ(deInit(), OMXI_ERR_EVENT_ERROR);
+  EXPECT_EQ(trace(before)[0], "sendCommand state 1");  // the component is in Idle already
+  EXPECT_TRUE(_session->_deinitDone);
+}
+
+TEST_F(LifecycleTest, GoesBackFromIdleWhenExecutingWasRefused) {
+  connect();
+  omx().fail(Method::SendCommand, 2);
+  ASSERT_EQ(init(), OMXI_ERR_SET_EXECUTION_STATE);
+  _session->setThreadError(OMXI_ERR_APPLICATION);  // no output ends this session
+  omx().clearCalls();
+  EXPECT_EQ(deInit(), OMXI_ERR_APPLICATION);
+  EXPECT_EQ(trace()[0], "sendCommand state 1");
+  EXPECT_EQ(omx().count(Method::FreeBuffer), kInputs + kOutputs);
+}
+
+TEST_F(LifecycleTest, IgnoresBuffersThatTheComponentDoesNotFree) {
+  start();
+  endOfStream();
+  omx().failWhere([](const Call& call) { return call.method == Method::FreeBuffer && call.port == 1; });
+  // Loaded is reached when the node has no buffers left, which here it has.
+  Later<int> ending = beginDeInit();
+  waitForSleeper(&SessionState::stateWaiters);
+  requireEventually([this]() -> bool { return _session->_deinitDone; }, "the buffers' release");
+  EXPECT_TRUE(_session->_portBuffers[0].isEmpty() && _session->_portBuffers[1].isEmpty());
+  deliverEvent(OMX_EventCmdComplete, OMX_CommandStateSet, OMX_StateLoaded);
+  EXPECT_EQ(ending.result(), OMXI_OK);
+  destroy();
+  EXPECT_EQ(omx().buffersFreedWithNode(), kOutputs);
 }
 
 }  // namespace

@@ -7,25 +7,23 @@
 namespace omxtest {
 namespace {
 
-constexpr const char* kEncoderOver = "W OMXINTERFACE - ===DataOutputThread over! enc thread!\n";
-constexpr const char* kDecoderOver = "W OMXINTERFACE - ===DataOutputThread over! dec thread!\n";
+using Texts = std::vector<std::string>;
 
 class OutputTest : public SessionTest {
  protected:
-  BufferInfo* record(size_t index) { return &_session->_portBuffers[kOmxOutputPort].editItemAt(index); }
-  bool isOutputThreadRunning() {
-    const SessionState::Lock held(_session->_state->lock);
-    return _session->_state->outputThread.running;
+  // The application keeps every buffer, or stops at a gate in the callback.
+  void keepBuffers() {
+    _application.onOutput([](const Output&) { return 1; });
   }
-  void waitForOutputThreadToEnd() {
-    requireEventually([this] { return !isOutputThreadRunning(); }, "the end of the output thread");
+  Gate& stopInCallback() {
+    Gate& gate = newGate();
+    _application.onOutput([&](const Output&) {
+      gate.pass();
+      return 0;
+    });
+    return gate;
   }
-  void waitForBusy(size_t count) {
-    requireEventually([&] { return busyCount(kOmxOutputPort) == count; }, "the output buffers");
-  }
-  void waitForFills(size_t count) {
-    require(omx().waitForCalls(Method::FillBuffer, count), "the output buffers' way to the component");
-  }
+  size_t fills() { return omx().count(Method::FillBuffer); }
 };
 
 TEST_F(OutputTest, DeliversWhatTheComponentMakesInOrder) {
@@ -38,37 +36,27 @@ TEST_F(OutputTest, DeliversWhatTheComponentMakesInOrder) {
   const std::vector<Output> outputs = _application.outputs();
   for (size_t i = 0; i < outputs.size(); ++i) {
     EXPECT_EQ(outputs[i].bytes, "output " + std::to_string(i));
-    EXPECT_EQ(outputs[i].length, outputs[i].bytes.size());
     EXPECT_EQ(outputs[i].timestamp, 1000 + i);  // the low half
     EXPECT_EQ(outputs[i].first, _session.get());
     EXPECT_EQ(outputs[i].bufferId, bufferId(1, i % kOutputs));  // each went back and came again
-    EXPECT_EQ(outputs[i].data, record(i % kOutputs)->data);
+    EXPECT_EQ(outputs[i].data, outputRecord(i % kOutputs)->data);
   }
-  waitForBusy(kOutputs);
+  waitForBusy(1, kOutputs);
   EXPECT_EQ(log(), LogLines{});
 }
 
-TEST_F(OutputTest, StartsAtTheBuffersBeginningWhateverTheRangeSays) {
+TEST_F(OutputTest, StartsAtTheBuffersBeginningAndEndsWithItWhateverTheRangeSays) {
   start();
   Packet shifted("..shifted");
   shifted.offset = 2;
-  shifted.lengthToTell = 3;
-  script().produce(shifted);
-  _application.waitForOutputs(1);
-  EXPECT_EQ(_application.outputs()[0].data, record(0)->data);
+  for (const OMX_U32 length : {3u, 65537u, 0xffffffffu}) {
+    shifted.lengthToTell = length;
+    script().produce(shifted);
+  }
+  _application.waitForOutputs(3);
+  EXPECT_EQ(_application.outputs()[0].data, outputRecord(0)->data);
   EXPECT_EQ(_application.outputs()[0].length, 3u);
-}
-
-TEST_F(OutputTest, CutsALengthThatABufferDoesNotHold) {
-  start();
-  Packet longer("longer than it is");
-  longer.lengthToTell = 65537;
-  script().produce(longer);
-  Packet endless("endless");
-  endless.lengthToTell = 0xffffffff;
-  script().produce(endless);
-  _application.waitForOutputs(2);
-  for (const Output& output : _application.outputs()) EXPECT_EQ(output.length, 65536u);
+  EXPECT_EQ(_application.outputs()[2].length, 65536u);
   EXPECT_EQ(log(), (LogLines{"E OMXINTERFACE - Output of 65537 bytes cut to the buffer's 65536",
                              "E OMXINTERFACE - Output of 4294967295 bytes cut to the buffer's 65536"}));
 }
@@ -76,7 +64,7 @@ TEST_F(OutputTest, CutsALengthThatABufferDoesNotHold) {
 TEST_F(OutputTest, RecordsAFailureWhenOutputIsLost) {
   // Lost in silence, the end of a stream would leave deInit() waiting for it.
   start();
-  const faults::FailedAllocation failed(sizeof(SimpleNode));
+  const faults::Fault failed(faults::Failing::NothrowNew, sizeof(SimpleNode));
   componentProduces("the end", 0, OMX_BUFFERFLAG_EOS);
   EXPECT_EQ(deInit(), OMXI_ERR_ALLOCATE_MEMORY);
   EXPECT_TRUE(failed.happened());
@@ -95,9 +83,8 @@ TEST_F(OutputTest, GivesOnlyTheIdWhenTheComponentHasAHeapOfItsOwn) {
 TEST_F(OutputTest, RecyclesEverythingWithoutAnOutputCallback) {
   start();
   _session->registerOutputCallback(nullptr, nullptr);
-  const size_t before = omx().count(Method::FillBuffer);
   for (size_t i = 0; i < 3 * kOutputs; ++i) componentProduces("nobody looks");
-  waitForFills(before + 3 * kOutputs);
+  waitForFills(4 * kOutputs);
   EXPECT_TRUE(_application.outputs().empty());
 }
 
@@ -108,34 +95,36 @@ TEST_F(OutputTest, LeavesABufferWithTheApplicationUntilItComesBack) {
   feedThrough("pass");
   waitForFills(kOutputs + 1);
   void* const kept = _application.outputs()[0].bufferId;
-  EXPECT_EQ(busyCount(kOmxOutputPort), kOutputs - 1);
+  EXPECT_EQ(busyCount(1), kOutputs - 1);
   for (void* id : {static_cast<void*>(nullptr), static_cast<void*>(this), bufferId(0, 0), bufferId(1, 1)}) {
     _session->returnIomxOutputBuffer(id);  // unknown, an input buffer, or one that is not ours
+    deliver(makeFillBufferDone(id == bufferId(1, 1) ? kept : id, 0xffffffff, OMX_BUFFERFLAG_EOS));  // forged
   }
-  EXPECT_EQ(omx().count(Method::FillBuffer), kOutputs + 1);
+  EXPECT_EQ(outputRecord(0)->rangeLength, 4u);
+  EXPECT_FALSE(outputRecord(0)->eos);
+  EXPECT_EQ(fills(), kOutputs + 1);
   _session->returnIomxOutputBuffer(kept);
   EXPECT_EQ(trace().back(), "fillBuffer out0");
-  EXPECT_EQ(busyCount(kOmxOutputPort), kOutputs);
+  EXPECT_EQ(busyCount(1), kOutputs);
   _session->returnIomxOutputBuffer(kept);  // the component has it by now
-  EXPECT_EQ(omx().count(Method::FillBuffer), kOutputs + 2);
+  EXPECT_EQ(fills(), kOutputs + 2);
+  feedThrough("more");
+  EXPECT_EQ(_application.outputTexts(), (Texts{"keep", "pass", "more"}));
+  EXPECT_FALSE(_session->_endOfOutputReached);
 }
 
 TEST_F(OutputTest, DoesNotGiveBackWhatStillWaitsForDelivery) {
   start();
-  Gate& gate = newGate();
-  _application.onOutput([&](const Output&) {
-    gate.pass();
-    return 0;
-  });
+  Gate& gate = stopInCallback();
   componentProduces("first");
   gate.waitForArrival();
   componentProduces("second");
-  waitForBusy(kOutputs - 2);
+  waitForBusy(1, kOutputs - 2);
   _session->returnIomxOutputBuffer(bufferId(1, 1));  // an application out of step; the picture stays
-  EXPECT_EQ(omx().count(Method::FillBuffer), kOutputs);
+  EXPECT_EQ(fills(), kOutputs);
   gate.open();
   _application.waitForOutputs(2);
-  EXPECT_EQ(_application.outputTexts(), (std::vector<std::string>{"first", "second"}));
+  EXPECT_EQ(_application.outputTexts(), (Texts{"first", "second"}));
 }
 
 TEST_F(OutputTest, DeliversAnEndedStreamsLastBufferAndStops) {
@@ -144,19 +133,18 @@ TEST_F(OutputTest, DeliversAnEndedStreamsLastBufferAndStops) {
       _log.clear();
       start(kind);
       _application.onOutput([&](const Output&) { return kept; });
-      const size_t fills = omx().count(Method::FillBuffer);
+      const size_t before = fills();
       const size_t delivered = _application.outputs().size();
       componentProduces("the end", 77, OMX_BUFFERFLAG_EOS | OMX_BUFFERFLAG_ENDOFFRAME);
       waitForOutputThreadToEnd();
-      EXPECT_EQ(_application.outputs().size(), delivered + 1);
-      EXPECT_EQ(_application.outputs().back().bytes, "the end");
       EXPECT_TRUE(_session->_endOfOutputReached);
       EXPECT_EQ(valueOf(_session->_semEndOfOutput), 1);
       EXPECT_EQ(log(), LogLines{kind == Kind::Encoder ? kEncoderOver : kDecoderOver});
-      EXPECT_EQ(omx().count(Method::FillBuffer), fills);  // it does not go back
-      componentProduces("nobody is there", 0);
+      EXPECT_EQ(fills(), before);  // it does not go back
+      componentProduces("nobody is there");
       requireEventually([this] { return valueOf(_session->_semOutputDataReady) > 0; }, "a filled buffer");
       EXPECT_EQ(_application.outputs().size(), delivered + 1);
+      EXPECT_EQ(_application.outputs().back().bytes, "the end");
       destroy();
     }
   }
@@ -166,37 +154,29 @@ TEST_F(OutputTest, DeliversNothingThatComesAfterTheEnd) {
   // A component on its way to Idle gives its empty buffers back; whether the application saw them would
   // depend on how long its callback takes.
   start();
-  Gate& gate = newGate();
-  _application.onOutput([&](const Output&) {
-    gate.pass();
-    return 0;
-  });
+  Gate& gate = stopInCallback();
   componentProduces("before");
   gate.waitForArrival();
   componentProduces("the end", 0, OMX_BUFFERFLAG_EOS);
-  waitForBusy(kOutputs - 2);
-  Gate& last = newGate();
-  _application.onOutput([&](const Output&) {
-    last.pass();
-    return 0;
-  });
+  waitForBusy(1, kOutputs - 2);
+  Gate& last = stopInCallback();
   gate.open();
   last.waitForArrival();
   componentProduces("after");
   require(messages().waitForDelivered(fillBufferDone(), 3), "the buffer behind the end");
   last.open();
   waitForOutputThreadToEnd();
-  EXPECT_EQ(_application.outputTexts(), (std::vector<std::string>{"before", "the end"}));
+  EXPECT_EQ(_application.outputTexts(), (Texts{"before", "the end"}));
 }
 
 TEST_F(OutputTest, StopsAfterThePassThatFindsAFailure) {
   start();
   _session->setThreadError(OMXI_ERR_APPLICATION);
-  EXPECT_TRUE(isOutputThreadRunning());  // the failure alone does not wake it
+  EXPECT_EQ(log(), LogLines{});  // the failure alone does not wake the thread
   componentProduces("last");
   waitForOutputThreadToEnd();
-  EXPECT_EQ(_application.outputTexts(), std::vector<std::string>{"last"});
-  EXPECT_EQ(omx().count(Method::FillBuffer), kOutputs + 1);  // that pass was a whole one
+  EXPECT_EQ(_application.outputTexts(), Texts{"last"});
+  EXPECT_EQ(fills(), kOutputs + 1);  // that pass was a whole one
   EXPECT_EQ(log(), LogLines{kEncoderOver});
 }
 
@@ -209,15 +189,16 @@ TEST_F(OutputTest, ParksBuffersOnceTheEndOfInputIsPending) {
   ASSERT_EQ(beginEndOfInput().result(), 0);
   script().passOutput();
   waitForOutputThreadToEnd();
-  EXPECT_EQ(_application.outputTexts(), (std::vector<std::string>{"before", "during", ""}));
-  EXPECT_EQ(omx().count(Method::FillBuffer), kOutputs + 1);
-  EXPECT_EQ(busyCount(kOmxOutputPort), kOutputs - 2);
+  EXPECT_EQ(_application.outputTexts(), (Texts{"before", "during", ""}));
+  EXPECT_EQ(fills(), kOutputs + 1);
+  EXPECT_EQ(busyCount(1), kOutputs - 2);
 }
 
 TEST_F(OutputTest, CallsNobodyByItself) {
   // The base form of the delivery, as the encoder uses it.
   construct();
   EXPECT_EQ(_session->callOutputCallbackFunction(this, 3, this, 4), 0);
+  EXPECT_EQ(_session->fillOutputBuffers(), OMXI_OK);  // there is nothing to fill
   _application.attach(*_session);
   _application.onOutput([](const Output&) { return 9; });
   char text[] = "abc";
@@ -229,6 +210,80 @@ TEST_F(OutputTest, CallsNobodyByItself) {
   EXPECT_EQ(output.timestamp, 4u);
   _session->onEvent(OMX_EventError, 1, 2);  // does nothing
   EXPECT_EQ(_session->threadError(), OMXI_OK);
+}
+
+TEST_F(OutputTest, FillsOnlyWhileTheComponentExecutes) {
+  start();
+  deliverEvent(OMX_EventCmdComplete, OMX_CommandStateSet, OMX_StatePause);
+  feedThrough("a");
+  feedThrough("b");  // the pass of "a" is over
+  EXPECT_EQ(fills(), kOutputs);
+  deliverEvent(OMX_EventCmdComplete, OMX_CommandStateSet, OMX_StateExecuting);
+  EXPECT_EQ(_session->fillOutputBuffers(), OMXI_OK);  // picks the parked ones up
+  EXPECT_EQ(busyCount(1), kOutputs);
+}
+
+TEST_F(OutputTest, FillsACleanRecordUnlessThePortIsReconfigured) {
+  start();
+  keepBuffers();
+  feedThrough("kept");
+  EXPECT_EQ(outputRecord(0)->outputData, outputRecord(0)->data);
+  outputRecord(0)->eos = true;
+  _session->_portReconfiguring = true;
+  EXPECT_EQ(_session->fillOutputBuffer(outputRecord(0)), OMXI_OK);
+  EXPECT_EQ(_session->fillOutputBuffers(), OMXI_OK);
+  _session->returnIomxOutputBuffer(bufferId(1, 0));
+  EXPECT_EQ(fills(), kOutputs);
+  EXPECT_FALSE(outputRecord(0)->busy);
+  _session->_portReconfiguring = false;
+  EXPECT_EQ(_session->fillOutputBuffer(outputRecord(0)), OMXI_OK);
+  EXPECT_EQ(fills(), kOutputs + 1);
+  EXPECT_EQ(outputRecord(0)->outputData, nullptr);
+  EXPECT_EQ(outputRecord(0)->rangeLength, 0u);
+  EXPECT_FALSE(outputRecord(0)->eos);
+  EXPECT_TRUE(outputRecord(0)->busy);
+}
+
+TEST_F(OutputTest, TakesABufferBackThatTheComponentRefuses) {
+  start();
+  omx().fail(Method::FillBuffer);
+  feedThrough("lost on its way back");
+  waitForFills(kOutputs + 1);
+  keepBuffers();
+  for (const char* text : {"b", "c"}) feedThrough(text);
+  EXPECT_EQ(_session->threadError(), OMXI_OK);
+  omx().fail(Method::FillBuffer);
+  EXPECT_EQ(_session->fillOutputBuffer(outputRecord(0)), OMXI_ERR_FILL_BUFFER);
+  EXPECT_FALSE(outputRecord(0)->busy);
+  const size_t before = omx().count();
+  omx().fail(Method::FillBuffer, 2);
+  EXPECT_EQ(_session->fillOutputBuffers(), OMXI_ERR_FILL_BUFFER);
+  EXPECT_EQ(trace(before), (Trace{"fillBuffer out0", "fillBuffer out1 failed"}));  // and no further
+  EXPECT_EQ(log(), LogLines(3, std::string("E OMXINTERFACE - fillBuffer failed w/ error ") + kRefusedHex));
+  EXPECT_FALSE(outputRecord(1)->busy);
+  EXPECT_EQ(_session->fillOutputBuffers(), OMXI_OK);
+  EXPECT_EQ(busyCount(1), kOutputs);
+  BufferInfo foreign;
+  for (BufferInfo* strange : {static_cast<BufferInfo*>(nullptr), &foreign, outputRecord(kOutputs - 1) + 1,
+                              &_session->_portBuffers[0].editItemAt(0)}) {
+    EXPECT_EQ(_session->fillOutputBuffer(strange), OMXI_ERR_FILL_BUFFER);
+    EXPECT_NE(log().back().find("is no output buffer of this session"), std::string::npos);
+  }
+}
+
+TEST_F(OutputTest, TellsWhoeverWaitsForTheOutputBuffers) {
+  for (const bool reconfiguring : {true, false}) {
+    start();
+    keepBuffers();
+    for (size_t i = 0; i + 1 < kOutputs; ++i) feedThrough("kept");
+    EXPECT_EQ(valueOf(_session->_semOutputBuffersReturned), 0);
+    (reconfiguring ? _session->_portReconfiguring : _session->_endOfOutputReached) = true;
+    deliver(makeFillBufferDone(this, 0));
+    EXPECT_EQ(valueOf(_session->_semOutputBuffersReturned), 0);  // one is still out
+    deliver(makeFillBufferDone(bufferId(1, kOutputs - 1), 1));
+    EXPECT_GE(valueOf(_session->_semOutputBuffersReturned), 1);
+    destroy();
+  }
 }
 
 }  // namespace

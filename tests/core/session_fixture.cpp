@@ -12,32 +12,27 @@ namespace omxtest {
 
 namespace {
 
+size_t countBusy(const android::Vector<BufferInfo>& records) {
+  return static_cast<size_t>(std::count_if(records.begin(), records.end(),
+                                           [](const BufferInfo& record) -> bool { return record.busy; }));
+}
+
 // The port definition's index, and what is wrong with its record if something is.
-std::string definitionText(const Call& call) {
+std::string parameterText(const Call& call) {
+  if (call.index != OMX_IndexParamPortDefinition)
+    return android::String8::format(" 0x%08x size %zu", static_cast<unsigned>(call.index), call.size)
+        .string();
   const auto record = call.as<OMX_PARAM_PORTDEFINITIONTYPE>();
-  if (!record || call.size != sizeof(*record)) return " a record that is too short";
+  if (!record || call.size != sizeof(*record)) return " a record of another size";
   std::string text = " definition of port " + std::to_string(record->nPortIndex);
   if (record->nSize != sizeof(*record)) text += " size word " + std::to_string(record->nSize);
   if (record->nVersion.nVersion != 0x0101) text += " version " + std::to_string(record->nVersion.nVersion);
   return text;
 }
 
-std::string parameterText(const Call& call) {
-  if (call.index == OMX_IndexParamPortDefinition) return definitionText(call);
-  return android::String8::format(" 0x%08x size %zu", static_cast<unsigned>(call.index), call.size).string();
-}
-
 std::string commandText(const Call& call) {
-  switch (call.command) {
-    case OMX_CommandStateSet:
-      return " state " + std::to_string(call.param);
-    case OMX_CommandPortDisable:
-      return " disable " + std::to_string(call.param);
-    case OMX_CommandPortEnable:
-      return " enable " + std::to_string(call.param);
-    default:
-      return " command " + std::to_string(call.command) + " " + std::to_string(call.param);
-  }
+  static constexpr const char* kNames[] = {" state ", " flush ", " disable ", " enable ", " mark "};
+  return kNames[call.command] + std::to_string(call.param);
 }
 
 }  // namespace
@@ -45,36 +40,76 @@ std::string commandText(const Call& call) {
 std::string describeState(OmxInterface& session) {
   SessionState& state = *session._state;
   const SessionState::Lock held(state.lock, std::try_to_lock);
-  std::string text = held.owns_lock() ? "" : "the session's lock is taken\n";
-  const auto busy = [&session](int port) {
-    size_t count = 0;
-    for (const BufferInfo& record : session._portBuffers[port]) count += record.busy ? size_t{1} : 0;
-    return count;
-  };
-  text += android::String8::format(
-              "state %d awaited %d reached %d error %d; input %zu of %zu busy, output %zu of %zu busy\n",
-              static_cast<int>(session._omxState), state.awaitedState, state.awaitedStateReached,
-              static_cast<int>(session._threadError), busy(0), session._portBuffers[0].size(), busy(1),
-              session._portBuffers[1].size())
-              .string();
-  text += android::String8::format(
-              "ending %d calls %d output thread %d event thread %d delivering %d uses %d %d; tearing down %d "
-              "reconfiguring %d step %d handling %d\n",
-              state.ending, state.calls, state.outputThread.running, state.eventThread.running,
-              state.delivering, state.ports[0].uses, state.ports[1].uses, state.tearingDown,
-              static_cast<bool>(session._portReconfiguring), state.reconfigurationStep, state.handlingEvent)
-              .string();
-  text += android::String8::format(
-              "waiting: %d state, %d end of output, %d output buffers, %d input buffer\n", state.stateWaiters,
-              state.endOfOutputWaiters, state.outputReturnWaiters, state.inputFreeWaiters)
-              .string();
-  return text;
+  const auto* const ports = session._portBuffers;
+  return android::String8::format(
+             "lock free %d; state %d awaited %d reached %d error %d; input %zu of %zu busy, output %zu of "
+             "%zu\n"
+             "ending %d calls %d output thread %d event thread %d delivering %d uses %d %d; tearing down %d "
+             "reconfiguring %d step %d handling %d\n"
+             "waiting: %d state, %d end of output, %d output buffers, %d input buffer\n",
+             held.owns_lock(), static_cast<int>(session._omxState), state.awaitedState,
+             state.awaitedStateReached, static_cast<int>(session._threadError), countBusy(ports[0]),
+             ports[0].size(), countBusy(ports[1]), ports[1].size(), state.ending, state.calls,
+             state.outputThread.running, state.eventThread.running, state.delivering, state.ports[0].uses,
+             state.ports[1].uses, state.tearingDown, static_cast<bool>(session._portReconfiguring),
+             state.reconfigurationStep, state.handlingEvent, state.stateWaiters, state.endOfOutputWaiters,
+             state.outputReturnWaiters, state.inputFreeWaiters)
+      .string();
+}
+
+Trace traceOf(RecordingOmx& omx, size_t from) {
+  Trace lines;
+  std::map<void*, std::string> names;
+  size_t made[2] = {0, 0};
+  for (const Call& call : omx.calls()) {
+    std::string line = name(call.method);
+    switch (call.method) {
+      case Method::AllocateNode:
+        line += " " + call.text;
+        made[0] = made[1] = 0;
+        break;
+      case Method::SendCommand:
+        line += commandText(call);
+        break;
+      case Method::GetParameter:
+      case Method::SetParameter:
+        line += parameterText(call);
+        break;
+      case Method::UseBuffer:
+      case Method::AllocateBuffer:
+      case Method::AllocateBufferWithBackup: {
+        std::string& place = names[call.buffer];
+        place = (call.port == 0 ? "in" : "out") + std::to_string(made[call.port]++);
+        line += " " + place + " of " + std::to_string(call.size);
+        break;
+      }
+      case Method::FreeBuffer:
+        line += " " + std::to_string(call.port) + " " + names[call.buffer];
+        break;
+      case Method::FillBuffer:
+        line += " " + names[call.buffer];
+        break;
+      case Method::EmptyBuffer:
+        line += " " + names[call.buffer] +
+                android::String8::format(" %u+%u flags 0x%x time %lld", call.offset, call.length, call.flags,
+                                         static_cast<long long>(call.timestamp))
+                    .string();
+        break;
+      default:
+        break;
+    }
+    if (call.status != android::OK) line += " failed";
+    lines.push_back(line);
+  }
+  lines.erase(lines.begin(), lines.begin() + static_cast<ptrdiff_t>(std::min(from, lines.size())));
+  return lines;
 }
 
 SessionTest::SessionTest(const char* device) : _server(device) {
   hangReport() = [this] {
-    fprintf(stderr, "%s", omx().describeCalls().c_str());
-    for (const std::string& line : log()) fprintf(stderr, "log: %s\n", line.c_str());
+    for (const Trace& lines : {trace(), log()}) {
+      for (const std::string& line : lines) fprintf(stderr, "%s\n", line.c_str());
+    }
     if (_session != nullptr) fprintf(stderr, "%s", describeState(*_session).c_str());
   };
 }
@@ -137,11 +172,8 @@ Later<bool> SessionTest::beginDestroyOfBusySession() {
         return state.ending;
       },
       "the beginning of the destruction");
+  EXPECT_FALSE(destroyed.isDone());
   return destroyed;
-}
-
-void SessionTest::destroy() {
-  beginDestroy().result();
 }
 
 int SessionTest::feed(const std::string& text, int timestamp) {
@@ -153,6 +185,11 @@ void SessionTest::feedThrough(const std::string& text, int timestamp) {
   const size_t before = _application.outputs().size();
   ASSERT_EQ(feed(text, timestamp), 0);
   _application.waitForOutputs(before + 1);
+}
+
+void SessionTest::holdInputAllBut(size_t left) {
+  script().holdInput();
+  for (size_t i = left; i < kInputs; ++i) ASSERT_EQ(feed("held"), 0);
 }
 
 void SessionTest::componentProduces(const std::string& text, OMX_TICKS timestamp, OMX_U32 flags) {
@@ -170,58 +207,7 @@ void SessionTest::deliver(const android::omx_message& message) {
 
 size_t SessionTest::busyCount(int port) const {
   const SessionState::Lock held(_session->_state->lock);
-  const auto& records = _session->_portBuffers[port];
-  return static_cast<size_t>(std::count_if(records.begin(), records.end(),
-                                           [](const BufferInfo& record) -> bool { return record.busy; }));
-}
-
-Trace SessionTest::trace(size_t from) {
-  Trace lines;
-  std::map<void*, std::string> names;
-  size_t made[2] = {0, 0};
-  for (const Call& call : _server.omx().calls()) {
-    std::string line = name(call.method);
-    switch (call.method) {
-      case Method::AllocateNode:
-        line += " " + call.text;
-        made[0] = made[1] = 0;
-        break;
-      case Method::SendCommand:
-        line += commandText(call);
-        break;
-      case Method::GetParameter:
-      case Method::SetParameter:
-        line += parameterText(call);
-        break;
-      case Method::UseBuffer:
-      case Method::AllocateBuffer:
-      case Method::AllocateBufferWithBackup: {
-        const size_t size = call.method == Method::AllocateBuffer ? call.size : call.blockSize;
-        std::string& place = names[call.buffer];
-        place = (call.port == 0 ? "in" : "out") + std::to_string(made[call.port]++);
-        line += " " + place + " of " + std::to_string(size);
-        break;
-      }
-      case Method::FreeBuffer:
-        line += " " + std::to_string(call.port) + " " + names[call.buffer];
-        break;
-      case Method::FillBuffer:
-        line += " " + names[call.buffer];
-        break;
-      case Method::EmptyBuffer:
-        line += " " + names[call.buffer] +
-                android::String8::format(" %u+%u flags 0x%x time %lld", call.offset, call.length, call.flags,
-                                         static_cast<long long>(call.timestamp))
-                    .string();
-        break;
-      default:
-        break;
-    }
-    if (call.status != android::OK) line += " failed";
-    lines.push_back(line);
-  }
-  lines.erase(lines.begin(), lines.begin() + static_cast<ptrdiff_t>(std::min(from, lines.size())));
-  return lines;
+  return countBusy(_session->_portBuffers[port]);
 }
 
 int SessionTest::valueOf(sem_t& semaphore) {
@@ -230,13 +216,21 @@ int SessionTest::valueOf(sem_t& semaphore) {
   return value;
 }
 
-void SessionTest::waitForSleeper(int SessionState::*waiters, int count) const {
-  requireEventually(
-      [&] {
-        const SessionState::Lock held(_session->_state->lock);
-        return _session->_state->*waiters == count;
-      },
-      "a thread that waits");
+void SessionTest::waitForSleeper(int SessionState::*waiters, int count) {
+  requireUnderLock([=](SessionState& state) { return state.*waiters == count; }, "a thread that waits");
+}
+
+void SessionTest::waitForBusy(int port, size_t count) {
+  requireEventually([&] { return busyCount(port) == count; }, "buffers to be where they should");
+}
+
+void SessionTest::waitForFills(size_t count) {
+  require(omx().waitForCalls(Method::FillBuffer, count), "a buffer given to the component");
+}
+
+void SessionTest::waitForOutputThreadToEnd() {
+  requireUnderLock([](SessionState& state) { return !state.outputThread.running; },
+                   "the end of the output thread");
 }
 
 }  // namespace omxtest

@@ -25,9 +25,14 @@ using Trace = std::vector<std::string>;
 inline constexpr auto kRefused = RecordingOmx::kFailed;
 inline constexpr const char* kRefusedHex = "0x80000000";
 inline constexpr const char* kRefusedText = "-2147483648";
+inline constexpr const char* kEncoderOver = "W OMXINTERFACE - ===DataOutputThread over! enc thread!\n";
+inline constexpr const char* kDecoderOver = "W OMXINTERFACE - ===DataOutputThread over! dec thread!\n";
 
 // What a session's threads are about, for a test that hangs. Reads what it can get at.
 std::string describeState(OmxInterface& session);
+
+// The calls as text, buffers by their place: "fillBuffer out0"; without the first `from` of them.
+Trace traceOf(RecordingOmx& omx, size_t from = 0);
 
 class SessionTest : public ::testing::Test {
  protected:
@@ -58,7 +63,7 @@ class SessionTest : public ::testing::Test {
   // The same for a session that cannot be gone before the test lets something in progress end: comes
   // back once destruction has begun.
   Later<bool> beginDestroyOfBusySession();
-  void destroy();
+  void destroy() { beginDestroy().result(); }
   // A gate that lives as long as the session, for hooks and callbacks.
   Gate& newGate() { return _gates.emplace_back(); }
 
@@ -67,12 +72,19 @@ class SessionTest : public ::testing::Test {
   int feed(const std::string& text, int timestamp = 0);
   // Feeds and waits for the output.
   void feedThrough(const std::string& text, int timestamp = 0);
+  // Keeps the component from returning input, and gives it all but `left` buffers.
+  void holdInputAllBut(size_t left);
   // The component makes an output of its own accord.
   void componentProduces(const std::string& text, OMX_TICKS timestamp = 0, OMX_U32 flags = 0);
   // A message of the test's making reaches the session, and has been dealt with.
   void deliver(const android::omx_message& message);
   void deliverEvent(OMX_EVENTTYPE event, OMX_U32 data1, OMX_U32 data2) {
     deliver(makeEvent(event, data1, data2));
+  }
+  // Messages pass again, those that were held too.
+  void letMessagesCome() {
+    messages().passAll();
+    messages().releaseAll();
   }
 
   // --- Asking ---
@@ -81,13 +93,26 @@ class SessionTest : public ::testing::Test {
   RecordingOmx& omx() { return _server.omx(); }
   MessageTap& messages() { return _server.messages(); }
   void* bufferId(int port, size_t index) const { return _session->_portBuffers[port][index].bufferId; }
+  BufferInfo* outputRecord(size_t index) { return &_session->_portBuffers[1].editItemAt(index); }
   size_t busyCount(int port) const;
-  // The calls as text, buffers by their place: "fillBuffer out0"; without the first `from` of them.
-  Trace trace(size_t from = 0);
+  Trace trace(size_t from = 0) { return traceOf(omx(), from); }
   static int valueOf(sem_t& semaphore);
   LogLines log() const { return logLines(_log); }
-  // Waits until that many threads sleep in the session's wait for ...
-  void waitForSleeper(int SessionState::*waiters, int count = 1) const;
+  // Wait until the condition holds, which is tested with the session's lock held.
+  template <typename Condition>
+  void requireUnderLock(Condition condition, const char* what) {
+    requireEventually(
+        [&, &state = *_session->_state] {
+          const SessionState::Lock held(state.lock);
+          return condition(state);
+        },
+        what);
+  }
+  // ... that many threads sleep in the session's wait for ...
+  void waitForSleeper(int SessionState::*waiters, int count = 1);
+  void waitForBusy(int port, size_t count);
+  void waitForFills(size_t count);
+  void waitForOutputThreadToEnd();
 
   std::deque<Gate> _gates;
   omxhost::LogCapture _log;

@@ -10,7 +10,6 @@
 
 #include <algorithm>
 #include <atomic>
-#include <condition_variable>
 #include <map>
 #include <random>
 #include <set>
@@ -22,17 +21,22 @@
 namespace omxtest::stress {
 namespace {
 
-using Random = std::mt19937;
+// Any thread.
+class Random {
+ public:
+  explicit Random(unsigned seed) : _engine(seed) {}
+  // One of 0 to `count` - 1.
+  unsigned draw(size_t count) {
+    const std::lock_guard<std::mutex> lock(_mutex);
+    return static_cast<unsigned>(_engine() % count);
+  }
+  // True in `percent` of the cases.
+  bool chance(unsigned percent) { return draw(100) < percent; }
 
-// One of 0 to `count` - 1.
-unsigned draw(Random& random, size_t count) {
-  return static_cast<unsigned>(random() % count);
-}
-
-// True in `percent` of the cases.
-bool chance(Random& random, unsigned percent) {
-  return draw(random, 100) < percent;
-}
+ private:
+  std::mutex _mutex;
+  std::mt19937 _engine;
+};
 
 unsigned setting(const char* name, unsigned otherwise) {
   const char* const text = getenv(name);
@@ -44,7 +48,9 @@ class Mischief {
  public:
   Mischief(ScriptedMediaServer& server, unsigned seed) : _server(server), _random(seed) {
     server.messages().setFilter([this](const android::omx_message& message) { return fate(message); });
-    server.omx().failWhere([this](const Call& call) { return failsCall(call); });
+    server.omx().failWhere([this](const Call& call) {
+      return call.method != Method::FreeNode && isVictim(call.node) && _random.chance(2);
+    });
     _thread = std::thread([this] { run(); });
   }
   ~Mischief() {
@@ -66,93 +72,79 @@ class Mischief {
   }
 
  private:
+  bool isVictim(void* node) {
+    const std::lock_guard<std::mutex> lock(_mutex);
+    return _victims.contains(node);
+  }
+
   Fate fate(const android::omx_message& message) {
     const std::lock_guard<std::mutex> lock(_mutex);
     const bool victim = _victims.contains(message.node);
     // Late messages of an honest component still come in their order: one holds up those behind it.
     size_t& held = _held[message.node];
-    if (chance(_random, 10) || (!victim && held > 0)) {
+    if (_random.chance(10) || (!victim && held > 0)) {
       ++held;
       return Fate::Hold;
     }
-    return victim && chance(_random, 10) ? Fate::Repeat : Fate::Pass;
+    return victim && _random.chance(10) ? Fate::Repeat : Fate::Pass;
   }
 
   // Lets one of the held messages go, some of them after their session.
   void releaseOne() {
     const std::vector<android::omx_message> held = _server.messages().held();
     if (held.empty()) return;
-    size_t position = 0;
-    {
-      const std::lock_guard<std::mutex> lock(_mutex);
-      position = stress::draw(_random, held.size());
-      if (!_victims.contains(held[position].node)) {
-        const auto oldest = std::find_if(held.begin(), held.end(), [&](const android::omx_message& message) {
-          return message.node == held[position].node;
-        });
-        position = static_cast<size_t>(oldest - held.begin());
-      }
+    size_t position = _random.draw(held.size());
+    void* const node = held[position].node;
+    for (size_t older = 0; older < position && !isVictim(node); ++older) {
+      if (held[older].node == node) position = older;
     }
     _server.messages().release(position);
     const std::lock_guard<std::mutex> lock(_mutex);
-    --_held[held[position].node];
-  }
-
-  bool failsCall(const Call& call) {
-    const std::lock_guard<std::mutex> lock(_mutex);
-    return call.method != Method::FreeNode && _victims.contains(call.node) && chance(_random, 2);
+    --_held[node];
   }
 
   void run() {
     MessageTap& messages = _server.messages();
     for (unsigned round = 1; !_over; ++round) {
       if (messages.waitForHeld(1, std::chrono::milliseconds(1))) releaseOne();
-      if (const auto [node, message] = forgery(); node != nullptr) messages.forge(node, message);
+      if (_random.chance(30)) forge();
       if (round % 128 == 0) messages.forgetFreedNodes();  // each may have a thread for its late messages
     }
   }
 
-  std::pair<void*, android::omx_message> forgery() {
-    const std::lock_guard<std::mutex> lock(_mutex);
-    if (_victims.empty() || !chance(_random, 30)) return {nullptr, {}};
-    auto victim = _victims.begin();
-    std::advance(victim, stress::draw(_random, _victims.size()));
-    const auto& [node, buffers] = *victim;
-    void* const buffer =
-        buffers.empty() || chance(_random, 10) ? this : buffers[stress::draw(_random, buffers.size())];
-    const OMX_U32 few = stress::draw(_random, 5);
-    switch (stress::draw(_random, 10)) {
-      case 0:
-        return {node, makeEvent(static_cast<OMX_EVENTTYPE>(stress::draw(_random, 8)), few, few)};
-      case 1:
-        return {node, makeEvent(OMX_EventCmdComplete, OMX_CommandStateSet, few)};
-      case 2:
-        return {node, makeEvent(OMX_EventCmdComplete, stress::draw(_random, 5), few)};
-      case 3:
-        return {node, makeEvent(OMX_EventPortSettingsChanged, 1, 0)};
-      case 4:
-      case 5:
-      case 6:
-        return {node, makeEmptyBufferDone(buffer)};
-      default:
-        return {node, makeFillBufferDone(buffer, few, chance(_random, 10) ? OMX_BUFFERFLAG_EOS : 0)};
+  void forge() {
+    void* node = nullptr;
+    void* buffer = this;
+    {
+      const std::lock_guard<std::mutex> lock(_mutex);
+      if (_victims.empty()) return;
+      const auto victim = std::next(_victims.begin(), _random.draw(_victims.size()));
+      node = victim->first;
+      const auto& buffers = victim->second;
+      if (!buffers.empty() && _random.chance(90)) buffer = buffers[_random.draw(buffers.size())];
     }
+    const OMX_U32 few = _random.draw(5);
+    const auto event = static_cast<OMX_EVENTTYPE>(_random.draw(8));
+    const android::omx_message messages[] = {
+        makeEvent(event, few, few),
+        makeEvent(OMX_EventCmdComplete, OMX_CommandStateSet, few),
+        makeEvent(OMX_EventCmdComplete, _random.draw(5), few),
+        makeEvent(OMX_EventPortSettingsChanged, 1, 0),
+        makeEmptyBufferDone(buffer),
+        makeEmptyBufferDone(buffer),
+        makeFillBufferDone(buffer, few, _random.chance(10) ? OMX_BUFFERFLAG_EOS : 0),
+        makeFillBufferDone(buffer, few)};
+    _server.messages().forge(node, messages[_random.draw(std::size(messages))]);
   }
 
   ScriptedMediaServer& _server;
-  std::mutex _mutex;  // guards the three below
   Random _random;
+  std::mutex _mutex;  // guards the two below
   std::map<void*, std::vector<void*>> _victims;
   std::map<void*, size_t> _held;  // by node
   std::atomic<bool> _over{false};
   std::thread _thread;
 };
-
-// How a session's life goes on after its traffic.
-enum class Ending { EndOfStream, Failure, DestroyedAtOnce, DestroyedInDeInit, DestroyedInEndOfInput };
-constexpr Ending kEndings[] = {
-    Ending::EndOfStream,     Ending::EndOfStream,       Ending::EndOfStream,          Ending::Failure,
-    Ending::DestroyedAtOnce, Ending::DestroyedInDeInit, Ending::DestroyedInEndOfInput};
 
 // One session after the other, of one kind, on a thread of its own.
 class Lane {
@@ -170,16 +162,10 @@ class Lane {
     if (OmxInterface* const session = _shown) text += describeState(*session);
     return text;
   }
-  unsigned steps() const { return _steps; }
   size_t pictures() const { return _pictures; }
   unsigned streamsEnded() const { return _streamsEnded; }
 
  private:
-  void phase(const char* name) {
-    _phase = name;
-    ++_steps;
-  }
-
   void live(unsigned number) {
     _number = number;
     _honest = number % 2 == 0;
@@ -191,26 +177,25 @@ class Lane {
     _application->onOutput([this](const Output& output) { return take(output); });
     if (!_honest) _application->onInput([this] { useSessionInCallback(); });
     connect();
-    if (!_honest && chance(_random, 50)) pester();
-    phase("starting");
+    if (_random.chance(50)) pester();
+    _phase = "starting";
     Later<int> starting("init()", [session = _session] { return session->init(); });
     awaitBegun(starting, [](const SessionState& state) {
       return state.outputThread.joinable || state.eventThread.joinable;
     });
-    if (_honest && chance(_random, 90)) {
+    if (_honest && _random.chance(90)) {
       EXPECT_EQ(starting.result(), OMXI_OK) << where();
+      return goOn();
+    }
+    // A pestered session may never get there.
+    pester();
+    if (eventually([&] { return starting.isDone(); }, std::chrono::milliseconds(_random.draw(20)))) {
       goOn();
     } else {
-      // A pestered session may never get there.
-      pester();
-      if (eventually([&] { return starting.isDone(); }, std::chrono::milliseconds(draw(_random, 20)))) {
-        goOn();
-      } else {
-        destroy();
-      }
-      phase("collecting the init() of a destroyed session");
-      starting.result();
+      destroy();
     }
+    _phase = "collecting the init() of a destroyed session";
+    starting.result();
   }
 
   void goOn() {
@@ -232,7 +217,7 @@ class Lane {
   }
 
   void connect() {
-    phase("connecting");
+    _phase = "connecting";
     if (_encoding) {
       _session = new OmxInterface;
       _session->_isEncoder = true;
@@ -261,10 +246,10 @@ class Lane {
 
   Script& script() { return _encoding ? _server.encoder() : _server.decoder(); }
 
-  // Applications feed from their callbacks, and record failures there. One in eight does: nobody is fed
+  // Applications feed from their callbacks, and give buffers back there. One in eight does: nobody is fed
   // for ever.
   void useSessionInCallback() {
-    const unsigned draw = _draws++ % 16;
+    const unsigned draw = _random.draw(16);
     if (draw == 0) static_cast<void>(_session->sendInputData(nullptr, 0, 0));
     if (draw == 8) _session->returnIomxOutputBuffer(this);
   }
@@ -272,7 +257,7 @@ class Lane {
   int take(const Output& output) {
     if (!_honest) useSessionInCallback();
     // A decoder lets nobody keep a buffer; who gives one back all the same is out of step.
-    if (output.bufferId == nullptr || _draws++ % 4 != 0 || (_honest && !_encoding)) return 0;
+    if (output.bufferId == nullptr || _random.chance(75) || (_honest && !_encoding)) return 0;
     const std::lock_guard<std::mutex> lock(_mutex);
     _kept.push_back(output.bufferId);
     return 1;
@@ -288,66 +273,61 @@ class Lane {
   }
 
   void traffic() {
-    phase("feeding");
+    _phase = "feeding";
     std::vector<std::thread> feeders;
-    const unsigned count = 1 + draw(_random, 3);
-    for (unsigned feeder = 0; feeder < count; ++feeder) {
-      feeders.emplace_back([this, feeder, seed = static_cast<unsigned>(_random())] { feed(feeder, seed); });
+    for (unsigned feeder = 0; feeder <= _random.draw(3); ++feeder) {
+      feeders.emplace_back([this, feeder] { feed(feeder); });
     }
-    if (!_encoding && chance(_random, 40)) {
-      script().announce(16 * (1 + draw(_random, 40)), 144);
-    }
-    if (!_honest && chance(_random, 10)) script().raiseError(OMX_ErrorHardware);
+    if (!_encoding && _random.chance(40)) script().announce(16 * (1 + _random.draw(40)), 144);
+    if (!_honest && _random.chance(10)) script().raiseError(OMX_ErrorHardware);
     for (std::thread& feeder : feeders) feeder.join();
   }
 
-  void feed(unsigned feeder, unsigned seed) {
-    Random random(seed);
-    const unsigned inputs = draw(random, 12);
+  void feed(unsigned feeder) {
+    const unsigned inputs = _random.draw(12);
     for (unsigned input = 0; input < inputs; ++input) {
       std::string text = std::to_string(_number) + "." + std::to_string(feeder) + "." + std::to_string(input);
       if (!_honest) text.clear();
-      const auto length = static_cast<unsigned int>(text.size());
       int result = -1;
-      if (chance(random, 50)) {
-        result = _session->sendInputData(text.data(), length, 0);
-      } else {
-        void* handle = nullptr;
-        void* data = nullptr;
-        result = _session->reserveInputBuffer(&handle, &data);
-        if (result == 0 && chance(random, 10)) {
-          _session->releaseInputBuffer(handle);
-          continue;
-        }
-        if (result == 0) {
-          if (length > 0) memcpy(data, text.data(), length);
-          result = _session->sendInputBuffer(handle, static_cast<int>(length), 0);
-        }
-      }
-      giveKeptBack();
-      if (_honest && result == -1) {
-        --input;  // no buffer was free
-        std::this_thread::yield();
-        continue;
-      }
+      do {  // until a buffer is free
+        result = send(text);
+        giveKeptBack();
+      } while (_honest && result == -1);
       EXPECT_TRUE(!_honest || result == 0) << result << " " << where();
-      if (!_honest && chance(random, 2)) _session->setThreadError(OMXI_ERR_APPLICATION);
+      if (!_honest && _random.chance(2)) _session->setThreadError(OMXI_ERR_APPLICATION);
       const std::lock_guard<std::mutex> lock(_mutex);
       if (_honest) _fed.insert(text);
     }
   }
 
+  int send(std::string& text) {
+    const auto length = static_cast<unsigned int>(text.size());
+    if (_random.chance(50)) return _session->sendInputData(text.data(), length, 0);
+    void* handle = nullptr;
+    void* data = nullptr;
+    const int result = _session->reserveInputBuffer(&handle, &data);
+    if (result != 0) return result;
+    if (_random.chance(10)) {
+      _session->releaseInputBuffer(handle);
+      return -1;
+    }
+    if (length > 0) memcpy(data, text.data(), length);
+    return _session->sendInputBuffer(handle, static_cast<int>(length), 0);
+  }
+
   void end() {
-    switch (kEndings[draw(_random, std::size(kEndings))]) {
-      case Ending::EndOfStream:
+    switch (_random.draw(7)) {
+      case 0:
+      case 1:
+      case 2:
         return endStream();
-      case Ending::Failure:
+      case 3:
         return fail();
-      case Ending::DestroyedInDeInit:
+      case 4:
         return destroyDuring(
             "deInit()", [session = _session] { return session->deInit(); },
             [](const SessionState& state) { return state.endOfOutputWaiters > 0 || state.tearingDown; });
-      case Ending::DestroyedInEndOfInput:
+      case 5:
         script().holdInput();
         destroyDuring(
             "sendEndOfInputFlag()", [session = _session] { return session->sendEndOfInputFlag(0); },
@@ -361,7 +341,7 @@ class Lane {
   // The application's proper way out: everything comes back, and then the end.
   void endStream() {
     if (!_honest || _session->_omxState != OMX_StateExecuting) return destroy();
-    phase("waiting for the pictures in flight");
+    _phase = "waiting for the pictures in flight";
     requireEventually(
         [this] {
           giveKeptBack();
@@ -369,10 +349,9 @@ class Lane {
         },
         "the pictures in flight");
     giveKeptBack();
-    phase("ending the stream");
-    EXPECT_EQ(_session->sendEndOfInputFlag(0), 0) << where();
-    phase("deInit");
-    EXPECT_EQ(_session->deInit(), OMXI_OK) << where();
+    _phase = "ending the stream";
+    EXPECT_EQ(await("sendEndOfInputFlag()", [this] { return _session->sendEndOfInputFlag(0); }), 0);
+    EXPECT_EQ(await("deInit()", [this] { return _session->deInit(); }), OMXI_OK) << where();
     std::multiset<std::string> delivered;
     for (const std::string& text : _application->outputTexts()) {
       if (!text.empty()) delivered.insert(text);
@@ -382,36 +361,35 @@ class Lane {
     destroy();
   }
 
+  static int await(const char* what, std::function<int()> call) {
+    return Later<int>(what, std::move(call)).result();
+  }
+
   void fail() {
     if (!_honest || _session->_omxState != OMX_StateExecuting) return destroy();
-    phase("failing");
+    _phase = "failing";
     _session->setThreadError(OMXI_ERR_APPLICATION);
-    EXPECT_EQ(_session->deInit(), OMXI_ERR_APPLICATION) << where();
+    EXPECT_EQ(await("deInit()", [this] { return _session->deInit(); }), OMXI_ERR_APPLICATION) << where();
     destroy();
   }
 
   template <typename Begun>
   void destroyDuring(const char* what, std::function<int()> call, Begun begun) {
-    phase(what);
+    _phase = what;
     Later<int> later(what, std::move(call));
     awaitBegun(later, begun);
     destroy();
-    phase("collecting the call of a destroyed session");
     later.result();
   }
 
   void destroy() {
-    phase("destroying");
-    if (chance(_random, 30)) _mischief.leaveAlone(_node);  // else to the last moment
+    _phase = "destroying";
+    if (_random.chance(30)) _mischief.leaveAlone(_node);  // else to the last moment
     _shown = nullptr;
-    if (chance(_random, 50)) {
-      Later<bool>("destruction", [session = _session] {
-        delete session;
-        return true;
-      }).result();
-    } else {
-      delete _session;
-    }
+    Later<bool>("destruction", [session = _session] {
+      delete session;
+      return true;
+    }).result();
     _mischief.leaveAlone(_node);
     _pictures += _application->outputs().size();
   }
@@ -427,14 +405,12 @@ class Lane {
   std::mutex _mutex;  // guards the two below
   std::vector<void*> _kept;
   std::multiset<std::string> _fed;
-  std::atomic<unsigned> _draws{0};
 
   size_t _pictures = 0;
   unsigned _streamsEnded = 0;
 
-  // For the watchdog.
+  // For the report of a hang.
   std::atomic<unsigned> _number{0};
-  std::atomic<unsigned> _steps{0};
   std::atomic<bool> _honest{true};
   std::atomic<const char*> _phase{"beginning"};
   std::atomic<OmxInterface*> _shown{nullptr};
@@ -445,39 +421,18 @@ TEST(StressTest, SessionsStandEveryOrderOfEvents) {
   const unsigned sessions = setting("OMXBRIDGE_STRESS_SESSIONS", 1000);
   printf("OMXBRIDGE_STRESS_SEED=%u\n", seed);
   fflush(stdout);
-  RecordProperty("seed", std::to_string(seed));
   const omxhost::LogCapture log;  // thousands of lines that nobody reads
   ScriptedMediaServer server("msm8960");
   {
     Mischief mischief(server, seed);
     Lane encoders(server, mischief, true, seed + 1);
     Lane decoders(server, mischief, false, seed + 2);
-    const auto report = [&] {
+    hangReport() = [&] {
       fprintf(stderr, "seed %u\n%s%s", seed, encoders.where().c_str(), decoders.where().c_str());
     };
-    hangReport() = report;
-
-    std::mutex mutex;
-    std::condition_variable ended;
-    bool over = false;
-    std::thread watchdog([&] {
-      std::unique_lock<std::mutex> lock(mutex);
-      unsigned seen = 0;
-      do {
-        const unsigned steps = encoders.steps() + decoders.steps();
-        if (seen > 0 && steps == seen) endHungTest("the next step of a session");
-        seen = steps;
-      } while (!ended.wait_for(lock, kWaitLimit, [&] { return over; }));
-    });
     std::thread encoderThread([&] { encoders.run(sessions / 2); });
     decoders.run(sessions / 2);
     encoderThread.join();
-    {
-      const std::lock_guard<std::mutex> lock(mutex);
-      over = true;
-    }
-    ended.notify_all();
-    watchdog.join();
     hangReport() = nullptr;
     // Else it was no stress.
     for (const Lane* lane : {&encoders, &decoders}) {
@@ -486,8 +441,7 @@ TEST(StressTest, SessionsStandEveryOrderOfEvents) {
       EXPECT_GT(lane->streamsEnded(), sessions / 20);
     }
   }
-  EXPECT_EQ(server.omx().outstandingNodes(), 0u);
-  EXPECT_EQ(server.omx().outstandingBuffers(), 0u);
+  EXPECT_EQ(server.leaks(), "");
 }
 
 }  // namespace

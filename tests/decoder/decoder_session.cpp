@@ -1,14 +1,6 @@
 #include "tests/decoder/decoder_session.h"
 
-#include <string.h>
-
 namespace omxtest {
-
-Words words(const std::vector<uint8_t>& bytes) {
-  Words result(bytes.size() / sizeof(OMX_U32));
-  if (!result.empty()) memcpy(result.data(), bytes.data(), result.size() * sizeof(OMX_U32));
-  return result;
-}
 
 // Here already: the session's threads deliver into what is gone in the base's destructor.
 DecoderSessionTest::~DecoderSessionTest() {
@@ -45,6 +37,15 @@ void DecoderSessionTest::finishStream(int timestamp) {
   waitForEvents();
 }
 
+void DecoderSessionTest::endOfOutput() {
+  componentProduces("", 0, OMX_BUFFERFLAG_EOS);
+  requireEventually([this]() -> bool { return _session->_endOfOutputReached; }, "the end of output");
+}
+
+void DecoderSessionTest::waitForEndOfEventThread() {
+  requireUnderLock([](SessionState& state) { return !state.eventThread.running; }, "the event thread's end");
+}
+
 void DecoderSessionTest::handleEvent(OMX_EVENTTYPE event, OMX_U32 data1, OMX_U32 data2) {
   deliverEvent(event, data1, data2);
   waitForEvents();
@@ -69,10 +70,6 @@ void DecoderSessionTest::feedThrough(const std::string& text, int timestamp) {
   waitForPictures(before + 1);
 }
 
-void DecoderSessionTest::waitForFills(size_t count) {
-  require(omx().waitForCalls(Method::FillBuffer, count), "a buffer given to the component");
-}
-
 void DecoderSessionTest::waitForPictures(size_t count) {
   requireEventually([&] { return pictures().size() >= count; }, "a picture");
 }
@@ -85,10 +82,6 @@ std::vector<Picture> DecoderSessionTest::pictures() const {
 void DecoderSessionTest::answerOutputs(int result) {
   const std::lock_guard<std::mutex> lock(_pictureMutex);
   _answer = result;
-}
-
-LogLines DecoderSessionTest::sortedLog() const {
-  return sorted(log());
 }
 
 LogLines DecoderSessionTest::sorted(LogLines lines) {

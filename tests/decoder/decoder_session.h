@@ -13,14 +13,8 @@
 
 namespace omxtest {
 
-inline constexpr const char* kDecoderOver = "W OMXINTERFACE - ===DataOutputThread over! dec thread!\n";
-
 // How a decoder takes the event that comes with the end of output.
 inline constexpr const char* kEndEvent = "E Unknown Event (4, 1, 1)";
-
-// Words of a record.
-using Words = std::vector<OMX_U32>;
-Words words(const std::vector<uint8_t>& bytes);
 
 // A picture as the application got it; the description is of the time of the callback.
 struct Picture {
@@ -32,7 +26,6 @@ class DecoderSessionTest : public SessionTest {
  protected:
   static constexpr size_t kInputBuffers = 4;  // of the scripted decoder
   static constexpr size_t kOutputBuffers = 8;
-  static constexpr OMX_U32 kPictureBytes = 176 * 144 * 3 / 2;
 
   explicit DecoderSessionTest(const char* device = "msm8960") : SessionTest(device) { _kind = Kind::Decoder; }
   ~DecoderSessionTest() override;
@@ -44,22 +37,22 @@ class DecoderSessionTest : public SessionTest {
 
   // endOfStream(), until its event has been handled too.
   void finishStream(int timestamp = 0);
+  // The end of a stream comes out of a component that goes on executing.
+  void endOfOutput();
 
   // Sends an event of the test's making, and waits until the event thread has handled it.
   void handleEvent(OMX_EVENTTYPE event, OMX_U32 data1, OMX_U32 data2);
   // Until the event thread has nothing to do, or has ended.
   void waitForEvents();
-  // Until `count` fillBuffer calls have returned since the test began.
+  void waitForEndOfEventThread();
   // Also waits until the picture is among pictures(): the application counts an output before it handles it.
   void feedThrough(const std::string& text, int timestamp = 0);
-  void waitForFills(size_t count);
-  // Until that many pictures have been delivered.
   void waitForPictures(size_t count);
   std::vector<Picture> pictures() const;
   // What the application's output callback answers.
   void answerOutputs(int result);
   // The log without regard to its order: lines of different threads.
-  LogLines sortedLog() const;
+  LogLines sortedLog() const { return sorted(log()); }
   static LogLines sorted(LogLines lines);
 
  private:

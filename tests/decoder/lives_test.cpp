@@ -1,72 +1,76 @@
-// Whole lives of decoders, call by call, on every hardware generation; and a life that ends too early.
+// Decoders on every hardware generation: their whole life call by call, and what they can do without.
 #include "platform/hardware_version.h"
 #include "tests/decoder/decoder_session.h"
+#include "tests/encoder/encoder_rig.h"
 
 namespace omxtest {
 namespace {
 
+const Trace kPictureOrder{"setParameter 0x7f000010 size 16"};
+const Trace kTiSettings{"getParameter 0x06000001 size 28",   "getParameter 0x06000001 size 28",
+                        "setParameter 0x06000001 size 28",   "getParameter definition of port 0",
+                        "setParameter definition of port 0", "getParameter definition of port 1",
+                        "setParameter definition of port 1"};
+const LogLines kOrderRefused{std::string("E OMXINTERFACE: Set Decode Order Failed: ") + kRefusedText};
+constexpr const char* kQcomDecoder = "OMX.qcom.video.decoder.avc";
+constexpr const char* kTiDecoder = "OMX.TI.DUCATI1.VIDEO.DECODER==";
+constexpr const char* kTiLine = "E g_hwVersion::OMAP4\n";
+
 struct Life {
   const char* device;
   int version;
-  const char* component;
-  Trace settings;           // made at creation
-  const char* inputBuffer;  // how buffers are made
-  Trace delivery;           // what a picture takes
+  Trace settings;     // made at creation
+  LogLines refusals;  // when all of these are refused
 };
 
-std::ostream& operator<<(std::ostream& stream, const Life& life) {
-  return stream << life.device;
+void PrintTo(const Life& life, std::ostream* stream) {
+  *stream << life.device;
 }
-
-constexpr const char* kQcomDecoder = "OMX.qcom.video.decoder.avc";
-const std::string kDefinition = " definition of port ";
-const Trace kPictureOrder{"setParameter 0x7f000010 size 16"};
-const Trace kQuery{"getParameter" + kDefinition + "1"};
 
 class LifeTest : public DecoderSessionTest, public ::testing::WithParamInterface<Life> {
  protected:
   static constexpr size_t kPictures = 3;
-  static constexpr OMX_U32 kOutputBytes = 65536;  // a tiled picture fits
 
   LifeTest() : DecoderSessionTest(GetParam().device) {
-    script().editPort(1, [](mediaserver::PortDefinition& port) { port.nBufferSize = kOutputBytes; });
+    // A tiled picture fits.
+    script().editPort(1, [](mediaserver::PortDefinition& port) { port.nBufferSize = 65536; });
   }
+
+  static bool isTi() { return GetParam().version == HW_VERSION_OMAP4; }
 
   // One access unit in, its picture out, and everything back where it was.
   void decodeOne(int timestamp) {
     const size_t fills = omx().count(Method::FillBuffer);
     ASSERT_EQ(feed("access unit", timestamp), 0);
     waitForFills(fills + 1);
-    requireEventually([this] { return busyCount(kOmxInputPort) == 0; }, "the input buffer's return");
+    waitForBusy(0, 0);
   }
 
-  static void append(Trace* calls, const Trace& more) {
-    calls->insert(calls->end(), more.begin(), more.end());
-  }
-
-  Trace wholeLife() const {
-    const Life& life = GetParam();
-    Trace calls{"listNodes", std::string("allocateNode ") + life.component};
-    append(&calls, life.settings);
-    append(&calls,
-           {"getParameter definition of port 0 size word 0", "setParameter definition of port 0 size word 0",
-            "getParameter" + kDefinition + "0", "setParameter" + kDefinition + "0"});
-    append(&calls, {"sendCommand state 2", "getParameter" + kDefinition + "0"});
+  static Trace wholeLife() {
+    const std::string definition = " definition of port ";
+    Trace calls{"listNodes", std::string("allocateNode ") + (isTi() ? kTiDecoder : kQcomDecoder)};
+    const auto append = [&calls](const Trace& more) { calls.insert(calls.end(), more.begin(), more.end()); };
+    append(GetParam().settings);
+    append({"getParameter definition of port 0 size word 0", "setParameter definition of port 0 size word 0",
+            "getParameter" + definition + "0", "setParameter" + definition + "0", "sendCommand state 2",
+            "getParameter" + definition + "0"});
     for (size_t i = 0; i < kInputBuffers; ++i) {
-      calls.push_back(std::string(life.inputBuffer) + " in" + std::to_string(i) + " of 65536");
+      calls.push_back((isTi() ? "allocateBufferWithBackup in" : "useBuffer in") + std::to_string(i) +
+                      " of 65536");
     }
-    calls.push_back("getParameter" + kDefinition + "1");
+    calls.push_back("getParameter" + definition + "1");
     for (size_t i = 0; i < kOutputBuffers; ++i) {
       calls.push_back("allocateBufferWithBackup out" + std::to_string(i) + " of 65536");
     }
     calls.emplace_back("sendCommand state 3");
     for (size_t i = 0; i < kOutputBuffers; ++i) calls.push_back("fillBuffer out" + std::to_string(i));
     for (size_t i = 0; i < kPictures; ++i) {
-      calls.push_back("emptyBuffer in0 0+11 flags 0x0 time " + std::to_string(100 + i));
-      append(&calls, life.delivery);
+      append({"emptyBuffer in0 0+11 flags 0x0 time " + std::to_string(100 + i),
+              "getParameter" + definition + "1"});
+      if (isTi()) calls.emplace_back("getConfig");
       calls.push_back("fillBuffer out" + std::to_string(i));
     }
-    append(&calls, {"emptyBuffer in0 0+0 flags 0x1 time 200", "sendCommand state 2", "sendCommand state 1"});
+    append({"emptyBuffer in0 0+0 flags 0x1 time 200", "sendCommand state 2", "sendCommand state 1"});
     for (size_t i = kOutputBuffers; i-- > 0;) calls.push_back("freeBuffer 1 out" + std::to_string(i));
     for (size_t i = kInputBuffers; i-- > 0;) calls.push_back("freeBuffer 0 in" + std::to_string(i));
     calls.emplace_back("freeNode");
@@ -76,8 +80,14 @@ class LifeTest : public DecoderSessionTest, public ::testing::WithParamInterface
 
 TEST_P(LifeTest, TakesTheseCalls) {
   ASSERT_EQ(getHardwareBaseVersion(), GetParam().version);
-  create();
+  create("a name that nobody looks at");
+  EXPECT_STREQ(_session->_componentName, "a name that nobody looks at");
+  EXPECT_FALSE(_session->isEncoder());
+  EXPECT_EQ(log(), isTi() ? LogLines{kTiLine} : LogLines{});
   _log.clear();
+  if (!isTi()) {
+    EXPECT_EQ(words(omx().calls(Method::SetParameter)[0].record), (Words{16, 0, 0, 2}));
+  }
   EXPECT_EQ(decoder().setInputCompressionFormat(0), 0);
   EXPECT_EQ(_session->setupPortParameters(0, 176, 144, 24), OMXI_OK);
   EXPECT_EQ(init(), OMXI_OK);
@@ -88,91 +98,41 @@ TEST_P(LifeTest, TakesTheseCalls) {
   destroy();
 
   EXPECT_EQ(trace(), wholeLife());
-  EXPECT_EQ(_server.leaks(), "");
   EXPECT_EQ(omx().buffersFreedWithNode(), 0u);
   const std::vector<Picture> delivered = pictures();
   ASSERT_EQ(delivered.size(), kPictures);
   for (size_t i = 0; i < kPictures; ++i) EXPECT_EQ(delivered[i].output.timestamp, 100 + i);
-  EXPECT_EQ(_application.inputCallbacks(), kPictures + 1);
+  EXPECT_EQ(_application.inputCallbacks().size(), kPictures + 1);
   EXPECT_EQ(sortedLog(), sorted({kEndEvent, kDecoderOver}));
+}
+
+TEST_P(LifeTest, DoesNotNeedItsSettings) {
+  omx().failWhere([](const Call& call) {
+    return call.method == Method::SetParameter || call.method == Method::GetParameter;
+  });
+  create();
+  EXPECT_EQ(log(), GetParam().refusals);
+  EXPECT_EQ(_session->_componentName, nullptr);
+  omx().failWhere(nullptr);
+  EXPECT_EQ(init(), OMXI_OK);
 }
 
 INSTANTIATE_TEST_SUITE_P(
     EveryVersion, LifeTest,
     ::testing::Values(
-        Life{"msm-unknown", HW_VERSION_UNKNOWN, kQcomDecoder, kPictureOrder, "useBuffer", kQuery},
-        Life{"msm8960", HW_VERSION_QCOM_OTHER, kQcomDecoder, kPictureOrder, "useBuffer", kQuery},
-        Life{"msm7x30", HW_VERSION_MSM7X30, kQcomDecoder, kPictureOrder, "useBuffer", kQuery},
-        Life{"msm8x55", HW_VERSION_MSM8X55, kQcomDecoder, kPictureOrder, "useBuffer", kQuery},
+        Life{"msm-unknown", HW_VERSION_UNKNOWN, kPictureOrder, kOrderRefused},
+        Life{"msm8960", HW_VERSION_QCOM_OTHER, kPictureOrder, kOrderRefused},
+        Life{"msm7x30", HW_VERSION_MSM7X30, kPictureOrder, kOrderRefused},
+        Life{"msm8x55", HW_VERSION_MSM8X55, kPictureOrder, kOrderRefused},
         Life{"msm8x60",
              HW_VERSION_MSM8X60,
-             kQcomDecoder,
-             {"setParameter 0x7f000010 size 16", "setParameter 0x7f000002 size 24"},
-             "useBuffer",
-             kQuery},
+             {kPictureOrder[0], "setParameter 0x7f000002 size 24"},
+             {kOrderRefused[0], std::string("E OMXINTERFACE - Could not set input frame packing format (") +
+                                    kRefusedText + ")"}},
         Life{"omap4",
              HW_VERSION_OMAP4,
-             "OMX.TI.DUCATI1.VIDEO.DECODER==",
-             {"getParameter 0x06000001 size 28", "getParameter 0x06000001 size 28",
-              "setParameter 0x06000001 size 28", "getParameter definition of port 0",
-              "setParameter definition of port 0", "getParameter definition of port 1",
-              "setParameter definition of port 1"},
-             "allocateBufferWithBackup",
-             {kQuery[0], "getConfig"}}),
-    [](const auto& test) { return "Version" + std::to_string(test.param.version); });
-
-// --- Ends ---
-
-// A decoder whose start can be stopped before it makes its threads.
-class LateStarter : public OmxInterfaceDecoder {
- public:
-  ~LateStarter() override { endSession(); }
-  int init() override {
-    count(1);
-    if (stops) gate.pass();
-    const int result = OmxInterface::init();
-    count(-1);
-    return result;
-  }
-
-  bool stops = false;
-  Gate gate;
-
- private:
-  // A call in progress, which destruction waits for.
-  void count(int change) {
-    const SessionState::Lock held(_state->lock);
-    _state->calls += change;
-    _state->left.notify_all();
-  }
-};
-
-class EarlyEndTest : public DecoderSessionTest {};
-
-TEST_F(EarlyEndTest, AThreadThatStartsAfterTheEndHasBegunEndsToo) {
-  auto owned = std::make_unique<LateStarter>();
-  LateStarter& session = *owned;
-  _session = std::move(owned);
-  ASSERT_EQ(session.setupIOMXConnections(), OMXI_OK);
-  omx().fail(Method::SendCommand);
-  ASSERT_EQ(init(), OMXI_ERR_SEND_COMMAND_STATE);  // leaves an output thread
-  session.stops = true;
-  Later<int> starting = beginInit();
-  session.gate.waitForArrival();
-  SessionState& state = *session._state;
-  Later<bool> destroyed = beginDestroyOfBusySession();
-  // What wakes the threads has been used up by the first one. A second one that slept would be waited for.
-  requireEventually(
-      [&] {
-        const SessionState::Lock held(state.lock);
-        return !state.outputThread.running;
-      },
-      "the output thread's end");
-  session.gate.open();
-  EXPECT_EQ(starting.result(), OMXI_ERR_SEND_COMMAND_STATE);
-  destroyed.result();
-  EXPECT_EQ(log(), LogLines(2, kDecoderOver));
-}
+             kTiSettings,
+             {kTiLine, std::string("E get OMX_IndexParamVideoPortFormat OutPort Error:") + kRefusedText}}));
 
 }  // namespace
 }  // namespace omxtest

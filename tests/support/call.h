@@ -13,8 +13,8 @@
 
 namespace omxtest {
 
+// Those that sessions make.
 enum class Method {
-  LivesLocally,
   ListNodes,
   AllocateNode,
   FreeNode,
@@ -23,44 +23,44 @@ enum class Method {
   SetParameter,
   GetConfig,
   SetConfig,
-  GetState,
   StoreMetaDataInBuffers,
-  EnableGraphicBuffers,
-  GetGraphicBufferUsage,
   UseBuffer,
-  UseGraphicBuffer,
   AllocateBuffer,
   AllocateBufferWithBackup,
   FreeBuffer,
   FillBuffer,
   EmptyBuffer,
-  GetExtensionIndex,
 };
 
 // The method as it is written in IOMX.
-const char* name(Method method);
+inline const char* name(Method method) {
+  static constexpr const char* kNames[] = {"listNodes",   "allocateNode",   "freeNode",
+                                           "sendCommand", "getParameter",   "setParameter",
+                                           "getConfig",   "setConfig",      "storeMetaDataInBuffers",
+                                           "useBuffer",   "allocateBuffer", "allocateBufferWithBackup",
+                                           "freeBuffer",  "fillBuffer",     "emptyBuffer"};
+  return kNames[static_cast<size_t>(method)];
+}
 
 // Only what the method has is filled in. Results (buffer, node, status, and the record of a get) are
 // known after the call: in hooks before it they are empty.
 struct Call {
   Method method{};
-  size_t number = 0;  // counts all calls, from 1
   android::IOMX::node_id node = nullptr;
-  std::string text;             // component or extension name
-  OMX_COMMANDTYPE command{};    // SendCommand
-  OMX_S32 param = 0;            // SendCommand
-  OMX_INDEXTYPE index{};        // parameters and configurations
-  std::vector<uint8_t> record;  // as sent by a set; of a get: as sent, and after success as answered
-  size_t size = 0;              // the size argument: of a record, or AllocateBuffer's
+  size_t number = 0;                 // counts all calls, from 1
+  std::string text = {};             // component name
+  OMX_COMMANDTYPE command{};         // SendCommand
+  OMX_S32 param = 0;                 // SendCommand
+  OMX_INDEXTYPE index{};             // parameters and configurations
+  std::vector<uint8_t> record = {};  // as sent by a set; of a get: as sent, and after success as answered
+  size_t size = 0;  // of a record as the caller says, of AllocateBuffer's buffer, of a block of ours
   OMX_U32 port = 0;
-  size_t blockSize = 0;  // UseBuffer, AllocateBufferWithBackup
-  ssize_t blockOffset = 0;
   android::IOMX::buffer_id buffer = nullptr;
   OMX_U32 offset = 0;  // EmptyBuffer
   OMX_U32 length = 0;
   OMX_U32 flags = 0;
   OMX_TICKS timestamp = 0;
-  OMX_BOOL enable = OMX_FALSE;  // StoreMetaDataInBuffers, EnableGraphicBuffers
+  OMX_BOOL enable = OMX_FALSE;  // StoreMetaDataInBuffers
   bool forwarded = true;        // false: failed on request
   android::status_t status = android::OK;
 
@@ -74,8 +74,5 @@ struct Call {
     return value;
   }
 };
-
-// One line for a failing test's message.
-std::string describe(const Call& call);
 
 }  // namespace omxtest

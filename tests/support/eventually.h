@@ -4,9 +4,9 @@
 #include <chrono>
 #include <thread>
 
-#include "tests/support/script.h"
-
 namespace omxtest {
+
+inline constexpr std::chrono::milliseconds kWaitLimit{20000};
 
 // True as soon as `predicate` is; false when the limit has passed. Asks again and again: where something
 // can be waited for (calls, messages, inputs, log lines), wait for that instead.

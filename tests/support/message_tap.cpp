@@ -1,13 +1,11 @@
 #include "tests/support/message_tap.h"
 
 #include <algorithm>
-#include <cstdint>
 #include <iterator>
 #include <memory>
 #include <utility>
 
 #include "host/mediaserver/message_channel.h"
-#include "tests/support/script.h"
 
 namespace omxtest {
 
@@ -83,28 +81,9 @@ MessageTap::~MessageTap() {
   for (const auto& [node, observer] : observers) observer->leave();
 }
 
-void MessageTap::addRule(Match match, Fate fate, size_t count) {
-  std::lock_guard<std::mutex> lock(_mutex);
-  _rules.push_front({std::move(match), fate, count});
-}
-
 void MessageTap::hold(Match match) {
-  addRule(std::move(match), Fate::Hold, SIZE_MAX);
-}
-void MessageTap::hold(Match match, size_t count) {
-  addRule(std::move(match), Fate::Hold, count);
-}
-void MessageTap::drop(Match match) {
-  addRule(std::move(match), Fate::Drop, SIZE_MAX);
-}
-void MessageTap::drop(Match match, size_t count) {
-  addRule(std::move(match), Fate::Drop, count);
-}
-void MessageTap::repeat(Match match) {
-  addRule(std::move(match), Fate::Repeat, SIZE_MAX);
-}
-void MessageTap::repeat(Match match, size_t count) {
-  addRule(std::move(match), Fate::Repeat, count);
+  std::lock_guard<std::mutex> lock(_mutex);
+  _holds.push_back(std::move(match));
 }
 
 void MessageTap::setFilter(Filter filter) {
@@ -114,24 +93,17 @@ void MessageTap::setFilter(Filter filter) {
 
 void MessageTap::passAll() {
   std::lock_guard<std::mutex> lock(_mutex);
-  _rules.clear();
+  _holds.clear();
   _filter = nullptr;
-}
-
-Fate MessageTap::decide(const omx_message& message) {
-  const auto rule = std::find_if(_rules.begin(), _rules.end(), [&](const Rule& candidate) {
-    return candidate.left > 0 && candidate.match(message);
-  });
-  if (rule == _rules.end()) return _filter ? _filter(message) : Fate::Pass;
-  if (rule->left != SIZE_MAX) --rule->left;
-  return rule->fate;
 }
 
 void MessageTap::onMessage(const sp<Observer>& observer, const omx_message& message) {
   Fate fate = Fate::Pass;
   {
     std::lock_guard<std::mutex> lock(_mutex);
-    fate = decide(message);
+    const bool kept =
+        std::any_of(_holds.begin(), _holds.end(), [&](const Match& match) { return match(message); });
+    fate = kept ? Fate::Hold : _filter ? _filter(message) : Fate::Pass;
     if (fate == Fate::Hold) {
       _held.push_back({observer, message});
       _changed.notify_all();
@@ -153,10 +125,6 @@ bool MessageTap::waitForHeld(size_t count, std::chrono::milliseconds limit) cons
   return _changed.wait_for(lock, limit, [&] { return _held.size() >= count; });
 }
 
-bool MessageTap::waitForHeld(size_t count) const {
-  return waitForHeld(count, kWaitLimit);
-}
-
 bool MessageTap::release(size_t position) {
   Held entry;
   {
@@ -167,30 +135,6 @@ bool MessageTap::release(size_t position) {
     _held.erase(found);
   }
   entry.observer->deliver(entry.message);
-  return true;
-}
-
-void MessageTap::releaseAll() {
-  std::list<Held> all;
-  {
-    std::lock_guard<std::mutex> lock(_mutex);
-    all.swap(_held);
-  }
-  for (const Held& entry : all) entry.observer->deliver(entry.message);
-}
-
-void MessageTap::releaseAllReversed() {
-  {
-    std::lock_guard<std::mutex> lock(_mutex);
-    _held.reverse();
-  }
-  releaseAll();
-}
-
-bool MessageTap::discard(size_t position) {
-  std::lock_guard<std::mutex> lock(_mutex);
-  if (position >= _held.size()) return false;
-  _held.erase(std::next(_held.begin(), static_cast<ptrdiff_t>(position)));
   return true;
 }
 
@@ -216,25 +160,18 @@ void MessageTap::noteDelivered(const omx_message& message) {
   _changed.notify_all();
 }
 
-std::vector<omx_message> MessageTap::delivered() const {
-  std::lock_guard<std::mutex> lock(_mutex);
-  return _delivered;
+size_t MessageTap::countDelivered(const Match& match) const {
+  return static_cast<size_t>(std::count_if(_delivered.begin(), _delivered.end(), match));
 }
 
 size_t MessageTap::deliveredCount(const Match& match) const {
   std::lock_guard<std::mutex> lock(_mutex);
-  return static_cast<size_t>(std::count_if(_delivered.begin(), _delivered.end(), match));
-}
-
-bool MessageTap::waitForDelivered(const Match& match, size_t count, std::chrono::milliseconds limit) const {
-  std::unique_lock<std::mutex> lock(_mutex);
-  return _changed.wait_for(lock, limit, [&] {
-    return static_cast<size_t>(std::count_if(_delivered.begin(), _delivered.end(), match)) >= count;
-  });
+  return countDelivered(match);
 }
 
 bool MessageTap::waitForDelivered(const Match& match, size_t count) const {
-  return waitForDelivered(match, count, kWaitLimit);
+  std::unique_lock<std::mutex> lock(_mutex);
+  return _changed.wait_for(lock, kWaitLimit, [&] { return countDelivered(match) >= count; });
 }
 
 void MessageTap::forgetFreedNodes() {
@@ -272,6 +209,66 @@ void MessageTap::detach(NodeId node) {
     _live.erase(entry);
   }
   observer->close();
+}
+
+Match anyMessage() {
+  return [](const omx_message&) { return true; };
+}
+
+Match anyEvent() {
+  return [](const omx_message& message) { return message.type == omx_message::EVENT; };
+}
+
+Match eventIs(OMX_EVENTTYPE event) {
+  return [=](const omx_message& message) {
+    return message.type == omx_message::EVENT && message.u.event_data.event == event;
+  };
+}
+
+Match commandComplete(OMX_COMMANDTYPE command) {
+  return [=](const omx_message& message) {
+    return eventIs(OMX_EventCmdComplete)(message) &&
+           message.u.event_data.data1 == static_cast<OMX_U32>(command);
+  };
+}
+
+Match commandComplete(OMX_COMMANDTYPE command, OMX_U32 data) {
+  return [=](const omx_message& message) {
+    return commandComplete(command)(message) && message.u.event_data.data2 == data;
+  };
+}
+
+Match emptyBufferDone() {
+  return [](const omx_message& message) { return message.type == omx_message::EMPTY_BUFFER_DONE; };
+}
+
+Match fillBufferDone() {
+  return [](const omx_message& message) { return message.type == omx_message::FILL_BUFFER_DONE; };
+}
+
+omx_message makeEvent(OMX_EVENTTYPE event, OMX_U32 data1, OMX_U32 data2) {
+  omx_message message{};
+  message.type = omx_message::EVENT;
+  message.u.event_data.event = event;
+  message.u.event_data.data1 = data1;
+  message.u.event_data.data2 = data2;
+  return message;
+}
+
+omx_message makeEmptyBufferDone(android::IOMX::buffer_id buffer) {
+  omx_message message{};
+  message.type = omx_message::EMPTY_BUFFER_DONE;
+  message.u.buffer_data.buffer = buffer;
+  return message;
+}
+
+omx_message makeFillBufferDone(android::IOMX::buffer_id buffer, OMX_U32 length, OMX_U32 flags) {
+  omx_message message{};
+  message.type = omx_message::FILL_BUFFER_DONE;
+  message.u.extended_buffer_data.buffer = buffer;
+  message.u.extended_buffer_data.range_length = length;
+  message.u.extended_buffer_data.flags = flags;
+  return message;
 }
 
 }  // namespace omxtest

@@ -17,6 +17,8 @@
 
 #include <media/IOMX.h>
 
+#include "tests/support/eventually.h"
+
 namespace omxtest {
 
 enum class Fate { Pass, Hold, Drop, Repeat };  // Repeat: delivered twice
@@ -36,8 +38,7 @@ Match fillBufferDone();
 // Messages to forge.
 android::omx_message makeEvent(OMX_EVENTTYPE event, OMX_U32 data1, OMX_U32 data2);
 android::omx_message makeEmptyBufferDone(android::IOMX::buffer_id buffer);
-android::omx_message makeFillBufferDone(android::IOMX::buffer_id buffer, OMX_U32 length, OMX_U32 flags = 0,
-                                        OMX_TICKS timestamp = 0);
+android::omx_message makeFillBufferDone(android::IOMX::buffer_id buffer, OMX_U32 length, OMX_U32 flags = 0);
 
 class MessageTap {
  public:
@@ -48,44 +49,31 @@ class MessageTap {
   MessageTap(const MessageTap&) = delete;
   MessageTap& operator=(const MessageTap&) = delete;
 
-  // --- What happens to messages from now on. The latest rule that matches decides; without one they pass.
-
-  // Rules with a count end after that many messages.
+  // From now on messages that match are kept.
   void hold(Match match);
-  void hold(Match match, size_t count);
-  void drop(Match match);
-  void drop(Match match, size_t count);
-  void repeat(Match match);
-  void repeat(Match match, size_t count);
-  // Decides about everything that no rule matches. Null: all pass.
+  // Decides about every other one. Null: all pass.
   void setFilter(Filter filter);
-  // Forgets rules and filter; what is held stays held.
+  // All messages pass again; what is held stays held.
   void passAll();
 
-  // --- Held messages, oldest first.
-
+  // Held messages, oldest first.
   std::vector<android::omx_message> held() const;
-  [[nodiscard]] bool waitForHeld(size_t count, std::chrono::milliseconds limit) const;
-  [[nodiscard]] bool waitForHeld(size_t count) const;
+  [[nodiscard]] bool waitForHeld(size_t count, std::chrono::milliseconds limit = kWaitLimit) const;
   // Delivers the held message at `position` (so reordering is a choice of positions); false if there is
   // none. Also when its node has been freed: that is a late message.
   bool release(size_t position = 0);
-  void releaseAll();
-  void releaseAllReversed();
-  // Drops the held message at `position`; false if there is none.
-  bool discard(size_t position = 0);
+  void releaseAll() {
+    while (release()) {
+    }
+  }
 
-  // --- Messages out of nothing. The node in the message is `node` unless it names one itself; it is
-  // delivered to `node`'s client behind what waits there, also after freeNode. False for a node that never
-  // was, or that was forgotten.
+  // A message out of nothing. The node in it is `node` unless it names one itself; it is delivered to
+  // `node`'s client behind what waits there, also after freeNode. False for a node that never was, or that
+  // was forgotten.
   bool forge(NodeId node, const android::omx_message& message);
 
-  // Every message that a client has handled, in that order.
-  std::vector<android::omx_message> delivered() const;
+  // Messages that clients have handled, that is: their function has returned.
   size_t deliveredCount(const Match& match) const;
-  // Waits until `count` matching ones have been delivered, that is: the client's function has returned.
-  [[nodiscard]] bool waitForDelivered(const Match& match, size_t count,
-                                      std::chrono::milliseconds limit) const;
   [[nodiscard]] bool waitForDelivered(const Match& match, size_t count = 1) const;
 
   // Lets go of the clients of freed nodes, and of messages held for them.
@@ -104,24 +92,18 @@ class MessageTap {
   class Observer;
   class Delivery;
   struct Link;
-  struct Rule {
-    Match match;
-    Fate fate;
-    size_t left;
-  };
   struct Held {
     android::sp<Observer> observer;
     android::omx_message message;
   };
 
-  void addRule(Match match, Fate fate, size_t count);
   void onMessage(const android::sp<Observer>& observer, const android::omx_message& message);
-  Fate decide(const android::omx_message& message);
+  size_t countDelivered(const Match& match) const;  // with the lock held
   void noteDelivered(const android::omx_message& message);
 
   mutable std::mutex _mutex;  // guards everything below; never held while a client is called
   mutable std::condition_variable _changed;
-  std::list<Rule> _rules;  // the latest first
+  std::vector<Match> _holds;
   Filter _filter;
   std::list<Held> _held;
   std::vector<android::omx_message> _delivered;

@@ -1,18 +1,11 @@
-// The books: what was called, what is to fail, what is allocated. The forwarding itself is in
-// recording_omx_calls.cpp.
-
 #include "tests/support/recording_omx.h"
 
-#include <algorithm>
 #include <utility>
 
 namespace omxtest {
 
+using android::sp;
 using android::status_t;
-
-RecordingOmx::RecordingOmx(const android::sp<android::IOMX>& omx) : _omx(omx) {}
-
-RecordingOmx::~RecordingOmx() = default;
 
 std::vector<Call> RecordingOmx::calls() const {
   std::lock_guard<std::mutex> lock(_mutex);
@@ -33,17 +26,15 @@ size_t RecordingOmx::count() const {
 }
 
 size_t RecordingOmx::count(Method method) const {
-  std::lock_guard<std::mutex> lock(_mutex);
-  return static_cast<size_t>(std::count_if(_calls.begin(), _calls.end(),
-                                           [=](const auto& entry) { return entry.second.method == method; }));
+  return calls(method).size();
 }
 
-bool RecordingOmx::waitForCalls(Method method, size_t total, std::chrono::milliseconds limit) const {
+bool RecordingOmx::waitForCalls(Method method, size_t total) const {
   std::unique_lock<std::mutex> lock(_mutex);
-  return _changed.wait_for(lock, limit, [&] {
-    return static_cast<size_t>(std::count_if(_calls.begin(), _calls.end(), [=](const auto& entry) {
-             return entry.second.method == method;
-           })) >= total;
+  return _changed.wait_for(lock, kWaitLimit, [&] {
+    size_t found = 0;
+    for (const auto& [number, call] : _calls) found += call.method == method ? size_t{1} : 0;
+    return found >= total;
   });
 }
 
@@ -53,37 +44,20 @@ void RecordingOmx::clearCalls() {
   _cleared = _begun;
 }
 
-std::string RecordingOmx::describeCalls() const {
-  std::string text;
-  for (const Call& call : calls()) text += describe(call) + "\n";
-  return text;
-}
-
 void RecordingOmx::fail(Method method, size_t n, status_t status) {
   std::lock_guard<std::mutex> lock(_mutex);
   _failures.push_back({method, n, status});
 }
 
-void RecordingOmx::failCall(size_t n, status_t status) {
-  std::lock_guard<std::mutex> lock(_mutex);
-  _failures.push_back({std::nullopt, n, status});
-}
-
-void RecordingOmx::failWhere(Choice choice, status_t status) {
+void RecordingOmx::failWhere(Choice choice) {
   std::lock_guard<std::mutex> lock(_mutex);
   _failureChoice = std::move(choice);
-  _choiceStatus = status;
 }
 
 void RecordingOmx::failNothing() {
   std::lock_guard<std::mutex> lock(_mutex);
   _failures.clear();
   _failureChoice = nullptr;
-}
-
-size_t RecordingOmx::failures() const {
-  std::lock_guard<std::mutex> lock(_mutex);
-  return _failed;
 }
 
 void RecordingOmx::before(Method method, Hook hook) {
@@ -106,11 +80,6 @@ size_t RecordingOmx::outstandingBuffers() const {
   size_t sum = 0;
   for (const auto& [node, buffers] : _allocated) sum += buffers.size();
   return sum;
-}
-
-size_t RecordingOmx::abandonedNodes() const {
-  std::lock_guard<std::mutex> lock(_mutex);
-  return _abandoned.size();
 }
 
 void RecordingOmx::freeAbandonedNodes() {
@@ -138,20 +107,17 @@ RecordingOmx::Hook RecordingOmx::hook(const std::map<Method, Hook>& hooks, Metho
 
 std::optional<status_t> RecordingOmx::begin(Call* call) {
   Choice choice;
-  status_t choiceStatus = kFailed;
   std::optional<status_t> failure;
   {
     std::lock_guard<std::mutex> lock(_mutex);
     call->number = ++_begun;
     for (Failure& candidate : _failures) {
-      if (candidate.left == 0 || (candidate.method.has_value() && *candidate.method != call->method))
-        continue;
+      if (candidate.left == 0 || candidate.method != call->method) continue;
       if (--candidate.left == 0) failure = candidate.status;
     }
     choice = _failureChoice;
-    choiceStatus = _choiceStatus;
   }
-  if (!failure.has_value() && choice && choice(*call)) failure = choiceStatus;
+  if (!failure.has_value() && choice && choice(*call)) failure = kFailed;
   return failure;
 }
 
@@ -168,15 +134,10 @@ status_t RecordingOmx::run(Call call, const Forward& forward) {
   if (call.forwarded) {
     if (const Hook last = hook(_after, call.method)) last(call);
   }
-  finish(call);
-  return call.status;
-}
-
-void RecordingOmx::finish(const Call& call) {
   std::lock_guard<std::mutex> lock(_mutex);
-  if (!call.forwarded) ++_failed;
   if (call.number > _cleared) _calls.emplace(call.number, call);
   _changed.notify_all();
+  return call.status;
 }
 
 void RecordingOmx::keepBooks(const Call& call) {
@@ -206,6 +167,135 @@ void RecordingOmx::keepBooks(const Call& call) {
     default:
       break;
   }
+}
+
+// --- Each operation: written down, and forwarded.
+
+namespace {
+
+using NodeId = android::IOMX::node_id;
+
+Call recordCall(Method method, NodeId node, OMX_INDEXTYPE index, const void* params, size_t size) {
+  const auto* const bytes = static_cast<const uint8_t*>(params);
+  return {.method = method, .node = node, .index = index, .record = {bytes, bytes + size}, .size = size};
+}
+
+}  // namespace
+
+status_t RecordingOmx::listNodes(android::List<ComponentInfo>* list) {
+  return run({.method = Method::ListNodes}, [&](Call&) { return _omx->listNodes(list); });
+}
+
+status_t RecordingOmx::allocateNode(const char* name, const sp<android::IOMXObserver>& observer,
+                                    node_id* node) {
+  *node = nullptr;
+  return run({.method = Method::AllocateNode, .text = name}, [&](Call& call) {
+    const sp<android::IOMXObserver> wrapped = _messages.wrap(observer);
+    if (wrapped.get() == nullptr) return kFailed;
+    const status_t status = _omx->allocateNode(name, wrapped, node);
+    call.node = *node;
+    if (status == android::OK) _messages.attach(wrapped, *node);
+    return status;
+  });
+}
+
+status_t RecordingOmx::freeNode(node_id node) {
+  return run({.method = Method::FreeNode, .node = node}, [&](Call&) {
+    const status_t status = _omx->freeNode(node);
+    if (status == android::OK) _messages.detach(node);
+    return status;
+  });
+}
+
+status_t RecordingOmx::sendCommand(node_id node, OMX_COMMANDTYPE cmd, OMX_S32 param) {
+  return run({.method = Method::SendCommand, .node = node, .command = cmd, .param = param},
+             [&](Call&) { return _omx->sendCommand(node, cmd, param); });
+}
+
+status_t RecordingOmx::getParameter(node_id node, OMX_INDEXTYPE index, void* params, size_t size) {
+  return run(recordCall(Method::GetParameter, node, index, params, size), [&](Call& call) {
+    const status_t status = _omx->getParameter(node, index, params, size);
+    memcpy(call.record.data(), params, size);
+    return status;
+  });
+}
+
+status_t RecordingOmx::getConfig(node_id node, OMX_INDEXTYPE index, void* params, size_t size) {
+  return run(recordCall(Method::GetConfig, node, index, params, size), [&](Call& call) {
+    const status_t status = _omx->getConfig(node, index, params, size);
+    memcpy(call.record.data(), params, size);
+    return status;
+  });
+}
+
+status_t RecordingOmx::setParameter(node_id node, OMX_INDEXTYPE index, const void* params, size_t size) {
+  return run(recordCall(Method::SetParameter, node, index, params, size),
+             [&](Call&) { return _omx->setParameter(node, index, params, size); });
+}
+
+status_t RecordingOmx::setConfig(node_id node, OMX_INDEXTYPE index, const void* params, size_t size) {
+  return run(recordCall(Method::SetConfig, node, index, params, size),
+             [&](Call&) { return _omx->setConfig(node, index, params, size); });
+}
+
+status_t RecordingOmx::storeMetaDataInBuffers(node_id node, OMX_U32 port, OMX_BOOL enable) {
+  return run({.method = Method::StoreMetaDataInBuffers, .node = node, .port = port, .enable = enable},
+             [&](Call&) { return _omx->storeMetaDataInBuffers(node, port, enable); });
+}
+
+status_t RecordingOmx::useBuffer(node_id node, OMX_U32 port, const sp<android::IMemory>& params,
+                                 buffer_id* buffer) {
+  *buffer = nullptr;
+  return run({.method = Method::UseBuffer, .node = node, .size = params->size(), .port = port},
+             [&](Call& call) {
+               const status_t status = _omx->useBuffer(node, port, params, buffer);
+               call.buffer = *buffer;
+               return status;
+             });
+}
+
+status_t RecordingOmx::allocateBufferWithBackup(node_id node, OMX_U32 port,
+                                                const sp<android::IMemory>& params, buffer_id* buffer) {
+  *buffer = nullptr;
+  return run({.method = Method::AllocateBufferWithBackup, .node = node, .size = params->size(), .port = port},
+             [&](Call& call) {
+               const status_t status = _omx->allocateBufferWithBackup(node, port, params, buffer);
+               call.buffer = *buffer;
+               return status;
+             });
+}
+
+status_t RecordingOmx::allocateBuffer(node_id node, OMX_U32 port, size_t size, buffer_id* buffer,
+                                      void** data) {
+  *buffer = nullptr;
+  *data = nullptr;
+  return run({.method = Method::AllocateBuffer, .node = node, .size = size, .port = port}, [&](Call& call) {
+    const status_t status = _omx->allocateBuffer(node, port, size, buffer, data);
+    call.buffer = *buffer;
+    return status;
+  });
+}
+
+status_t RecordingOmx::freeBuffer(node_id node, OMX_U32 port, buffer_id buffer) {
+  return run({.method = Method::FreeBuffer, .node = node, .port = port, .buffer = buffer},
+             [&](Call&) { return _omx->freeBuffer(node, port, buffer); });
+}
+
+status_t RecordingOmx::fillBuffer(node_id node, buffer_id buffer) {
+  return run({.method = Method::FillBuffer, .node = node, .buffer = buffer},
+             [&](Call&) { return _omx->fillBuffer(node, buffer); });
+}
+
+status_t RecordingOmx::emptyBuffer(node_id node, buffer_id buffer, OMX_U32 offset, OMX_U32 length,
+                                   OMX_U32 flags, OMX_TICKS timestamp) {
+  return run({.method = Method::EmptyBuffer,
+              .node = node,
+              .buffer = buffer,
+              .offset = offset,
+              .length = length,
+              .flags = flags,
+              .timestamp = timestamp},
+             [&](Call&) { return _omx->emptyBuffer(node, buffer, offset, length, flags, timestamp); });
 }
 
 }  // namespace omxtest

@@ -1,10 +1,9 @@
 #pragma once
-// An IOMX in front of another one: writes every call down, fails the calls that a test asks for, runs a
-// test's code before and after calls, and counts what is allocated. Messages pass its tap.
+// An IOMX in front of another one: writes down the calls that sessions make, fails those that a test asks
+// for, runs a test's code before and after calls, and counts what is allocated. Messages pass its tap.
 // Any thread may call it, several at once; hooks run on the calling thread and without a lock, so they may
 // call the wrapper again and block. Keeps the wrapped IOMX alive.
 
-#include <chrono>
 #include <condition_variable>
 #include <functional>
 #include <map>
@@ -17,7 +16,6 @@
 
 #include "tests/support/call.h"
 #include "tests/support/message_tap.h"
-#include "tests/support/script.h"
 
 namespace omxtest {
 
@@ -26,8 +24,7 @@ class RecordingOmx : public android::BnOMX {
   using Hook = std::function<void(const Call&)>;
   using Choice = std::function<bool(const Call&)>;
 
-  explicit RecordingOmx(const android::sp<android::IOMX>& omx);
-  ~RecordingOmx() override;
+  explicit RecordingOmx(const android::sp<android::IOMX>& omx) : _omx(omx) {}
 
   MessageTap& messages() { return _messages; }
 
@@ -39,12 +36,9 @@ class RecordingOmx : public android::BnOMX {
   size_t count() const;  // of all completed calls
   size_t count(Method method) const;
   // Waits until `total` calls of that method have returned since the last clear.
-  [[nodiscard]] bool waitForCalls(Method method, size_t total,
-                                  std::chrono::milliseconds limit = kWaitLimit) const;
+  [[nodiscard]] bool waitForCalls(Method method, size_t total) const;
   // Forgets the calls; numbers go on. Calls in progress are not noted.
   void clearCalls();
-  // All of them as text, one a line.
-  std::string describeCalls() const;
 
   // --- Failures. A failed call is not forwarded and not counted as allocated or freed; outputs are as
   // IOMX leaves them on failure.
@@ -53,14 +47,10 @@ class RecordingOmx : public android::BnOMX {
 
   // The n-th call of that method from now on, counting from 1, and only that one.
   void fail(Method method, size_t n = 1, android::status_t status = kFailed);
-  // The n-th call of any method from now on.
-  void failCall(size_t n, android::status_t status = kFailed);
   // Every call that the choice picks. The choice runs on the caller's thread, without a lock.
-  void failWhere(Choice choice, android::status_t status = kFailed);
+  void failWhere(Choice choice);
   // Forgets failures that did not come yet.
   void failNothing();
-  // How many calls were failed.
-  size_t failures() const;
 
   // --- Hooks: run around each forwarded call of that method until it is set anew; null: none.
 
@@ -71,15 +61,13 @@ class RecordingOmx : public android::BnOMX {
 
   size_t outstandingNodes() const;
   size_t outstandingBuffers() const;
-  // Nodes whose freeNode was failed on request: their client could do no more. Not outstanding.
-  size_t abandonedNodes() const;
+  // Frees nodes whose freeNode was failed on request: their client could do no more. Not outstanding.
   void freeAbandonedNodes();
   // Buffers that nobody freed before their node.
   size_t buffersFreedWithNode() const;
 
   // --- IOMX.
 
-  bool livesLocally(pid_t pid) override;
   android::status_t listNodes(android::List<ComponentInfo>* list) override;
   android::status_t allocateNode(const char* name, const android::sp<android::IOMXObserver>& observer,
                                  node_id* node) override;
@@ -89,30 +77,42 @@ class RecordingOmx : public android::BnOMX {
   android::status_t setParameter(node_id node, OMX_INDEXTYPE index, const void* params, size_t size) override;
   android::status_t getConfig(node_id node, OMX_INDEXTYPE index, void* params, size_t size) override;
   android::status_t setConfig(node_id node, OMX_INDEXTYPE index, const void* params, size_t size) override;
-  android::status_t getState(node_id node, OMX_STATETYPE* state) override;
-  android::status_t storeMetaDataInBuffers(node_id node, OMX_U32 port_index, OMX_BOOL enable) override;
-  android::status_t enableGraphicBuffers(node_id node, OMX_U32 port_index, OMX_BOOL enable) override;
-  android::status_t getGraphicBufferUsage(node_id node, OMX_U32 port_index, OMX_U32* usage) override;
-  android::status_t useBuffer(node_id node, OMX_U32 port_index, const android::sp<android::IMemory>& params,
+  android::status_t storeMetaDataInBuffers(node_id node, OMX_U32 port, OMX_BOOL enable) override;
+  android::status_t useBuffer(node_id node, OMX_U32 port, const android::sp<android::IMemory>& params,
                               buffer_id* buffer) override;
-  android::status_t useGraphicBuffer(node_id node, OMX_U32 port_index,
-                                     const android::sp<android::GraphicBuffer>& graphicBuffer,
-                                     buffer_id* buffer) override;
-  android::status_t allocateBuffer(node_id node, OMX_U32 port_index, size_t size, buffer_id* buffer,
-                                   void** buffer_data) override;
-  android::status_t allocateBufferWithBackup(node_id node, OMX_U32 port_index,
+  android::status_t allocateBuffer(node_id node, OMX_U32 port, size_t size, buffer_id* buffer,
+                                   void** data) override;
+  android::status_t allocateBufferWithBackup(node_id node, OMX_U32 port,
                                              const android::sp<android::IMemory>& params,
                                              buffer_id* buffer) override;
-  android::status_t freeBuffer(node_id node, OMX_U32 port_index, buffer_id buffer) override;
+  android::status_t freeBuffer(node_id node, OMX_U32 port, buffer_id buffer) override;
   android::status_t fillBuffer(node_id node, buffer_id buffer) override;
-  android::status_t emptyBuffer(node_id node, buffer_id buffer, OMX_U32 range_offset, OMX_U32 range_length,
-                                OMX_U32 flags, OMX_TICKS timestamp) override;
-  android::status_t getExtensionIndex(node_id node, const char* parameter_name,
-                                      OMX_INDEXTYPE* index) override;
+  android::status_t emptyBuffer(node_id node, buffer_id buffer, OMX_U32 offset, OMX_U32 length, OMX_U32 flags,
+                                OMX_TICKS timestamp) override;
+
+  // Passed on as they are.
+  bool livesLocally(pid_t pid) override { return _omx->livesLocally(pid); }
+  android::status_t getState(node_id node, OMX_STATETYPE* state) override {
+    return _omx->getState(node, state);
+  }
+  android::status_t enableGraphicBuffers(node_id node, OMX_U32 port, OMX_BOOL enable) override {
+    return _omx->enableGraphicBuffers(node, port, enable);
+  }
+  android::status_t getGraphicBufferUsage(node_id node, OMX_U32 port, OMX_U32* usage) override {
+    return _omx->getGraphicBufferUsage(node, port, usage);
+  }
+  android::status_t useGraphicBuffer(node_id node, OMX_U32 port,
+                                     const android::sp<android::GraphicBuffer>& graphicBuffer,
+                                     buffer_id* buffer) override {
+    return _omx->useGraphicBuffer(node, port, graphicBuffer, buffer);
+  }
+  android::status_t getExtensionIndex(node_id node, const char* extension, OMX_INDEXTYPE* index) override {
+    return _omx->getExtensionIndex(node, extension, index);
+  }
 
  private:
   struct Failure {
-    std::optional<Method> method;
+    Method method;
     size_t left;
     android::status_t status;
   };
@@ -121,14 +121,8 @@ class RecordingOmx : public android::BnOMX {
   // Runs one call: failures, hooks, `forward`, books.
   android::status_t run(Call call, const Forward& forward);
   std::optional<android::status_t> begin(Call* call);
-  void finish(const Call& call);
   void keepBooks(const Call& call);
   Hook hook(const std::map<Method, Hook>& hooks, Method method) const;
-  android::status_t getRecord(Method method, node_id node, OMX_INDEXTYPE index, void* params, size_t size);
-  android::status_t setRecord(Method method, node_id node, OMX_INDEXTYPE index, const void* params,
-                              size_t size);
-  android::status_t giveBlock(Method method, node_id node, OMX_U32 port,
-                              const android::sp<android::IMemory>& block, buffer_id* buffer);
 
   const android::sp<android::IOMX> _omx;
   MessageTap _messages;
@@ -140,8 +134,6 @@ class RecordingOmx : public android::BnOMX {
   std::map<size_t, Call> _calls;
   std::vector<Failure> _failures;
   Choice _failureChoice;
-  android::status_t _choiceStatus = kFailed;
-  size_t _failed = 0;
   std::map<Method, Hook> _before;
   std::map<Method, Hook> _after;
   std::map<node_id, std::set<buffer_id>> _allocated;

@@ -1,10 +1,8 @@
 #include "tests/support/script.h"
 
-#include <algorithm>
-#include <cstring>
 #include <utility>
 
-#include "tests/support/script_state.h"
+#include "tests/support/scripted_codec.h"
 
 namespace omxtest {
 
@@ -43,137 +41,95 @@ PortDefinition defaultPort(bool compressed, OMX_U32 buffers) {
 
 }  // namespace
 
-Script::Script(Kind kind) : _state(std::make_shared<State>(kind)) {
+Script::Script(Kind kind) : _kind(kind) {
   const bool decoder = kind == Kind::Decoder;
-  _state->ports = {defaultPort(decoder, 4), defaultPort(!decoder, decoder ? 8 : 6)};
-  std::vector<mediaserver::VideoFormat> compressed{{OMX_VIDEO_CodingAVC, OMX_COLOR_FormatUnused}};
-  if (decoder) {
-    for (const OMX_VIDEO_CODINGTYPE coding :
-         {OMX_VIDEO_CodingMPEG4, OMX_VIDEO_CodingH263, OMX_VIDEO_CodingWMV}) {
-      compressed.push_back({coding, OMX_COLOR_FormatUnused});
-    }
+  _ports = {defaultPort(decoder, 4), defaultPort(!decoder, decoder ? 8 : 6)};
+  auto& compressed = _formats[decoder ? kInputPort : kOutputPort];
+  compressed = {{OMX_VIDEO_CodingAVC, OMX_COLOR_FormatUnused}};
+  for (const auto coding : {OMX_VIDEO_CodingMPEG4, OMX_VIDEO_CodingH263, OMX_VIDEO_CodingWMV}) {
+    if (decoder) compressed.push_back({coding, OMX_COLOR_FormatUnused});
   }
-  _state->formats[decoder ? kInputPort : kOutputPort] = std::move(compressed);
-  _state->formats[decoder ? kOutputPort : kInputPort] = {
-      {OMX_VIDEO_CodingUnused, OMX_COLOR_FormatYUV420SemiPlanar},
-      {OMX_VIDEO_CodingUnused, kTiPackedSemiPlanar}};
-  _state->extensions = {{"OMX.google.android.index.storeMetaDataInBuffers", kMetaDataIndex}};
+  _formats[decoder ? kOutputPort : kInputPort] = {{OMX_VIDEO_CodingUnused, OMX_COLOR_FormatYUV420SemiPlanar},
+                                                  {OMX_VIDEO_CodingUnused, kTiPackedSemiPlanar}};
+  _extensions = {{"OMX.google.android.index.storeMetaDataInBuffers", kMetaDataIndex}};
 }
 
-Script::~Script() = default;
-
 mediaserver::Component Script::component(const std::string& name) {
-  const char* const role = _state->kind == Kind::Decoder ? "video_decoder.avc" : "video_encoder.avc";
-  return {name, {role}, [state = _state](mediaserver::CodecHost& host) {
-            return std::make_unique<ScriptedCodec>(state, host);
+  const char* const role = _kind == Kind::Decoder ? "video_decoder.avc" : "video_encoder.avc";
+  return {name, {role}, [this](mediaserver::CodecHost& host) {
+            return std::make_unique<ScriptedCodec>(*this, host);
           }};
 }
 
-void Script::editPort(OMX_U32 port, const std::function<void(PortDefinition&)>& edit) {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  edit(_state->ports.at(port));
+void Script::editPort(OMX_U32 port, const PortEdit& edit) {
+  const Lock lock(_mutex);
+  edit(_ports.at(port));
 }
 
 void Script::setFormats(OMX_U32 port, std::vector<mediaserver::VideoFormat> formats) {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  _state->formats.at(port) = std::move(formats);
+  const Lock lock(_mutex);
+  _formats.at(port) = std::move(formats);
 }
 
 void Script::setExtensions(std::vector<mediaserver::Extension> extensions) {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  _state->extensions = std::move(extensions);
+  const Lock lock(_mutex);
+  _extensions = std::move(extensions);
 }
 
-void Script::refuse(Access access, OMX_INDEXTYPE index, OMX_ERRORTYPE error, std::optional<OMX_U32> port) {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  _state->refused[{access, index}] = {error, port};
-}
-
-void Script::accept(Access access, OMX_INDEXTYPE index) {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  _state->refused.erase({access, index});
-  _state->accepted.insert({access, index});
+void Script::refuse(Access access, OMX_INDEXTYPE index, OMX_ERRORTYPE error) {
+  const Lock lock(_mutex);
+  _refused[{access, index}] = error;
 }
 
 void Script::answerBytes(OMX_INDEXTYPE index, const void* record, size_t size) {
   const auto* const bytes = static_cast<const uint8_t*>(record);
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  _state->answers[index].assign(bytes, bytes + size);
-}
-
-bool Script::copyWritten(OMX_INDEXTYPE index, void* record, size_t size) const {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  const auto entry = _state->records.find(index);
-  if (entry == _state->records.end() || entry->second.size() < size) return false;
-  std::memcpy(record, entry->second.data(), size);
-  return true;
+  const Lock lock(_mutex);
+  _answers[index].assign(bytes, bytes + size);
 }
 
 void Script::failStart(OMX_ERRORTYPE error) {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  _state->startFailure = error;
+  const Lock lock(_mutex);
+  _startFailure = error;
 }
 
-void Script::holdInput() {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  _state->inputBudget = 0;
-}
-
-void Script::releaseInput(size_t count) {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  if (_state->inputBudget.has_value()) *_state->inputBudget += count;
+void Script::setInputBudget(std::optional<size_t> budget) {
+  const Lock lock(_mutex);
+  _inputBudget = budget;
   wakeAll();
 }
 
-void Script::passInput() {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  _state->inputBudget.reset();
+void Script::setOutputHeld(bool held) {
+  const Lock lock(_mutex);
+  _outputHeld = held;
   wakeAll();
 }
 
-void Script::holdOutput() {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  _state->outputBudget = 0;
-}
-
-void Script::releaseOutput(size_t count) {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  if (_state->outputBudget.has_value()) *_state->outputBudget += count;
-  wakeAll();
-}
-
-void Script::passOutput() {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  _state->outputBudget.reset();
-  wakeAll();
-}
-
-void Script::onInput(std::function<std::vector<Packet>(const Packet&)> transform) {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  _state->transform = std::move(transform);
+void Script::onInput(Transform transform) {
+  const Lock lock(_mutex);
+  _transform = std::move(transform);
 }
 
 void Script::produce(const Packet& output) {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  for (ScriptedCodec* codec : _state->codecs) codec->_line.emplace_back(output);
+  const Lock lock(_mutex);
+  for (ScriptedCodec* codec : _codecs) codec->_line.emplace_back(output);
   wakeAll();
 }
 
 void Script::setDepth(size_t outputs) {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  _state->depth = outputs;
+  const Lock lock(_mutex);
+  _depth = outputs;
   wakeAll();
 }
 
 void Script::setDelay(std::chrono::milliseconds delay) {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  _state->delay = delay;
-  _state->changed.notify_all();
+  const Lock lock(_mutex);
+  _delay = delay;
+  _changed.notify_all();
 }
 
-void Script::announce(const std::function<void(PortDefinition&)>& edit, OMX_U32 index) {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  for (ScriptedCodec* codec : _state->codecs) codec->_line.emplace_back(Announcement{edit, index});
+void Script::announce(const PortEdit& edit, OMX_U32 index) {
+  const Lock lock(_mutex);
+  for (ScriptedCodec* codec : _codecs) codec->_line.emplace_back(Announcement{edit, index});
   wakeAll();
 }
 
@@ -187,60 +143,50 @@ void Script::announce(OMX_U32 width, OMX_U32 height) {
   });
 }
 
-void Script::raise(OMX_EVENTTYPE event, OMX_U32 data1, OMX_U32 data2) {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  for (ScriptedCodec* codec : _state->codecs) codec->_host.raise(event, data1, data2);
+void Script::raiseError(OMX_ERRORTYPE error) {
+  const Lock lock(_mutex);
+  for (ScriptedCodec* codec : _codecs) codec->_host.raise(OMX_EventError, static_cast<OMX_U32>(error), 0);
 }
 
 void Script::wakeAll() {
-  for (ScriptedCodec* codec : _state->codecs) codec->_host.wake();
+  for (ScriptedCodec* codec : _codecs) codec->_host.wake();
 }
 
 std::vector<Packet> Script::inputs() const {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  return {_state->inputs.begin(), _state->inputs.end()};
+  const Lock lock(_mutex);
+  return _inputs;
 }
 
-size_t Script::inputCount() const {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  return _state->inputCount;
-}
-
-bool Script::waitForInputs(size_t count, std::chrono::milliseconds limit) const {
-  std::unique_lock<std::mutex> lock(_state->mutex);
-  return _state->changed.wait_for(lock, limit, [&] { return _state->inputCount >= count; });
+bool Script::waitForInputs(size_t count) const {
+  Lock lock(_mutex);
+  return _changed.wait_for(lock, kWaitLimit, [&] { return _inputs.size() >= count; });
 }
 
 size_t Script::waiting() const {
-  std::lock_guard<std::mutex> lock(_state->mutex);
+  const Lock lock(_mutex);
   size_t sum = 0;
-  for (const ScriptedCodec* codec : _state->codecs) sum += codec->_line.size();
+  for (const ScriptedCodec* codec : _codecs) sum += codec->_line.size();
   return sum;
 }
 
 std::optional<mediaserver::PortPair> Script::configured() const {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  return _state->configured;
+  const Lock lock(_mutex);
+  return _configured;
 }
 
 size_t Script::liveCodecs() const {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  return _state->codecs.size();
+  const Lock lock(_mutex);
+  return _codecs.size();
 }
 
 size_t Script::starts() const {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  return _state->starts;
+  const Lock lock(_mutex);
+  return _starts;
 }
 
 size_t Script::stops() const {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  return _state->stops;
-}
-
-size_t Script::flushes() const {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  return _state->flushes;
+  const Lock lock(_mutex);
+  return _stops;
 }
 
 }  // namespace omxtest

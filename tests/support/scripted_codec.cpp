@@ -1,8 +1,9 @@
+#include "tests/support/scripted_codec.h"
+
 #include <algorithm>
 #include <cstring>
+#include <map>
 #include <utility>
-
-#include "tests/support/script_state.h"
 
 namespace omxtest {
 
@@ -18,43 +19,38 @@ using mediaserver::Sent;
 namespace {
 
 constexpr size_t kHeaderBytes = 2 * sizeof(OMX_U32);
-constexpr size_t kInputsKept = 1024;
 
-enum class Use { Parameter, Config };
-
-struct KnownIndex {
-  Use use;
-  uint32_t index;
-  size_t size;  // of its record, bytes
+// What a component understands whose clients are our wrappers, and the sizes of the records; port records
+// are the node's.
+const std::map<uint32_t, size_t> kParameters = {
+    {OMX_IndexParamVideoBitrate, sizeof(OMX_VIDEO_PARAM_BITRATETYPE)},
+    {OMX_IndexParamVideoAvc, sizeof(OMX_VIDEO_PARAM_AVCTYPE)},
+    {OMX_IndexParamVideoProfileLevelCurrent, sizeof(OMX_VIDEO_PARAM_PROFILELEVELTYPE)},
+    {0x7F000002, 24},  // input packing
+    {0x7F000010, 16},  // picture order
+};
+const std::map<uint32_t, size_t> kConfigs = {
+    {OMX_IndexConfigVideoBitrate, sizeof(OMX_VIDEO_CONFIG_BITRATETYPE)},
+    {OMX_IndexConfigVideoFramerate, sizeof(OMX_CONFIG_FRAMERATETYPE)},
+    {OMX_IndexConfigVideoIntraVOPRefresh, sizeof(OMX_CONFIG_INTRAREFRESHVOPTYPE)},
+    {OMX_IndexConfigVideoAVCIntraPeriod, sizeof(OMX_VIDEO_CONFIG_AVCINTRAPERIOD)},
+    {OMX_IndexConfigCommonRotate, sizeof(OMX_CONFIG_ROTATIONTYPE)},
+    {OMX_IndexConfigCommonOutputCrop, sizeof(OMX_CONFIG_RECTTYPE)},
+    {0x7F000007, 24},  // intra period
 };
 
-// What a component understands whose clients are our wrappers; port records are the node's.
-constexpr KnownIndex kKnown[] = {
-    {Use::Parameter, OMX_IndexParamVideoBitrate, sizeof(OMX_VIDEO_PARAM_BITRATETYPE)},
-    {Use::Parameter, OMX_IndexParamVideoAvc, sizeof(OMX_VIDEO_PARAM_AVCTYPE)},
-    {Use::Parameter, OMX_IndexParamVideoProfileLevelCurrent, sizeof(OMX_VIDEO_PARAM_PROFILELEVELTYPE)},
-    {Use::Parameter, 0x7F000002, 24},  // input packing
-    {Use::Parameter, 0x7F000010, 16},  // picture order
-    {Use::Config, OMX_IndexConfigVideoBitrate, sizeof(OMX_VIDEO_CONFIG_BITRATETYPE)},
-    {Use::Config, OMX_IndexConfigVideoFramerate, sizeof(OMX_CONFIG_FRAMERATETYPE)},
-    {Use::Config, OMX_IndexConfigVideoIntraVOPRefresh, sizeof(OMX_CONFIG_INTRAREFRESHVOPTYPE)},
-    {Use::Config, OMX_IndexConfigVideoAVCIntraPeriod, sizeof(OMX_VIDEO_CONFIG_AVCINTRAPERIOD)},
-    {Use::Config, OMX_IndexConfigCommonRotate, sizeof(OMX_CONFIG_ROTATIONTYPE)},
-    {Use::Config, OMX_IndexConfigCommonOutputCrop, sizeof(OMX_CONFIG_RECTTYPE)},
-    {Use::Config, 0x7F000007, 24},  // intra period
-};
-
-const KnownIndex* known(Access access, OMX_INDEXTYPE index) {
-  const Use use =
-      access == Access::GetParameter || access == Access::SetParameter ? Use::Parameter : Use::Config;
-  const auto* const found = std::find_if(std::begin(kKnown), std::end(kKnown), [&](const KnownIndex& entry) {
-    return entry.use == use && entry.index == static_cast<uint32_t>(index);
-  });
-  return found == std::end(kKnown) ? nullptr : found;
+// The size of a known record; 0 for others.
+size_t knownSize(Access access, OMX_INDEXTYPE index) {
+  const bool parameter = access == Access::GetParameter || access == Access::SetParameter;
+  const auto& known = parameter ? kParameters : kConfigs;
+  const auto found = known.find(static_cast<uint32_t>(index));
+  return found == known.end() ? 0 : found->second;
 }
 
-OMX_U32 wordAt(const void* record, size_t size, size_t offset) {
+// The word behind the header, which names the port, or one further on.
+OMX_U32 wordAt(const void* record, size_t size, size_t index) {
   OMX_U32 word = 0xFFFFFFFF;
+  const size_t offset = kHeaderBytes + index * sizeof(word);
   if (size >= offset + sizeof(word))
     std::memcpy(&word, static_cast<const uint8_t*>(record) + offset, sizeof(word));
   return word;
@@ -70,36 +66,31 @@ void fitPicture(PortDefinition* port) {
   port->nBufferSize = std::max(port->nBufferSize, stride * video.nSliceHeight * 3 / 2);
 }
 
-void takeOne(Budget* budget) {
-  if (budget->has_value()) --**budget;
-}
-
 }  // namespace
 
-ScriptedCodec::ScriptedCodec(std::shared_ptr<State> state, mediaserver::CodecHost& host)
-    : _state(std::move(state)), _host(host) {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  _state->codecs.insert(this);
+ScriptedCodec::ScriptedCodec(Script& script, mediaserver::CodecHost& host) : _script(script), _host(host) {
+  const Lock lock(_script._mutex);
+  _script._codecs.insert(this);
 }
 
 ScriptedCodec::~ScriptedCodec() {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  _state->codecs.erase(this);
+  const Lock lock(_script._mutex);
+  _script._codecs.erase(this);
 }
 
 PortPair ScriptedCodec::ports() const {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  return _state->ports;
+  const Lock lock(_script._mutex);
+  return _script._ports;
 }
 
 std::vector<mediaserver::VideoFormat> ScriptedCodec::formats(OMX_U32 port) const {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  return _state->formats.at(port);
+  const Lock lock(_script._mutex);
+  return _script._formats.at(port);
 }
 
 std::vector<mediaserver::Extension> ScriptedCodec::extensions() const {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  return _state->extensions;
+  const Lock lock(_script._mutex);
+  return _script._extensions;
 }
 
 OMX_ERRORTYPE ScriptedCodec::definePort(OMX_U32 port, const PortDefinition& wanted, PortPair& ports) {
@@ -117,33 +108,24 @@ OMX_ERRORTYPE ScriptedCodec::definePort(OMX_U32 port, const PortDefinition& want
   return OMX_ErrorNone;
 }
 
-mediaserver::Codec::Answer ScriptedCodec::refusal(Access access, OMX_INDEXTYPE index, const void* record,
-                                                  size_t size) const {
-  const auto entry = _state->refused.find({access, index});
-  if (entry == _state->refused.end()) return {};
-  const std::optional<OMX_U32> port = entry->second.port;
-  if (port.has_value() && *port != wordAt(record, size, kHeaderBytes)) return {};
-  return entry->second.error;
-}
-
 mediaserver::Codec::Answer ScriptedCodec::get(Access access, OMX_INDEXTYPE index, void* record,
                                               size_t size) const {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  if (const Answer refused = refusal(access, index, record, size)) return refused;
+  const Lock lock(_script._mutex);
+  const auto refused = _script._refused.find({access, index});
+  if (refused != _script._refused.end()) return refused->second;
   const std::vector<uint8_t>* source = nullptr;
-  const auto answer = _state->answers.find(index);
-  if (answer != _state->answers.end()) {
+  const auto answer = _script._answers.find(index);
+  if (answer != _script._answers.end()) {
     const bool otherPort = index == OMX_IndexParamPortDefinition &&
-                           wordAt(answer->second.data(), answer->second.size(), kHeaderBytes) !=
-                               wordAt(record, size, kHeaderBytes);
+                           wordAt(answer->second.data(), answer->second.size(), 0) != wordAt(record, size, 0);
     if (!otherPort) source = &answer->second;
   }
-  const KnownIndex* const entry = known(access, index);
-  if (source == nullptr && entry == nullptr && !_state->accepted.contains({access, index})) return {};
-  if (entry != nullptr && size < entry->size) return OMX_ErrorBadParameter;
+  const size_t known = knownSize(access, index);
+  if (source == nullptr && known == 0) return {};
+  if (size < known) return OMX_ErrorBadParameter;
   if (source == nullptr) {
-    const auto written = _state->records.find(index);
-    if (written != _state->records.end()) source = &written->second;
+    const auto written = _script._records.find(index);
+    if (written != _script._records.end()) source = &written->second;
   }
   auto* const bytes = static_cast<uint8_t*>(record);
   // Unanswered and unwritten: zeros behind the port, which is the client's.
@@ -154,59 +136,41 @@ mediaserver::Codec::Answer ScriptedCodec::get(Access access, OMX_INDEXTYPE index
 
 mediaserver::Codec::Answer ScriptedCodec::set(Access access, OMX_INDEXTYPE index, const void* record,
                                               size_t size) {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  if (const Answer refused = refusal(access, index, record, size)) return refused;
-  const KnownIndex* const entry = known(access, index);
-  const bool extension = std::any_of(_state->extensions.begin(), _state->extensions.end(),
-                                     [&](const mediaserver::Extension& e) { return e.index == index; });
-  if (entry != nullptr && size < entry->size) return OMX_ErrorBadParameter;
-  if (extension && wordAt(record, size, kHeaderBytes + sizeof(OMX_U32)) != OMX_FALSE) {
-    return OMX_ErrorUnsupportedSetting;
-  }
+  const Lock lock(_script._mutex);
+  const auto refused = _script._refused.find({access, index});
+  if (refused != _script._refused.end()) return refused->second;
+  const size_t known = knownSize(access, index);
+  const bool extension = std::any_of(_script._extensions.begin(), _script._extensions.end(),
+                                     [&](const mediaserver::Extension& each) { return each.index == index; });
+  if (size < known) return OMX_ErrorBadParameter;
+  if (extension && wordAt(record, size, 1) != OMX_FALSE) return OMX_ErrorUnsupportedSetting;
+  if (known == 0 && !extension) return {};
   const auto* const bytes = static_cast<const uint8_t*>(record);
-  _state->records[index].assign(bytes, bytes + size);
-  if (entry == nullptr && !extension && !_state->accepted.contains({access, index})) return {};
+  _script._records[index].assign(bytes, bytes + size);
   return OMX_ErrorNone;
 }
 
-mediaserver::Codec::Answer ScriptedCodec::getParameter(OMX_INDEXTYPE index, void* record, size_t size) {
-  return get(Access::GetParameter, index, record, size);
-}
-
-mediaserver::Codec::Answer ScriptedCodec::setParameter(OMX_INDEXTYPE index, const void* record, size_t size) {
-  return set(Access::SetParameter, index, record, size);
-}
-
-mediaserver::Codec::Answer ScriptedCodec::getConfig(OMX_INDEXTYPE index, void* record, size_t size) {
-  return get(Access::GetConfig, index, record, size);
-}
-
-mediaserver::Codec::Answer ScriptedCodec::setConfig(OMX_INDEXTYPE index, const void* record, size_t size) {
-  return set(Access::SetConfig, index, record, size);
-}
-
 void ScriptedCodec::configure(const PortPair& ports) {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  _state->configured = ports;
+  const Lock lock(_script._mutex);
+  _script._configured = ports;
 }
 
 OMX_ERRORTYPE ScriptedCodec::start() {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  if (_state->startFailure != OMX_ErrorNone) return _state->startFailure;
-  ++_state->starts;
+  const Lock lock(_script._mutex);
+  if (_script._startFailure != OMX_ErrorNone) return _script._startFailure;
+  ++_script._starts;
   return OMX_ErrorNone;
 }
 
 void ScriptedCodec::stop() {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  ++_state->stops;
+  const Lock lock(_script._mutex);
+  ++_script._stops;
   _line.clear();
   _draining = false;
 }
 
 void ScriptedCodec::flush(OMX_U32 port) {
-  std::lock_guard<std::mutex> lock(_state->mutex);
-  ++_state->flushes;
+  const Lock lock(_script._mutex);
   if (port == kInputPort) {
     _draining = false;
   } else {
@@ -215,23 +179,23 @@ void ScriptedCodec::flush(OMX_U32 port) {
 }
 
 void ScriptedCodec::takeTime(Lock& lock) {
-  if (_state->delay.count() == 0) return;
-  _state->changed.wait_for(lock, _state->delay, [this] { return _state->delay.count() == 0; });
+  if (_script._delay.count() == 0) return;
+  _script._changed.wait_for(lock, _script._delay, [this] { return _script._delay.count() == 0; });
 }
 
 Sent ScriptedCodec::send(const InputView& input) {
-  Lock lock(_state->mutex);
+  Lock lock(_script._mutex);
   takeTime(lock);
-  if (_state->inputBudget == Budget(0) || _line.size() >= _state->depth) return Sent::Busy;
-  takeOne(&_state->inputBudget);
+  if (_script._inputBudget == std::optional<size_t>(0) || _line.size() >= _script._depth) return Sent::Busy;
+  if (_script._inputBudget.has_value()) --*_script._inputBudget;
   Packet packet;
   packet.bytes.assign(input.data, input.data + input.length);
   packet.timestamp = input.timestamp;
   packet.flags = input.flags;
   _draining = false;
   std::vector<Packet> outputs;
-  if (_state->transform) {
-    const auto transform = _state->transform;
+  if (_script._transform) {
+    const auto transform = _script._transform;
     lock.unlock();
     outputs = transform(packet);
     lock.lock();
@@ -239,28 +203,25 @@ Sent ScriptedCodec::send(const InputView& input) {
     outputs.push_back(packet);
   }
   for (Packet& output : outputs) _line.emplace_back(std::move(output));
-  _state->inputs.push_back(std::move(packet));
-  if (_state->inputs.size() > kInputsKept) _state->inputs.pop_front();
-  ++_state->inputCount;
-  _state->changed.notify_all();
+  _script._inputs.push_back(std::move(packet));
+  _script._changed.notify_all();
   return Sent::Taken;
 }
 
 void ScriptedCodec::drain(OMX_TICKS) {
-  std::lock_guard<std::mutex> lock(_state->mutex);
+  const Lock lock(_script._mutex);
   _draining = true;
 }
 
 Received ScriptedCodec::receive(OutputSpace& output) {
-  Lock lock(_state->mutex);
-  if (_state->outputBudget == Budget(0)) return Received::Nothing;
+  Lock lock(_script._mutex);
+  if (_script._outputHeld) return Received::Nothing;
   if (_line.empty()) return std::exchange(_draining, false) ? Received::Drained : Received::Nothing;
   takeTime(lock);
   if (_line.empty()) return Received::Nothing;
   if (std::holds_alternative<Announcement>(_line.front())) return Received::NewGeometry;
   const Packet packet = std::get<Packet>(std::move(_line.front()));
   _line.pop_front();
-  takeOne(&_state->outputBudget);
   const size_t offset = std::min<size_t>(packet.offset, output.capacity);
   const size_t length = std::min(packet.bytes.size(), output.capacity - offset);
   if (length > 0) std::memcpy(output.data + offset, packet.bytes.data(), length);
@@ -273,7 +234,7 @@ Received ScriptedCodec::receive(OutputSpace& output) {
 }
 
 OMX_U32 ScriptedCodec::geometry(PortDefinition& output) {
-  std::unique_lock<std::mutex> lock(_state->mutex);
+  Lock lock(_script._mutex);
   const Announcement announcement = std::get<Announcement>(std::move(_line.front()));
   _line.pop_front();
   lock.unlock();

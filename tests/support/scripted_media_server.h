@@ -38,8 +38,6 @@ class ScriptedMediaServer {
 
   // Says what has not been freed; empty when everything was.
   std::string leaks() const;
-  // Leaks of this test are on purpose.
-  void allowLeaks() { _leaksAllowed = true; }
 
  private:
   const std::unique_ptr<Script> _decoder;
@@ -47,7 +45,6 @@ class ScriptedMediaServer {
   android::sp<mediaserver::OmxServer> _server;
   android::sp<RecordingOmx> _omx;
   const bool _loadedOnDemand;  // as it was before
-  bool _leaksAllowed = false;
 };
 
 }  // namespace omxtest
