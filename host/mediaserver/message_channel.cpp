@@ -83,7 +83,7 @@ void MessageChannel::shut() {
 }
 
 void MessageChannel::deliver(const MessageChannel* channel, std::shared_ptr<Queue> queue,
-                             const android::sp<android::IOMXObserver>& observer) {
+                             const android::wp<android::IOMXObserver>& observer) {
   tDelivering = channel;
   std::unique_lock<std::mutex> lock(queue->mutex);
   for (;;) {
@@ -92,7 +92,11 @@ void MessageChannel::deliver(const MessageChannel* channel, std::shared_ptr<Queu
     const android::omx_message message = queue->messages.front();
     queue->messages.pop_front();
     lock.unlock();
-    observer->onMessage(message);
+    {
+      // It may be the last one that holds the observer by then, and the end of the block that of the channel.
+      const android::sp<android::IOMXObserver> client = observer.promote();
+      if (client != nullptr) client->onMessage(message);
+    }
     lock.lock();
   }
 }

@@ -1,7 +1,7 @@
 #pragma once
 // One observer's messages: a queue and the thread that delivers it, strictly in the order of post.
 // post may be called under the caller's locks; the observer is called without any lock of ours and never
-// on the poster's thread. The channel keeps the observer alive.
+// on the poster's thread. The channel does not keep the observer alive, except while it is called.
 
 #include <memory>
 #include <mutex>
@@ -32,10 +32,10 @@ class MessageChannel {
  private:
   struct Queue;
   static void deliver(const MessageChannel* channel, std::shared_ptr<Queue> queue,
-                      const android::sp<android::IOMXObserver>& observer);
+                      const android::wp<android::IOMXObserver>& observer);
   void shut();
 
-  const android::sp<android::IOMXObserver> _observer;
+  const android::wp<android::IOMXObserver> _observer;
   std::mutex _lifecycle;  // guards _thread; held while it is joined
   std::thread _thread;
   std::mutex _mutex;              // guards _queue

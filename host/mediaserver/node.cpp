@@ -53,14 +53,15 @@ void completeDefinition(OMX_U32 port, PortDefinition* definition) {
 }  // namespace
 
 std::shared_ptr<Node> Node::create(android::IOMX::node_id id, const Component& component,
-                                   const android::sp<android::IOMXObserver>& observer) {
-  std::shared_ptr<Node> node(new Node(id, component, observer));
+                                   const android::sp<android::IOMXObserver>& observer,
+                                   std::chrono::milliseconds readingTime) {
+  std::shared_ptr<Node> node(new Node(id, component, observer, readingTime));
   return node->start() ? node : nullptr;
 }
 
 Node::Node(android::IOMX::node_id id, const Component& component,
-           const android::sp<android::IOMXObserver>& observer)
-    : _id(id), _component(component), _channel(observer) {}
+           const android::sp<android::IOMXObserver>& observer, std::chrono::milliseconds readingTime)
+    : _id(id), _component(component), _readingTime(readingTime), _channel(observer) {}
 
 bool Node::start() {
   _codec = _component.factory(*this);

@@ -20,12 +20,14 @@
 // _configureDue     worker, settle                  worker          _mutex
 // _signalled        all                             worker          _mutex
 // _stopping         shutdown                        all             _mutex
+// _lastExchange     worker, fillBuffer              worker          _mutex
 // _started, _draining, _drainTime,  worker          worker          one thread
-// _patience, _awaitsReader
+// _awaitsReader
 // _worker           create, shutdown                shutdown        both called once, in this order
 // _codec            create                          all             fixed, guards itself
 // _channel          create                          all             fixed, guards itself, takes no other lock
-// _id, _component   constructor                     all             constant
+// _id, _component,  constructor                     all             constant
+// _readingTime
 
 #include <array>
 #include <chrono>
@@ -34,7 +36,6 @@
 #include <deque>
 #include <memory>
 #include <mutex>
-#include <optional>
 #include <thread>
 #include <vector>
 
@@ -53,9 +54,12 @@ class Node final : private CodecHost {
  public:
   using BufferId = android::IOMX::buffer_id;
 
-  // A node in Loaded. Null when the codec or the threads cannot be had.
+  // A node in Loaded. Null when the codec or the threads cannot be had. While the client still reads output
+  // that it has been given, no new settings are told; one that for `readingTime` has neither got nor sent
+  // back any is taken to keep what it has.
   static std::shared_ptr<Node> create(android::IOMX::node_id id, const Component& component,
-                                      const android::sp<android::IOMXObserver>& observer);
+                                      const android::sp<android::IOMXObserver>& observer,
+                                      std::chrono::milliseconds readingTime);
   ~Node() override;
   Node(const Node&) = delete;
   Node& operator=(const Node&) = delete;
@@ -93,7 +97,7 @@ class Node final : private CodecHost {
   enum class Settings { Agreed, Due, Announced, Reallocating };
 
   Node(android::IOMX::node_id id, const Component& component,
-       const android::sp<android::IOMXObserver>& observer);
+       const android::sp<android::IOMXObserver>& observer, std::chrono::milliseconds readingTime);
   bool start();
 
   // CodecHost.
@@ -153,6 +157,7 @@ class Node final : private CodecHost {
 
   const android::IOMX::node_id _id;
   const Component _component;
+  const std::chrono::milliseconds _readingTime;
   MessageChannel _channel;
   std::unique_ptr<Codec> _codec;
   std::thread _worker;
@@ -171,13 +176,13 @@ class Node final : private CodecHost {
   bool _configureDue = false;
   bool _signalled = false;
   bool _stopping = false;
+  // When an output buffer last went to the client or came from it.
+  std::chrono::steady_clock::time_point _lastExchange;
 
   bool _started = false;
   bool _draining = false;
   OMX_TICKS _drainTime = 0;
-  // Until when new settings wait for a client that still reads older output; whether they do in this round.
-  std::optional<std::chrono::steady_clock::time_point> _patience;
-  bool _awaitsReader = false;
+  bool _awaitsReader = false;  // in this round new settings wait for a client that reads older output
 };
 
 }  // namespace mediaserver

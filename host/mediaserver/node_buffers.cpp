@@ -61,6 +61,7 @@ OMX_ERRORTYPE Node::freeBuffer(OMX_U32 index, BufferId id) {
   if (buffer == nullptr) return OMX_ErrorBadParameter;
   if (!expectsFree(port)) error(OMX_ErrorPortUnpopulated);
   settle();
+  signal();  // it may have been the last one that somebody was still reading
   return OMX_ErrorNone;
 }
 
@@ -87,6 +88,7 @@ OMX_ERRORTYPE Node::fillBuffer(BufferId id) {
   buffer->header.nOffset = 0;
   buffer->header.nFlags = 0;
   _ports[kOutputPort].append(buffer);
+  _lastExchange = std::chrono::steady_clock::now();
   signal();
   return OMX_ErrorNone;
 }

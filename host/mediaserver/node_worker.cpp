@@ -19,7 +19,7 @@ void Node::work() {
 void Node::pause(Lock& lock) {
   const auto woken = [this] { return _signalled || _stopping; };
   if (_awaitsReader) {
-    _wake.wait_until(lock, *_patience, woken);
+    _wake.wait_until(lock, _lastExchange + _readingTime, woken);
   } else {
     _wake.wait(lock, woken);
   }
@@ -89,21 +89,14 @@ bool Node::receiveOutput(Lock& lock) {
 }
 
 // Clients look at the port's definition for each picture, when they come to it. It should describe that
-// picture and not the next, so it changes when the client has read, and sent back, what it got before. One
-// that keeps its buffers is not waited for forever. Compressed output describes itself.
+// picture and not the next, so it changes when the client has read what it got before: when it has sent that
+// back, or freed it. Only time tells one that reads from one that keeps a picture until the next one comes,
+// or sends nothing back any more because it has sent its end mark. Compressed output describes itself.
 bool Node::readersAreDone() {
-  constexpr std::chrono::milliseconds kLongestReading{500};
   const Port& port = _ports[kOutputPort];
-  const auto now = std::chrono::steady_clock::now();
-  if (!port.compressed() && port.unread()) {
-    if (!_patience) _patience = now + kLongestReading;
-    if (now < *_patience) {
-      _awaitsReader = true;
-      return false;
-    }
-  }
-  _patience.reset();
-  return true;
+  _awaitsReader =
+      !port.compressed() && port.unread() && std::chrono::steady_clock::now() < _lastExchange + _readingTime;
+  return !_awaitsReader;
 }
 
 bool Node::changeGeometry(Lock& lock) {
@@ -129,7 +122,7 @@ void Node::finishOutput(const std::shared_ptr<Buffer>& buffer, const OutputSpace
   buffer->header.nFlags = space.flags;
   buffer->header.nTimeStamp = space.timestamp;
   buffer->unread = space.length > 0;
-  _patience.reset();
+  _lastExchange = std::chrono::steady_clock::now();
   if ((space.flags & OMX_BUFFERFLAG_EOS) != 0) {
     _draining = false;
     // Before the buffer, which clients may take for the last they hear.

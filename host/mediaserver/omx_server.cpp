@@ -4,6 +4,7 @@
 
 #include <utility>
 
+#include <android/log.h>
 #include <media/stagefright/MediaErrors.h>
 
 #include "host/mediaserver/buffer.h"
@@ -41,10 +42,11 @@ static_assert(sizeof(StoreMetaDataParams) == 16);
 
 }  // namespace
 
-OmxServer::OmxServer(std::vector<Component> components) : _components(std::move(components)) {}
+OmxServer::OmxServer(std::vector<Component> components, std::chrono::milliseconds readingTime)
+    : _components(std::move(components)), _readingTime(readingTime) {}
 
 OmxServer::~OmxServer() {
-  for (const auto& [id, node] : _nodes) node->shutdown();
+  for (const auto& [id, entry] : _nodes) entry.node->shutdown();
 }
 
 size_t OmxServer::nodeCount() const {
@@ -55,7 +57,7 @@ size_t OmxServer::nodeCount() const {
 std::shared_ptr<Node> OmxServer::find(node_id node) const {
   std::lock_guard<std::mutex> lock(_mutex);
   const auto entry = _nodes.find(node);
-  return entry == _nodes.end() ? nullptr : entry->second;
+  return entry == _nodes.end() ? nullptr : entry->second.node;
 }
 
 bool OmxServer::livesLocally(pid_t pid) {
@@ -85,18 +87,21 @@ status_t OmxServer::allocateNode(const char* name, const sp<android::IOMXObserve
       std::lock_guard<std::mutex> lock(_mutex);
       id = reinterpret_cast<node_id>(++_lastId);
     }
-    std::shared_ptr<Node> created = Node::create(id, component, observer);
+    std::shared_ptr<Node> created = Node::create(id, component, observer, _readingTime);
     if (created == nullptr) return kFailed;
     *node = id;
+    // The caller holds the observer, so nobody is told before the table knows the node.
+    const sp<android::IBinder> client = observer->asBinder();
+    client->linkToDeath(this, id);
     std::lock_guard<std::mutex> lock(_mutex);
-    _nodes.emplace(id, std::move(created));
+    _nodes.emplace(id, Entry{std::move(created), client});
     return android::OK;
   }
   return kFailed;
 }
 
 status_t OmxServer::freeNode(node_id node) {
-  std::shared_ptr<Node> freed;
+  Entry freed;
   {
     std::lock_guard<std::mutex> lock(_mutex);
     const auto entry = _nodes.find(node);
@@ -104,8 +109,26 @@ status_t OmxServer::freeNode(node_id node) {
     freed = std::move(entry->second);
     _nodes.erase(entry);
   }
-  freed->shutdown();
+  if (const sp<android::IBinder> client = freed.client.promote(); client != nullptr) {
+    client->unlinkToDeath(this, node);
+  }
+  freed.node->shutdown();
   return android::OK;
+}
+
+void OmxServer::binderDied(const android::wp<android::IBinder>& who) {
+  std::vector<node_id> left;
+  {
+    std::lock_guard<std::mutex> lock(_mutex);
+    for (const auto& [id, entry] : _nodes) {
+      if (entry.client == who) left.push_back(id);
+    }
+  }
+  for (const node_id node : left) {
+    if (freeNode(node) != android::OK) continue;
+    __android_log_print(ANDROID_LOG_WARN, "omxmediaserver", "node %zu is freed: its client has gone away",
+                        reinterpret_cast<size_t>(node));
+  }
 }
 
 status_t OmxServer::sendCommand(node_id node, OMX_COMMANDTYPE cmd, OMX_S32 param) {

@@ -3,8 +3,10 @@
 // id, checks arguments, and turns the node's IL results into statuses.
 // Any thread may call it, several at once. A call keeps its node alive until it returns, also when the
 // node is freed meanwhile. No lock is held while a node or a client is called. Ids are numbers: one that is
-// unknown or out of date gives UNKNOWN_ERROR, as every misuse does.
+// unknown or out of date gives UNKNOWN_ERROR, as every misuse does. A client whose observer dies has gone
+// away without freeing its nodes, and they are freed for it.
 
+#include <chrono>
 #include <cstdint>
 #include <map>
 #include <memory>
@@ -18,10 +20,11 @@
 
 namespace mediaserver {
 
-class OmxServer : public android::BnOMX {
+class OmxServer : public android::BnOMX, public android::IBinder::DeathRecipient {
  public:
-  // Clients see the components in this order.
-  explicit OmxServer(std::vector<Component> components);
+  // Clients see the components in this order. `readingTime`: see Node::create.
+  explicit OmxServer(std::vector<Component> components,
+                     std::chrono::milliseconds readingTime = std::chrono::milliseconds(500));
   ~OmxServer() override;
 
   // How many nodes are allocated.
@@ -60,16 +63,23 @@ class OmxServer : public android::BnOMX {
                                 OMX_U32 flags, OMX_TICKS timestamp) override;
   android::status_t getExtensionIndex(node_id node, const char* parameter_name,
                                       OMX_INDEXTYPE* index) override;
+  void binderDied(const android::wp<android::IBinder>& who) override;
 
  private:
+  struct Entry {
+    std::shared_ptr<Node> node;
+    android::wp<android::IBinder> client;
+  };
+
   std::shared_ptr<Node> find(node_id node) const;
   android::status_t addBuffer(node_id node, OMX_U32 port, const std::shared_ptr<Buffer>& buffer,
                               buffer_id* id);
 
   const std::vector<Component> _components;
+  const std::chrono::milliseconds _readingTime;
   mutable std::mutex _mutex;  // guards the two below
   uintptr_t _lastId = 0;
-  std::map<node_id, std::shared_ptr<Node>> _nodes;
+  std::map<node_id, Entry> _nodes;
 };
 
 }  // namespace mediaserver

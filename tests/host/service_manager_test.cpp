@@ -7,7 +7,6 @@
 #include <vector>
 
 #include <binder/IServiceManager.h>
-#include <binder/ProcessState.h>
 #include <media/IMediaPlayerService.h>
 #include <media/IOMX.h>
 #include <omxhost/log.h>
@@ -48,6 +47,32 @@ TEST(Interface, IsReachedThroughItsBinderAndThroughNoOther) {
   EXPECT_EQ(observer->getStrongCount(), 2) << "binder and interface are one object with one count";
 }
 
+TEST(Interface, TellsThoseWhoAskedOfItsDeathOnce) {
+  class Recipient : public IBinder::DeathRecipient {
+   public:
+    void binderDied(const android::wp<IBinder>& who) override {
+      EXPECT_EQ(who.promote(), nullptr);
+      dead.push_back(who);
+    }
+    std::vector<android::wp<IBinder>> dead;
+  };
+  const sp<Recipient> asked = new Recipient();
+  const sp<Recipient> withdrew = new Recipient();
+  sp<Recipient> gone = new Recipient();
+  sp<IBinder> binder = (new Observer())->asBinder();
+  const android::wp<IBinder> identity = binder;
+  for (const sp<Recipient>& each : {asked, withdrew, gone}) EXPECT_EQ(binder->linkToDeath(each), android::OK);
+  gone.clear();
+  EXPECT_EQ(binder->unlinkToDeath(withdrew, &binder), android::NAME_NOT_FOUND) << "another cookie";
+  EXPECT_EQ(binder->unlinkToDeath(withdrew), android::OK);
+  EXPECT_EQ(binder->unlinkToDeath(withdrew), android::NAME_NOT_FOUND);
+  EXPECT_EQ(binder->linkToDeath(nullptr), android::BAD_VALUE);
+  EXPECT_TRUE(asked->dead.empty());
+  binder.clear();
+  EXPECT_EQ(asked->dead, std::vector<android::wp<IBinder>>{identity});
+  EXPECT_TRUE(withdrew->dead.empty());
+}
+
 TEST(ServiceManager, FindsReplacesListsAndRemoves) {
   const sp<IBinder> first = (new PlayerService())->asBinder();
   const sp<IBinder> second = (new PlayerService())->asBinder();
@@ -80,15 +105,6 @@ TEST(ServiceManager, FindsReplacesListsAndRemoves) {
   EXPECT_EQ(typed, nullptr);
   EXPECT_EQ(first->getStrongCount(), 1);
   EXPECT_EQ(second->getStrongCount(), 1);
-}
-
-TEST(ServiceManager, ServicesMayLookServicesUpWhileTheyGo) {
-  class Service : public android::BBinder {
-   protected:
-    ~Service() override { EXPECT_EQ(lookUp("test.going"), nullptr); }
-  };
-  defaultServiceManager()->addService(String16("test.going"), new Service());
-  EXPECT_TRUE(omxhost::removeService(String16("test.going")));
 }
 
 TEST(ServiceManager, LoadsTheMediaServerOnceForAllWhoAskTogether) {
@@ -147,18 +163,6 @@ TEST(ServiceManager, WarnsOnceWhereThereIsNoMediaServer) {
         EXPECT_EQ(lookUp("media.player"), nullptr);
       },
       testing::ContainsRegex("^W/omxhost: no media server: [^\n]*omxhost_media_server_start[^\n]*\n$"));
-}
-
-TEST(ProcessState, NotesThatTheThreadPoolWasStarted) {
-  EXPECT_IN_NEW_PROCESS(
-      [] {
-        EXPECT_FALSE(omxhost::isThreadPoolStarted());
-        EXPECT_EQ(android::ProcessState::self(), android::ProcessState::self());
-        android::ProcessState::self()->startThreadPool();
-        android::ProcessState::self()->startThreadPool();
-        EXPECT_TRUE(omxhost::isThreadPoolStarted());
-      },
-      testing::Eq(""));
 }
 
 }  // namespace

@@ -6,7 +6,6 @@
 #include <type_traits>
 #include <vector>
 
-#include <utils/RefBase.h>
 #include <utils/Vector.h>
 
 namespace {
@@ -76,6 +75,10 @@ TEST(Vector, FollowsAPlainModelThroughRandomOperations) {
         case 2:
           EXPECT_EQ(vector.insertAt(Tracked(step), at, count), static_cast<ssize_t>(at));
           model.insert(where, count, step);
+          if (model.empty()) break;
+          // An element of its own, which may move away while it is being copied.
+          vector.insertAt(vector[at / 2], at, count);
+          model.insert(model.begin() + static_cast<ptrdiff_t>(at), count, int{model[at / 2]});
           break;
         case 3:
           if (at + count > model.size()) {
@@ -118,23 +121,6 @@ TEST(Vector, FollowsAPlainModelThroughRandomOperations) {
   EXPECT_TRUE(Tracked::alive().empty());
 }
 
-TEST(Vector, TakesElementsOfItsOwn) {
-  Vector<Tracked> full = counting(4);
-  ASSERT_EQ(full.capacity(), full.size()) << "the next add must grow";
-  full.add(full[1]);
-  EXPECT_EQ(valuesOf(full), (std::vector<int>{0, 1, 2, 3, 1}));
-
-  Vector<Tracked> roomy = counting(3);
-  roomy.setCapacity(20);
-  roomy.insertAt(roomy[2], 0, 2);  // The element moves away while it is being copied.
-  roomy.insertAt(roomy[4], 5);
-  EXPECT_EQ(valuesOf(roomy), (std::vector<int>{2, 2, 0, 1, 2, 2}));
-
-  Vector<Tracked> grown = counting(4);
-  grown.insertAt(grown[3], 1, 3);
-  EXPECT_EQ(valuesOf(grown), (std::vector<int>{0, 3, 3, 3, 1, 2, 3}));
-}
-
 TEST(Vector, AddressesStayWhileNothingIsAddedAndWithinReservedCapacity) {
   Vector<Tracked> vector;
   ASSERT_EQ(vector.setCapacity(100), 100);
@@ -167,29 +153,6 @@ TEST(Vector, RefusesWhatItCannotHoldAndStaysAsItWas) {
   EXPECT_EQ(vector.removeItemsAt(1, SIZE_MAX), android::BAD_VALUE);
   EXPECT_EQ(valuesOf(vector), (std::vector<int>{0, 1, 2}));
   EXPECT_EQ(&vector[0], first);
-}
-
-TEST(Vector, EndsAndIterators) {
-  Vector<Tracked> vector = counting(3);
-  EXPECT_EQ(vector.top().get(), 2);
-  vector.push_front(Tracked(9));
-  vector.push();
-  vector.pop();
-  EXPECT_EQ(vector.erase(vector.begin() + 1), vector.begin() + 1);
-  EXPECT_EQ(valuesOf(vector), (std::vector<int>{9, 1, 2}));
-}
-
-TEST(Vector, CarriesReferencesThroughEveryMove) {
-  class Object : public android::RefBase {};
-  const android::sp<Object> object = new Object();
-  {
-    Vector<android::sp<Object>> vector;
-    for (int i = 0; i < 50; ++i) vector.insertAt(object, vector.size() / 2);
-    EXPECT_EQ(object->getStrongCount(), 51);
-    vector.removeItemsAt(10, 30);
-    EXPECT_EQ(object->getStrongCount(), 21);
-  }
-  EXPECT_EQ(object->getStrongCount(), 1);
 }
 
 }  // namespace

@@ -3,6 +3,8 @@
 #include <atomic>
 #include <thread>
 
+#include <omxhost/log.h>
+
 #include "tests/mediaserver/node_fixture.h"
 #include "tests/support/eventually.h"
 
@@ -10,10 +12,20 @@ namespace omxtest {
 namespace {
 
 using android::omx_message;
-using mediaserver::kInputPort;
-using mediaserver::kOutputPort;
-
 constexpr auto kAllPorts = static_cast<OMX_S32>(OMX_ALL);
+
+// Counts what arrives, and can stop a delivery.
+class SlowObserver : public android::BnOMXObserver {
+ public:
+  void onMessage(const omx_message&) override {
+    ++begun;
+    EXPECT_TRUE(eventually([this] { return goOn.load(); }));
+    ++ended;
+  }
+  std::atomic<int> begun{0};
+  std::atomic<int> ended{0};
+  std::atomic<bool> goOn{false};
+};
 
 class Lifetime : public NodeTest {
  protected:
@@ -22,7 +34,7 @@ class Lifetime : public NodeTest {
 
   // Every call with these ids and otherwise sound arguments: none may succeed.
   void expectAllRefused(NodeId node, BufferId buffer) {
-    std::vector<uint8_t> record(sizeof(mediaserver::PortDefinition));
+    std::vector<uint8_t> record(sizeof(PortDefinition));
     OMX_STATETYPE state{};
     OMX_INDEXTYPE index{};
     OMX_U32 usage = 0;
@@ -92,24 +104,24 @@ TEST_F(Lifetime, WrongIdsAreRefusedByEveryCall) {
   const NodeId freed = node->node();
   EXPECT_EQ(node->free(), android::OK);
   expectAllRefused(freed, buffer);
-}
 
-TEST_F(Lifetime, NullArgumentsAreRefused) {
-  const auto node = client();
-  node->command(OMX_CommandStateSet, OMX_StateIdle);
-  BufferId buffer = nullptr;
+  // Nothing where something is needed.
+  other->executingToIdle();
+  const NodeId id = other->node();
+  BufferId given = nullptr;
   void* data = nullptr;
-  const android::sp<android::MemoryDealer> dealer = new android::MemoryDealer(64, "test");
-  const android::sp<android::IMemory> block = dealer->allocate(64);
-  EXPECT_EQ(server->getState(node->node(), nullptr), kUnknownError);
-  EXPECT_EQ(server->useBuffer(node->node(), 0, nullptr, &buffer), kUnknownError);
-  EXPECT_EQ(server->useBuffer(node->node(), 0, block, nullptr), kUnknownError);
-  EXPECT_EQ(server->allocateBufferWithBackup(node->node(), 0, nullptr, &buffer), kUnknownError);
-  EXPECT_EQ(server->allocateBuffer(node->node(), 0, 64, nullptr, &data), kUnknownError);
-  EXPECT_EQ(server->allocateBuffer(node->node(), 0, 64, &buffer, nullptr), kUnknownError);
-  EXPECT_EQ(server->allocateBuffer(node->node(), 0, SIZE_MAX, &buffer, &data), kUnknownError);
-  EXPECT_EQ(server->useBuffer(node->node(), 2, block, &buffer), kUnknownError);
-  EXPECT_EQ(server->getExtensionIndex(node->node(), nullptr, nullptr), kUnknownError);
+  const android::sp<android::IMemory> block = (new android::MemoryDealer(64, "test"))->allocate(64);
+  EXPECT_EQ(server->getState(id, nullptr), kUnknownError);
+  EXPECT_EQ(server->getExtensionIndex(id, nullptr, nullptr), kUnknownError);
+  server->sendCommand(id, OMX_CommandPortDisable, kInputPort);
+  other->freeBuffers(kInputPort);
+  EXPECT_EQ(server->useBuffer(id, kInputPort, nullptr, &given), kUnknownError);
+  EXPECT_EQ(server->useBuffer(id, kInputPort, block, nullptr), kUnknownError);
+  EXPECT_EQ(server->useBuffer(id, kPortCount, block, &given), kUnknownError);
+  EXPECT_EQ(server->allocateBufferWithBackup(id, kInputPort, nullptr, &given), kUnknownError);
+  EXPECT_EQ(server->allocateBuffer(id, kInputPort, 64, nullptr, &data), kUnknownError);
+  EXPECT_EQ(server->allocateBuffer(id, kInputPort, 64, &given, nullptr), kUnknownError);
+  EXPECT_EQ(server->allocateBuffer(id, kInputPort, SIZE_MAX, &given, &data), kUnknownError);
 }
 
 TEST_F(Lifetime, FreeingWorksFromEveryStateWithBuffersOnEitherSide) {
@@ -132,18 +144,43 @@ TEST_F(Lifetime, FreeingWorksFromEveryStateWithBuffersOnEitherSide) {
   halfWay->give(kInputPort);
 }
 
-// Counts what arrives, and can stop a delivery.
-class SlowObserver : public android::BnOMXObserver {
- public:
-  void onMessage(const omx_message&) override {
-    ++begun;
-    EXPECT_TRUE(eventually([this] { return goOn.load(); }));
-    ++ended;
+// A client that ends without a word: its nodes go, whatever they were doing, and nobody else's.
+TEST_F(Lifetime, NodesGoWithTheClientThatLetsGoOfItsObserver) {
+  const auto other = running(kEncoder);
+  const omxhost::LogCapture log;
+  for (const bool inDelivery : {false, true}) {
+    android::sp<SlowObserver> observer = new SlowObserver;
+    NodeId nodes[2] = {};
+    for (NodeId& node : nodes) {
+      ASSERT_EQ(server->allocateNode(kDecoder, observer, &node), android::OK);
+      server->sendCommand(node, OMX_CommandStateSet, OMX_StateIdle);
+      for (OMX_U32 i = 0; i < 2 * kPortCount; ++i) {
+        BufferId id = nullptr;
+        void* data = nullptr;
+        EXPECT_EQ(server->allocateBuffer(node, i % kPortCount, 64, &id, &data), android::OK);
+      }
+      server->sendCommand(node, OMX_CommandStateSet, OMX_StateExecuting);
+    }
+    ASSERT_TRUE(eventually([&] { return observer->begun == 2; }));
+    if (!inDelivery) {
+      observer->goOn = true;
+      ASSERT_TRUE(eventually([&] { return observer->ended == 4; }));
+    }
+    EXPECT_EQ(server->nodeCount(), 3u);
+    // In the second round the deliveries are the last that hold it, and one of them lets go last.
+    SlowObserver* const delivering = observer.get();  // alive until it may go on
+    observer.clear();
+    if (inDelivery) delivering->goOn = true;
+    const size_t freed = inDelivery ? 4 : 2;
+    EXPECT_TRUE(eventually([&] { return log.count("its client has gone away") == freed; }));
+    EXPECT_EQ(server->nodeCount(), 1u);
+    EXPECT_TRUE(eventually([&] { return decoder.liveCodecs() == 0; }));
+    for (const NodeId node : nodes) EXPECT_EQ(server->freeNode(node), kUnknownError);
   }
-  std::atomic<int> begun{0};
-  std::atomic<int> ended{0};
-  std::atomic<bool> goOn{false};
-};
+  EXPECT_EQ(decoder.starts(), decoder.stops());
+  other->empty(0, "unharmed");
+  other->expect(fillBufferDone());
+}
 
 TEST_F(Lifetime, NothingIsDeliveredOnceFreeNodeHasReturned) {
   const android::sp<SlowObserver> observer = new SlowObserver;
@@ -184,20 +221,6 @@ TEST_F(Lifetime, ANodeCanBeFreedFromInsideItsOwnDelivery) {
   EXPECT_TRUE(eventually([&] { return observer->done.load(); }));
   EXPECT_EQ(server->nodeCount(), 0u);
   EXPECT_TRUE(eventually([&] { return observer->getStrongCount() == 1; }));
-}
-
-TEST_F(Lifetime, ANodeIsFreedOnceHoweverManyTry) {
-  for (int round = 0; round < 20; ++round) {
-    const auto node = running();
-    const NodeId id = node->node();
-    std::atomic<int> freed{0};
-    std::vector<std::thread> threads;
-    for (int i = 0; i < 4; ++i) {
-      threads.emplace_back([&] { freed += server->freeNode(id) == android::OK ? 1 : 0; });
-    }
-    for (std::thread& thread : threads) thread.join();
-    EXPECT_EQ(freed, 1);
-  }
 }
 
 TEST_F(Lifetime, AServerThatGoesAwayEndsItsNodes) {

@@ -5,15 +5,28 @@
 
 #include <memory>
 
+#include <media/stagefright/MediaErrors.h>
+
 #include "host/mediaserver/omx_server.h"
 #include "tests/support/omx_client.h"
 #include "tests/support/script.h"
 
 namespace omxtest {
 
+using mediaserver::kInputPort;
+using mediaserver::kOutputPort;
+using mediaserver::kPortCount;
+using mediaserver::PortDefinition;
+using Words = std::vector<std::string>;
+
 inline constexpr const char* kDecoder = "decoder";
 inline constexpr const char* kEncoder = "encoder";
 inline constexpr auto kUnknownError = static_cast<android::status_t>(android::UNKNOWN_ERROR);
+inline constexpr auto kUnsupported = static_cast<android::status_t>(android::ERROR_UNSUPPORTED);
+
+inline android::status_t okIf(bool expected) {
+  return expected ? android::status_t{android::OK} : kUnknownError;
+}
 
 inline Match errorIs(OMX_ERRORTYPE code) {
   return [=](const android::omx_message& message) {
@@ -25,17 +38,23 @@ class NodeTest : public ::testing::Test {
  protected:
   NodeTest() {
     // Few and small buffers: what counts is who has them.
-    for (OMX_U32 port = 0; port < mediaserver::kPortCount; ++port) {
+    for (OMX_U32 port = 0; port < kPortCount; ++port) {
       for (Script* script : {&decoder, &encoder}) {
-        script->editPort(port, [](mediaserver::PortDefinition& definition) {
+        script->editPort(port, [](PortDefinition& definition) {
           definition.nBufferCountActual = 2;
           definition.nBufferSize = 64;
         });
       }
     }
-    server = new mediaserver::OmxServer({decoder.component(kDecoder), encoder.component(kEncoder)});
+    serve(std::chrono::hours(1));
   }
   ~NodeTest() override { EXPECT_EQ(server->nodeCount(), 0u); }
+
+  // Another server, which waits that long for clients that keep their output. As a rule for ever.
+  void serve(std::chrono::milliseconds readingTime) {
+    server =
+        new mediaserver::OmxServer({decoder.component(kDecoder), encoder.component(kEncoder)}, readingTime);
+  }
 
   std::unique_ptr<OmxClient> client(const char* component = kDecoder) {
     return std::make_unique<OmxClient>(server, component);

@@ -14,7 +14,6 @@ namespace omxtest {
 namespace {
 
 using android::omx_message;
-using mediaserver::kPortCount;
 
 // Keeps account of one node's buffers: what the node was given must balance with what it gives back.
 class AccountingObserver : public android::BnOMXObserver {
@@ -118,7 +117,7 @@ class RandomCalls : public NodeTest {
         server->freeBuffer(node, port, ids->any(pick(1000)));
         break;
       case 7: {
-        mediaserver::PortDefinition definition{};
+        PortDefinition definition{};
         definition.nPortIndex = port;
         server->getParameter(node, OMX_IndexParamPortDefinition, &definition, sizeof(definition));
         definition.nBufferCountActual = 1 + pick(3);
@@ -177,31 +176,6 @@ TEST_F(RandomCalls, FromSeveralThreadsKeepTheBooksInOrder) {
     EXPECT_EQ(decoder.starts(), decoder.stops());
   }
   EXPECT_GT(decoder.inputCount(), 0u) << "chance led to refusals only";
-}
-
-TEST_F(RandomCalls, ManyClientsAtOnceGetTheirOwnBytesInOrder) {
-  constexpr int kClients = 6;
-  constexpr int kPictures = 60;
-  std::vector<std::thread> threads;
-  for (int number = 0; number < kClients; ++number) {
-    threads.emplace_back([&, number] {
-      const auto node = running(number % 2 == 0 ? kDecoder : kEncoder);
-      for (int picture = 0; picture < kPictures; ++picture) {
-        const std::string text = std::to_string(number) + ":" + std::to_string(picture);
-        const auto slot = static_cast<size_t>(picture) % 2;
-        EXPECT_EQ(node->empty(slot, text, 0, picture), android::OK);
-        node->expect(fillBufferDone());
-        node->expect(emptyBufferDone());
-        EXPECT_EQ(node->outputs().back().text(), text);
-        EXPECT_EQ(node->outputs().back().timestamp, picture);
-        node->messages().clear();
-        EXPECT_EQ(node->fill(slot), android::OK);
-      }
-      node->executingToIdle();
-      node->idleToLoaded();
-    });
-  }
-  for (std::thread& thread : threads) thread.join();
 }
 
 }  // namespace

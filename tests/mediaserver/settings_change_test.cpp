@@ -6,11 +6,6 @@
 namespace omxtest {
 namespace {
 
-using mediaserver::kInputPort;
-using mediaserver::kOutputPort;
-
-using Words = std::vector<std::string>;
-
 class SettingsChange : public NodeTest {
  protected:
   // What a client does after the announcement, when `held` of its buffers are with the node.
@@ -25,43 +20,56 @@ class SettingsChange : public NodeTest {
     node->expectComplete(OMX_CommandPortEnable, kOutputPort);
   }
 
+  // Those that the client has; the node refuses the others.
+  static void sendBackAll(OmxClient* node) {
+    for (size_t i = 0; i < node->buffers(kOutputPort).size(); ++i) static_cast<void>(node->fill(i));
+  }
+
   const Match changed = eventIs(OMX_EventPortSettingsChanged);
 };
 
 TEST_F(SettingsChange, GoesThroughDisableAndEnableAndLosesNoPicture) {
+  const auto node = running();
   for (const OMX_U32 index : {0u, static_cast<OMX_U32>(OMX_IndexParamPortDefinition)}) {
-    const auto node = running();
-    node->empty(0, "small");
-    node->expect(fillBufferDone());
-    decoder.announce(
-        [](mediaserver::PortDefinition& output) {
-          output.nBufferSize = 256;
-          output.nBufferCountActual = 3;
-          output.format.video.nFrameWidth = 320;
-        },
-        index);
-    node->expect(changed);
-    node->expect(emptyBufferDone());
-    // The codec goes on working; what it makes waits.
-    node->empty(0, std::string(64, 'L'));
-    node->empty(1, "larger");
-    node->expect(emptyBufferDone(), 3);
-    settle(node.get());
-    EXPECT_EQ(node->messages().count(fillBufferDone()), 1u) << "one buffer at least is held back";
-    const mediaserver::PortDefinition definition = node->definition(kOutputPort);
-    EXPECT_EQ(definition.nBufferSize, 256u);
-    EXPECT_EQ(definition.nBufferCountActual, 3u);
-    EXPECT_EQ(definition.format.video.nFrameWidth, 320u);
+    for (const OMX_U32 width : {320u, 64u}) {
+      node->messages().clear();
+      decoder.holdOutput();
+      decoder.produce(Packet("last of the old size"));
+      decoder.announce(
+          [=](PortDefinition& output) {
+            output.nBufferSize = 256;
+            output.nBufferCountActual = 3;
+            output.format.video.nFrameWidth = width;
+          },
+          index);
+      decoder.passOutput();
+      node->expect(fillBufferDone());
+      sendBackAll(node.get());
+      node->expect(changed);
+      // The codec goes on working; what it makes waits.
+      node->empty(0, std::string(64, 'L'));
+      node->empty(1, "second");
+      node->expect(emptyBufferDone(), 2);
+      settle(node.get());
+      ASSERT_EQ(node->outputs().size(), 1u) << "one buffer at least is held back";
+      EXPECT_EQ(node->outputs()[0].text(), "last of the old size");
+      EXPECT_EQ(node->definition(kOutputPort).nBufferSize, 256u);
+      EXPECT_EQ(node->definition(kOutputPort).format.video.nFrameWidth, width);
 
-    node->messages().clear();
-    reallocate(node.get(), 1);
-    EXPECT_EQ(node->heard(), (Words{"filled", "complete disable 1", "complete enable 1"}));
-    node->messages().clear();
-    node->fillAll();
-    node->expect(fillBufferDone(), 2);
-    EXPECT_EQ(node->outputs()[0].text(), std::string(64, 'L'));
-    EXPECT_EQ(node->outputs()[1].text(), "larger");
-    EXPECT_EQ(decoder.configured()->at(kOutputPort).nBufferCountActual, 3u);
+      const size_t held = node->buffers(kOutputPort).size();
+      node->messages().clear();
+      reallocate(node.get(), held);
+      Words heard(held, "filled");
+      heard.insert(heard.end(), {"complete disable 1", "complete enable 1"});
+      EXPECT_EQ(node->heard(), heard);
+      node->messages().clear();
+      node->fillAll();
+      node->expect(fillBufferDone(), 2);
+      EXPECT_EQ(node->outputs()[0].text(), std::string(64, 'L'));
+      EXPECT_EQ(node->outputs()[1].text(), "second");
+      EXPECT_EQ(decoder.configured()->at(kOutputPort).nBufferCountActual, 3u);
+      sendBackAll(node.get());
+    }
   }
 }
 
@@ -76,6 +84,40 @@ TEST_F(SettingsChange, WaitsForABufferThatCanBeHeldBack) {
   EXPECT_EQ(node->messages().count(fillBufferDone()), 0u);
   reallocate(node.get(), 1);
   EXPECT_EQ(node->definition(kOutputPort).nBufferSize, 320u * 240 * 3 / 2);
+}
+
+// The definition describes what the client is reading until it has read that. Here time does not help it.
+TEST_F(SettingsChange, WaitsForAReaderUntilItHasSentBackFreedOrGivenUpWhatItReads) {
+  const auto sendBack = [](OmxClient* node) { EXPECT_EQ(node->fill(0), android::OK); };
+  const auto release = [](OmxClient* node) { EXPECT_EQ(node->freeBuffer(kOutputPort, 0), android::OK); };
+  for (const auto& done :
+       {std::function<void(OmxClient*)>(sendBack), std::function<void(OmxClient*)>(release)}) {
+    const auto node = running();
+    decoder.produce(Packet("being read"));
+    node->expect(fillBufferDone());
+    decoder.announce(320, 240);
+    decoder.produce(Packet("next"));
+    settle(node.get());
+    EXPECT_EQ(node->messages().count(changed), 0u);
+    EXPECT_EQ(node->definition(kOutputPort).format.video.nFrameWidth, 176u);
+    // Commands go on, and a flush leaves the reader what it has.
+    node->command(OMX_CommandFlush, kInputPort);
+    node->expectComplete(OMX_CommandFlush, kInputPort);
+    EXPECT_EQ(node->messages().count(changed), 0u);
+    done(node.get());
+    node->expect(changed);
+    EXPECT_EQ(node->definition(kOutputPort).format.video.nFrameWidth, 320u);
+  }
+}
+
+TEST_F(SettingsChange, DoesNotWaitForeverForAClientThatKeepsItsOutput) {
+  serve(std::chrono::milliseconds(1));
+  const auto node = running();
+  decoder.produce(Packet("kept"));
+  node->expect(fillBufferDone());
+  decoder.announce(320, 240);
+  node->expect(changed);
+  reallocate(node.get(), 1);
 }
 
 TEST_F(SettingsChange, IsFollowedByNoEventBeforeTheBuffersAreBack) {
@@ -98,7 +140,7 @@ TEST_F(SettingsChange, IsFollowedByNoEventBeforeTheBuffersAreBack) {
 
 TEST_F(SettingsChange, OfAConfigurationAloneKeepsTheBuffers) {
   const auto node = running();
-  decoder.announce([](mediaserver::PortDefinition&) {}, OMX_IndexConfigCommonOutputCrop);
+  decoder.announce([](PortDefinition&) {}, OMX_IndexConfigCommonOutputCrop);
   node->empty(0, "cropped");
   node->expect(fillBufferDone());
   Words heard = node->heard();
@@ -106,32 +148,7 @@ TEST_F(SettingsChange, OfAConfigurationAloneKeepsTheBuffers) {
   EXPECT_EQ(heard, (Words{"settings 1 0x700000f", "filled"}));
 }
 
-TEST_F(SettingsChange, CanFollowAnotherAndComeBehindPictures) {
-  const auto node = running();
-  node->empty(0, "before");
-  node->expect(fillBufferDone());
-  node->fill(0);
-  for (const OMX_U32 width : {320u, 64u, 640u}) {
-    node->messages().clear();
-    decoder.holdOutput();
-    decoder.produce(Packet("last of the old size"));
-    decoder.announce(width, 48);
-    decoder.produce(Packet("first of the new"));
-    decoder.passOutput();
-    node->expect(changed);
-    ASSERT_EQ(node->outputs().size(), 1u);
-    EXPECT_EQ(node->outputs().front().text(), "last of the old size");
-    reallocate(node.get(), 1);
-    EXPECT_EQ(node->definition(kOutputPort).format.video.nFrameWidth, width);
-    node->messages().clear();
-    node->fillAll();
-    node->expect(fillBufferDone());
-    EXPECT_EQ(node->outputs().front().text(), "first of the new");
-    node->fill(0);  // two are held again for the next round
-  }
-}
-
-TEST_F(SettingsChange, IsAnnouncedAgainWhenTheClientWentThroughIdleInstead) {
+TEST_F(SettingsChange, IsAnnouncedAgainAfterIdleAndSettledByLoaded) {
   const auto node = running();
   decoder.announce(320, 240);
   node->expect(changed);
@@ -143,13 +160,6 @@ TEST_F(SettingsChange, IsAnnouncedAgainWhenTheClientWentThroughIdleInstead) {
   settle(node.get());
   EXPECT_EQ(node->messages().count(changed), 0u) << "there is nothing to hold back yet";
   node->fillAll();
-  node->expect(changed);
-  reallocate(node.get(), 2);
-}
-
-TEST_F(SettingsChange, IsSettledByGoingToLoaded) {
-  const auto node = running();
-  decoder.announce(320, 240);
   node->expect(changed);
   node->executingToIdle();
   node->idleToLoaded();

@@ -40,7 +40,7 @@ class MessageTap::Delivery final : public android::BnOMXObserver {
 class MessageTap::Observer final : public android::BnOMXObserver {
  public:
   Observer(MessageTap* tap, const sp<IOMXObserver>& client)
-      : _link(std::make_shared<Link>()), _channel(new Delivery(_link, client)) {
+      : _link(std::make_shared<Link>()), _delivery(new Delivery(_link, client)), _channel(_delivery) {
     _link->tap = tap;
   }
 
@@ -65,6 +65,7 @@ class MessageTap::Observer final : public android::BnOMXObserver {
 
  private:
   const std::shared_ptr<Link> _link;
+  const sp<IOMXObserver> _delivery;
   mediaserver::MessageChannel _channel;
 };
 

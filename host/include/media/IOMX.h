@@ -2,7 +2,8 @@
 //
 // A node is a component instance that belongs to one client. Any thread may call IOMX; a component's
 // results arrive later as messages, one after the other and never from inside a call of the client.
-// The server holds the observer from allocateNode() until the node is freed.
+// The server watches the observer and does not hold it: when its last owner lets go of it, the client is
+// taken for dead and the node is freed.
 // Failures of a component arrive as ERROR_UNSUPPORTED or, nearly always, as UNKNOWN_ERROR.
 #pragma once
 
