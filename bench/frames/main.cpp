@@ -2,8 +2,11 @@
 // and how many times the limit it takes. The limit is the shorter time of memcpy and a plain vector loop that
 // copy half of the bytes that the function reads and writes.
 //
-// Arguments: parts of functions' names to take only those, and --seconds N, how long each contender of a case
-// runs in all (default 0.1).
+// Arguments: parts of functions' names to take only those; --seconds N, how long each contender of a case runs
+// in all (default 0.1); --target NAME, the instruction set of the frame functions instead of the best one.
+#include <hwy/highway.h>
+#include <hwy/targets.h>
+
 #include <algorithm>
 #include <cstdio>
 #include <cstdlib>
@@ -17,6 +20,7 @@ using namespace bench;
 
 struct Options {
   double seconds = 0.1;
+  std::string target;
   std::vector<std::string> names;
 };
 
@@ -24,6 +28,8 @@ bool parse(int argc, char** argv, Options& options) {
   for (int i = 1; i < argc; ++i) {
     if (std::strcmp(argv[i], "--seconds") == 0 && i + 1 < argc) {
       options.seconds = std::atof(argv[++i]);
+    } else if (std::strcmp(argv[i], "--target") == 0 && i + 1 < argc) {
+      options.target = argv[++i];
     } else if (argv[i][0] == '-') {
       return false;
     } else {
@@ -37,6 +43,17 @@ bool wanted(const Options& options, const Case& c) {
   return options.names.empty() ||
          std::any_of(options.names.begin(), options.names.end(),
                      [&](const std::string& name) { return c.function.find(name) != std::string::npos; });
+}
+
+// False if processor and build do not have it.
+bool choose(const std::string& target) {
+  for (const std::int64_t each : hwy::SupportedAndGeneratedTargets()) {
+    if (target != hwy::TargetName(each)) continue;
+    hwy::SetSupportedTargetsForTest(each);
+    hwy::GetChosenTarget().Update(each);
+    return true;
+  }
+  return false;
 }
 
 // As it is printed, so that what is said of it agrees with what is seen.
@@ -92,7 +109,15 @@ class Table {
 int main(int argc, char** argv) {
   Options options;
   if (!parse(argc, argv, options)) {
-    std::fprintf(stderr, "usage: %s [--seconds N] [PART OF A FUNCTION'S NAME ...]\n", argv[0]);
+    std::fprintf(stderr, "usage: %s [--seconds N] [--target NAME] [PART OF A FUNCTION'S NAME ...]\n", argv[0]);
+    return 2;
+  }
+  if (!options.target.empty() && !choose(options.target)) {
+    std::fprintf(stderr, "%s: no such instruction set here. There are:", options.target.c_str());
+    for (const std::int64_t each : hwy::SupportedAndGeneratedTargets()) {
+      std::fprintf(stderr, " %s", hwy::TargetName(each));
+    }
+    std::fputs("\n", stderr);
     return 2;
   }
   std::vector<Case> cases;

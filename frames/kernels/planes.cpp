@@ -6,6 +6,7 @@
 #undef HWY_TARGET_INCLUDE
 #define HWY_TARGET_INCLUDE "frames/kernels/planes.cpp"
 #include <hwy/foreach_target.h>
+#include <hwy/cache_control.h>
 #include <hwy/highway.h>
 #include "frames/kernels/run-inl.h"
 #include "frames/kernels/blocks-inl.h"
@@ -166,13 +167,16 @@ template <Samples kSamples, class D>
 HWY_INLINE void transposeColumns(D d, const std::uint8_t* src, std::ptrdiff_t srcPitch, std::uint8_t* dst,
                                  std::ptrdiff_t dstPitch) {
   using V = hn::Vec<D>;
+  // Unrolled whole: only then do the arrays stay in registers.
   V a[16], b[16];
+  HWY_UNROLL(16)
   for (std::ptrdiff_t r = 0; r < 16; ++r) {
     a[r] = loadBlocks(d, SampleLoader<kSamples>{}, src + r * srcPitch, 16 * srcPitch);
   }
   // Interleaving the two halves of the rows moves one bit of the row number into the column number; four
   // times, and they have changed places.
   const auto exchange = [d](const V* from, V* to) HWY_ATTR {
+    HWY_UNROLL(8)
     for (std::size_t i = 0; i < 8; ++i) {
       to[2 * i] = hn::InterleaveLower(d, from[i], from[i + 8]);
       to[2 * i + 1] = hn::InterleaveUpper(d, from[i], from[i + 8]);
@@ -182,6 +186,7 @@ HWY_INLINE void transposeColumns(D d, const std::uint8_t* src, std::ptrdiff_t sr
   exchange(b, a);
   exchange(a, b);
   exchange(b, a);
+  HWY_UNROLL(16)
   for (std::ptrdiff_t c = 0; c < 16; ++c) hn::StoreU(a[c], d, dst + c * dstPitch);
 }
 
@@ -196,6 +201,14 @@ void transposeLarge(const std::uint8_t* src, std::ptrdiff_t srcPitch, std::uint8
                     std::ptrdiff_t dstPitch) {
   constexpr std::size_t kStep = kSamples == Samples::kAll ? 1 : 2;
   for (std::size_t c = 0; c < kTileColumns; c += 16) {
+    // More rows are open at once than the processor looks ahead on by itself: fetch for the tile below, 16
+    // rows of the source at a time, and behind those of the destination. Nothing depends on what is there.
+    for (std::size_t k = c; k < c + 16; ++k) {
+      const std::uint8_t* next = src + static_cast<std::ptrdiff_t>(kTileRows + k) * srcPitch;
+      if (k < kTileRows) hwy::Prefetch(next);
+      if (k < kTileRows && kStep == 2) hwy::Prefetch(next + kTileColumns);
+      hwy::Prefetch(dst + static_cast<std::ptrdiff_t>(k) * dstPitch + 2 * kTileRows - 1);
+    }
     transposeColumns<kSamples>(hn::ScalableTag<std::uint8_t>(), src + c * kStep, srcPitch,
                                dst + static_cast<std::ptrdiff_t>(c) * dstPitch, dstPitch);
   }

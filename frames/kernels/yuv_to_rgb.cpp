@@ -16,42 +16,105 @@ namespace webrtc::detail::HWY_NAMESPACE {
 namespace {
 namespace hn = hwy::HWY_NAMESPACE;
 
-// The layouts for whole vectors of components, one byte per pixel.
+// A component of the pixels in even columns, or in odd ones, one a lane: 8 bits and 8 bits of fraction,
+// clamped, with the highest bit inverted. One Xor sets a whole pixel right.
+template <class V>
+struct Components {
+  V r, g, b;
+};
 
 template <class D, class V>
-HWY_INLINE void storePixels(Bgr24, D d, V r, V g, V b, std::uint8_t* to) {
-  hn::StoreInterleaved3(b, g, r, d, to);
+HWY_INLINE V wordsOf(Rgb565, D d, const Components<V>& c) {
+  const V red = hn::And(c.r, hn::Set(d, 0xF800));
+  const V green = hn::And(hn::ShiftRight<5>(c.g), hn::Set(d, 0x07E0));
+  return hn::Xor(hn::Or3(red, green, hn::ShiftRight<11>(c.b)), hn::Set(d, 0x8410));
+}
+
+template <class D, class V>
+HWY_INLINE V wordsOf(Argb4444, D d, const Components<V>& c) {
+  const V red = hn::And(hn::ShiftRight<4>(c.r), hn::Set(d, 0x0F00));
+  const V green = hn::And(hn::ShiftRight<8>(c.g), hn::Set(d, 0x00F0));
+  return hn::Xor(hn::Or3(red, green, hn::ShiftRight<12>(c.b)), hn::Set(d, 0xF888));
+}
+
+template <class D, class V>
+HWY_INLINE V wordsOf(Argb1555, D d, const Components<V>& c) {
+  const V red = hn::And(hn::ShiftLeft<2>(c.r), hn::Set(d, 0xE000));
+  const V green = hn::And(hn::ShiftRight<5>(c.g), hn::Set(d, 0x07C0));
+  return hn::Xor(hn::Or3(red, green, hn::ShiftRight<11>(c.b)), hn::Set(d, 0x8410));
+}
+
+// 16-bit words.
+template <class Layout, class D, class V>
+HWY_INLINE void storePixels(Layout layout, D d16, const Components<V>& even, const Components<V>& odd,
+                            std::uint8_t* to) {
+  const hn::Repartition<std::uint8_t, D> d8;
+  const V evenWords = wordsOf(layout, d16, even), oddWords = wordsOf(layout, d16, odd);
+  hn::StoreU(hn::BitCast(d8, InterleaveLower(d16, evenWords, oddWords)), d8, to);
+  hn::StoreU(hn::BitCast(d8, InterleaveUpper(d16, evenWords, oddWords)), d8, to + hn::Lanes(d8));
+}
+
+// The bytes of a component in the order of the columns.
+template <class D, class V>
+HWY_INLINE auto bytesInOrder(D d16, V even, V odd) {
+  const hn::Repartition<std::uint8_t, D> d8;
+  const V merged = hn::OrAnd(hn::ShiftRight<8>(even), odd, hn::Set(d16, 0xFF00));
+  return hn::Xor(hn::BitCast(d8, merged), hn::Set(d8, 0x80));
+}
+
+template <class D, class V>
+HWY_INLINE void storePixels(Bgr24, D d16, const Components<V>& even, const Components<V>& odd,
+                            std::uint8_t* to) {
+  const hn::Repartition<std::uint8_t, D> d8;
+  hn::StoreInterleaved3(bytesInOrder(d16, even.b, odd.b), bytesInOrder(d16, even.g, odd.g),
+                        bytesInOrder(d16, even.r, odd.r), d8, to);
 }
 
 template <std::size_t kR, std::size_t kG, std::size_t kB, class D, class V>
-HWY_INLINE void storePixels(FourBytes<kR, kG, kB>, D d, V r, V g, V b, std::uint8_t* to) {
-  V place[4] = {};
-  place[kR] = r;
-  place[kG] = g;
-  place[kB] = b;
-  place[6 - kR - kG - kB] = hn::Set(d, 255);
-  hn::StoreInterleaved4(place[0], place[1], place[2], place[3], d, to);
+HWY_INLINE void storePixels(FourBytes<kR, kG, kB>, D d16, const Components<V>& even, const Components<V>& odd,
+                            std::uint8_t* to) {
+  const hn::Repartition<std::uint8_t, D> d8;
+  const std::size_t lanes = hn::Lanes(d8);
+  hn::Vec<decltype(d8)> place[4] = {};
+  place[kR] = bytesInOrder(d16, even.r, odd.r);
+  place[kG] = bytesInOrder(d16, even.g, odd.g);
+  place[kB] = bytesInOrder(d16, even.b, odd.b);
+  place[6 - kR - kG - kB] = hn::Set(d8, 255);
+  const auto front0 = hn::BitCast(d16, InterleaveLower(d8, place[0], place[1]));
+  const auto front1 = hn::BitCast(d16, InterleaveUpper(d8, place[0], place[1]));
+  const auto back0 = hn::BitCast(d16, InterleaveLower(d8, place[2], place[3]));
+  const auto back1 = hn::BitCast(d16, InterleaveUpper(d8, place[2], place[3]));
+  hn::StoreU(hn::BitCast(d8, InterleaveLower(d16, front0, back0)), d8, to);
+  hn::StoreU(hn::BitCast(d8, InterleaveUpper(d16, front0, back0)), d8, to + lanes);
+  hn::StoreU(hn::BitCast(d8, InterleaveLower(d16, front1, back1)), d8, to + 2 * lanes);
+  hn::StoreU(hn::BitCast(d8, InterleaveUpper(d16, front1, back1)), d8, to + 3 * lanes);
 }
 
-template <class D, class V>
-HWY_INLINE void storePixels(Rgb565, D d, V r, V g, V b, std::uint8_t* to) {
-  const V low = hn::Or(hn::ShiftLeft<3>(hn::And(g, hn::Set(d, 0x1C))), hn::ShiftRight<3>(b));
-  const V high = hn::Or(hn::And(r, hn::Set(d, 0xF8)), hn::ShiftRight<5>(g));
-  hn::StoreInterleaved2(low, high, d, to);
-}
+// Interleaving works within blocks of 16 bytes. The layouts above whose blocks it fills with whole pixels
+// store vectors and not blocks in the order of the columns; for them the samples are put into this order
+// beforehand, which takes fewer steps. kVectors: stored for each vector of bytes.
+template <std::size_t kVectors, std::size_t kLanes>
+struct BlockOrder {
+  alignas(64) std::uint32_t group[kLanes] = {};  // of four bytes
+  constexpr BlockOrder() {
+    constexpr std::size_t kBlocks = kLanes / 4, kGroups = 4 / kVectors;
+    for (std::size_t i = 0; i < kLanes; ++i) {
+      const std::size_t block = i / 4, vector = i % 4 / kGroups;
+      group[i] = static_cast<std::uint32_t>((vector * kBlocks + block) * kGroups + i % kGroups);
+    }
+  }
+};
 
-template <class D, class V>
-HWY_INLINE void storePixels(Argb4444, D d, V r, V g, V b, std::uint8_t* to) {
-  const V upper = hn::Set(d, 0xF0);
-  hn::StoreInterleaved2(hn::Or(hn::And(g, upper), hn::ShiftRight<4>(b)), hn::Or(upper, hn::ShiftRight<4>(r)),
-                        d, to);
-}
-
-template <class D, class V>
-HWY_INLINE void storePixels(Argb1555, D d, V r, V g, V b, std::uint8_t* to) {
-  const V low = hn::Or(hn::ShiftLeft<3>(hn::And(g, hn::Set(d, 0x18))), hn::ShiftRight<3>(b));
-  const V red = hn::Xor(hn::ShiftLeft<2>(hn::And(r, hn::Set(d, 0x38))), hn::Set(d, 0x80));
-  hn::StoreInterleaved2(low, hn::Or(red, hn::ShiftRight<5>(g)), d, to);
+template <class Layout, class D>
+HWY_INLINE hn::Vec<D> inStoredOrder(Layout, D d, hn::Vec<D> v) {
+  const hn::Repartition<std::uint32_t, D> d32;
+  constexpr std::size_t kLanes = hn::MaxLanes(d32);
+  if constexpr (Layout::kBytes == 3 || kLanes <= 4) {
+    return v;
+  } else {
+    static constexpr BlockOrder<Layout::kBytes, kLanes> kOrder;
+    return hn::BitCast(d, TableLookupLanes(hn::BitCast(d32, v), SetTableIndices(d32, kOrder.group)));
+  }
 }
 
 struct Planar {
@@ -76,24 +139,18 @@ struct SemiPlanar {
   }
 };
 
-// All in 16-bit lanes, exact: 298 = 256 + 42, and the other coefficients are split in the same way into a
-// multiple of 256, added after the shift, and a rest with which the sum before it stays within 16 bits.
-//   R = y + (v - 16 - 128) + ((42 y + 153 (v - 128) + 128 - 672) >> 8)
-// and so on; 672 = 42 * 16. Values are biased so that the additions saturate at 255 (kBias + 255 is the
-// largest 16-bit value) and one unsigned subtraction saturates at 0.
-inline constexpr std::int16_t kBias = 0x7FFF - 255;
+// All in 16-bit lanes, exact. Half of a sum and of the shift loses nothing: luma and the coefficients of blue
+// and green are even, and of red's odd one the half is rounded down as the shift would. What is left,
+//   149 (y - 16) + 64 + chroma, 0 to 32767 of it being 0 to 255,
+// is moved down by 16384, so that adding saturates far outside of that range only. Doubled, the range is that
+// of a 16-bit number, and the saturation is the clamp.
+inline constexpr std::int16_t kLumaOffset = 64 - 149 * 16 - 16384;
 
 template <class Chroma, class Layout>
 struct RowPair {
   using Lane = std::uint16_t;  // a unit is a block of 2 x 2 pixels
   const std::uint8_t *y0, *y1, *u, *v;
   std::uint8_t *dst0, *dst1;
-
-  // What a chroma pair adds before and after the shift.
-  template <class V>
-  struct Terms {
-    V rLow, rHigh, gLow, gHigh, bLow, bHigh;
-  };
 
   template <class D>
   HWY_INLINE void operator()(D, std::size_t i) const {
@@ -102,52 +159,34 @@ struct RowPair {
     V cb, cr;
     Chroma::load(d16, u + i * Chroma::kStep, v + i * Chroma::kStep, cb, cr);
     const V middle = hn::Set(d16, 128);
-    cb = hn::Sub(cb, middle);
-    cr = hn::Sub(cr, middle);
-
-    const V round = hn::Set(d16, 128 - 672);
-    const V bias = hn::Set(d16, kBias - 16);
-    Terms<V> t;
-    t.rLow = hn::Add(hn::Mul(cr, hn::Set(d16, 153)), round);
-    t.rHigh = hn::Add(cr, bias);
-    t.gLow = hn::Add(hn::Add(hn::Mul(cb, hn::Set(d16, -100)), hn::Mul(cr, hn::Set(d16, 48))), round);
-    t.gHigh = hn::Sub(bias, cr);
-    t.bLow = hn::Add(hn::ShiftLeft<2>(cb), round);
-    t.bHigh = hn::Add(hn::ShiftLeft<1>(cb), bias);
-    row(d16, y0 + 2 * i, t, dst0 + 2 * i * Layout::kBytes);
-    row(d16, y1 + 2 * i, t, dst1 + 2 * i * Layout::kBytes);
+    cb = hn::Sub(inStoredOrder(Layout{}, d16, cb), middle);
+    cr = hn::Sub(inStoredOrder(Layout{}, d16, cr), middle);
+    const V green = hn::Add(hn::Mul(cb, hn::Set(d16, -50)), hn::Mul(cr, hn::Set(d16, -104)));
+    // 409 / 2; and half of blue's, whose range takes two additions.
+    const V red = hn::Add(hn::Mul(cr, hn::Set(d16, 204)), hn::ShiftRight<1>(cr));
+    const Components<V> chroma{red, green, hn::Mul(cb, hn::Set(d16, 129))};
+    row(d16, y0 + 2 * i, chroma, dst0 + 2 * i * Layout::kBytes);
+    row(d16, y1 + 2 * i, chroma, dst1 + 2 * i * Layout::kBytes);
   }
 
   template <class D, class V>
-  static HWY_INLINE void row(D d16, const std::uint8_t* y, const Terms<V>& t, std::uint8_t* to) {
+  static HWY_INLINE void row(D d16, const std::uint8_t* y, const Components<V>& chroma, std::uint8_t* to) {
     const hn::Repartition<std::uint8_t, D> d8;
     const hn::RebindToUnsigned<D> du16;
-    const auto luma = hn::BitCast(du16, hn::LoadU(d8, y));
-    const V even = hn::BitCast(d16, hn::And(luma, hn::Set(du16, 0xFF)));
-    const V odd = hn::BitCast(d16, hn::ShiftRight<8>(luma));
-    const V coefficient = hn::Set(d16, 42);
-    const V evenLow = hn::Mul(even, coefficient);
-    const V oddLow = hn::Mul(odd, coefficient);
-    const auto r = component(d16, even, odd, evenLow, oddLow, t.rLow, t.rHigh);
-    const auto g = component(d16, even, odd, evenLow, oddLow, t.gLow, t.gHigh);
-    const auto b = component(d16, even, odd, evenLow, oddLow, t.bLow, t.bHigh);
-    storePixels(Layout{}, d8, r, g, b, to);
+    const auto luma = hn::BitCast(du16, inStoredOrder(Layout{}, d8, hn::LoadU(d8, y)));
+    const auto even = components(d16, hn::BitCast(d16, hn::And(luma, hn::Set(du16, 0xFF))), chroma);
+    const auto odd = components(d16, hn::BitCast(d16, hn::ShiftRight<8>(luma)), chroma);
+    storePixels(Layout{}, du16, even, odd, to);
   }
 
   template <class D, class V>
-  static HWY_INLINE auto component(D d16, V even, V odd, V evenLow, V oddLow, V low, V high) {
-    const hn::Repartition<std::uint8_t, D> d8;
-    const auto e = sample(d16, even, evenLow, low, high);
-    const auto o = sample(d16, odd, oddLow, low, high);
-    return hn::BitCast(d8, hn::Or(e, hn::ShiftLeft<8>(o)));
-  }
-
-  template <class D, class V>
-  static HWY_INLINE auto sample(D, V luma, V lumaLow, V low, V high) {
+  static HWY_INLINE auto components(D d16, V luma, const Components<V>& chroma) {
     const hn::RebindToUnsigned<D> du16;
-    // The last addend is not negative: where the first addition saturates the sum does as well.
-    const V sum = hn::SaturatedAdd(hn::SaturatedAdd(hn::ShiftRight<8>(hn::Add(lumaLow, low)), high), luma);
-    return hn::SaturatedSub(hn::BitCast(du16, sum), hn::Set(du16, kBias));
+    const auto doubled = [du16](V v) HWY_ATTR { return hn::BitCast(du16, hn::SaturatedAdd(v, v)); };
+    const V sum = hn::Add(hn::Mul(luma, hn::Set(d16, 149)), hn::Set(d16, kLumaOffset));
+    return Components<hn::Vec<decltype(du16)>>{
+        doubled(hn::SaturatedAdd(sum, chroma.r)), doubled(hn::SaturatedAdd(sum, chroma.g)),
+        doubled(hn::SaturatedAdd(hn::SaturatedAdd(sum, chroma.b), chroma.b))};
   }
 
   void plain(std::size_t begin, std::size_t end) const {
@@ -176,7 +215,7 @@ struct AppendAlpha {
   HWY_INLINE void operator()(D d, std::size_t i) const {
     hn::Vec<D> b, g, r;
     hn::LoadInterleaved3(d, src + 3 * i, b, g, r);
-    storePixels(Bgra{}, d, r, g, b, dst + 4 * i);
+    hn::StoreInterleaved4(b, g, r, hn::Set(d, 255), d, dst + 4 * i);
   }
 
   void plain(std::size_t begin, std::size_t end) const {
