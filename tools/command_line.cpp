@@ -41,11 +41,11 @@ constexpr const char* kMainFooter =
     "  OMXBRIDGE_LOG     what of the library's log to show: verbose, debug, info, warn, error, silent\n\n";
 
 constexpr const char* kCallFooter =
-    "INPUT is a Y4M file, raw I420 (with --size), or - for either on standard input; without it a built-in\n"
+    "INPUT is any video file, Y4M, raw I420 (with --size), or - for standard input; without it a built-in\n"
     "scene is used. Files appear under their names when they are complete.\n\n"
     "Examples:\n"
     "  omxbridge call\n"
-    "  omxbridge call clip.y4m -b 800k -o decoded.y4m --stream coded.264\n"
+    "  omxbridge call clip.mp4 -b 800k -o decoded.y4m --stream coded.264\n"
     "  omxbridge call clip.yuv --size 1280x720 --fps 25 --profile high --device omap4\n"
     "  ffmpeg -i clip.mp4 -pix_fmt yuv420p -f yuv4mpegpipe - | omxbridge call - -o - | mpv -\n"
     "  omxbridge call --realtime --json > figures.json\n\n";
@@ -120,7 +120,7 @@ struct CodingOptions {
 void addCall(CLI::App& app, Options& options, CodingOptions& coding) {
   EncoderSettings& encoder = options.call.encoder;
   app.footer(std::string(kCallFooter) + kExitCodes);
-  app.add_option("INPUT", options.source.path, "Y4M file, raw I420, or -")->type_name("");
+  app.add_option("INPUT", options.source.path, "Video file, raw I420, or -")->type_name("");
   addParsed<Size>(
       app, "-s,--size", "WxH", kSizes, parseSize, [&options](Size size) { options.source.size = size; },
       "Picture size of raw input and of the scene (default of the scene 640x480)");

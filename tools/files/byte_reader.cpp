@@ -116,6 +116,12 @@ Result<std::span<const uint8_t>> ByteReader::peek(size_t count) {
   return buffered().first(std::min(count, buffered().size()));
 }
 
+bool ByteReader::seek(uint64_t offset) {
+  if (!_size || lseek(_descriptor, static_cast<off_t>(offset), SEEK_SET) < 0) return false;
+  _begin = _end = 0;
+  return true;
+}
+
 Result<std::optional<std::string>> ByteReader::readLine(size_t limit) {
   limit = std::min(limit, kMaxPeek);
   // One byte more at a time: a pipe may hold no more than the line for now.

@@ -41,6 +41,9 @@ class ByteReader {
   // the input, and where `limit` bytes hold no line feed: then the input is not lines.
   Result<std::optional<std::string>> readLine(size_t limit);
 
+  // Goes on from this byte; regular files only. False where that is impossible.
+  bool seek(uint64_t offset);
+
   static constexpr size_t kMaxPeek = 4096;
 
   // A failure of this input: "NAME: problem".

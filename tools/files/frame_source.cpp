@@ -1,11 +1,14 @@
 #include "tools/files/frame_source.h"
 
+#include <algorithm>
 #include <array>
 
 #include "tools/base/text.h"
 #include "tools/files/byte_reader.h"
 #include "tools/files/raw_reader.h"
 #include "tools/files/y4m_reader.h"
+#include "tools/media/demuxer.h"
+#include "tools/media/media_reader.h"
 #include "tools/video/scene.h"
 
 namespace tool {
@@ -18,6 +21,16 @@ using FirstBytes = std::span<const uint8_t>;
 constexpr Size kSceneSize{640, 480};
 constexpr size_t kFirstBytes = 16;
 
+// What the input is where its first bytes leave no doubt.
+std::optional<std::string> surelyIs(ByteReader& bytes) {
+  const auto first = bytes.peek(ByteReader::kMaxPeek);
+  return first.ok() ? knownContainer(first.value()) : std::nullopt;
+}
+
+Failure hasSizeOfItsOwn(const ByteReader& bytes, const std::string& kind) {
+  return bytes.failure("is " + kind + " and has a size of its own: leave --size out");
+}
+
 // The kinds of input file; the first that recognises the input opens it.
 struct InputKind {
   bool (*recognises)(FirstBytes bytes, const SourceRequest& request);
@@ -27,14 +40,22 @@ struct InputKind {
 constexpr std::array kInputKinds{
     InputKind{[](FirstBytes bytes, const SourceRequest&) { return isY4m(bytes); },
               [](std::unique_ptr<ByteReader> bytes, const SourceRequest& request) -> Source {
-                if (request.size) {
-                  return bytes->failure("is a Y4M stream and has a size of its own: leave --size out");
-                }
+                if (request.size) return hasSizeOfItsOwn(*bytes, "a Y4M stream");
                 return openY4m(std::move(bytes), request.rate);
               }},
     InputKind{[](FirstBytes, const SourceRequest& request) { return request.size.has_value(); },
               [](std::unique_ptr<ByteReader> bytes, const SourceRequest& request) -> Source {
+                if (const auto kind = surelyIs(*bytes))
+                  return hasSizeOfItsOwn(*bytes, "a file of format " + *kind);
                 return openRaw(std::move(bytes), *request.size, request.rate.value_or(FrameRate()));
+              }},
+    InputKind{[](FirstBytes, const SourceRequest&) { return true; },
+              [](std::unique_ptr<ByteReader> bytes, const SourceRequest& request) -> Source {
+                const bool mayBeRaw = !surelyIs(*bytes);
+                Source source = openMedia(std::move(bytes), request.rate);
+                if (source.ok() || !mayBeRaw) return source;
+                return Failure{source.failure().code,
+                               source.failure().text + "; for raw I420 give the size with --size WxH"};
               }},
 };
 
@@ -56,15 +77,14 @@ Source openFrameSource(const SourceRequest& request, const std::stop_token& stop
   const auto first = bytes.value()->peek(kFirstBytes);
   if (!first.ok()) return first.failure();
   if (first.value().empty()) return bytes.value()->failure("is empty");
-  for (const InputKind& kind : kInputKinds) {
-    if (!kind.recognises(first.value(), request)) continue;
-    Source source = kind.open(std::move(bytes.value()), request);
-    if (source.ok() && !isEven(source.value()->size())) {
-      return Failure{ExitCode::Input, request.path + ": " + oddSize(source.value()->size())};
-    }
-    return source;
+  const auto kind = std::find_if(kInputKinds.begin(), kInputKinds.end(), [&](const InputKind& each) {
+    return each.recognises(first.value(), request);
+  });
+  Source source = kind->open(std::move(bytes.value()), request);
+  if (source.ok() && !isEven(source.value()->size())) {
+    return Failure{ExitCode::Input, request.path + ": " + oddSize(source.value()->size())};
   }
-  return bytes.value()->failure("is no Y4M stream; for raw I420 give the size of a picture with --size WxH");
+  return source;
 }
 
 }  // namespace tool

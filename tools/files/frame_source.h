@@ -1,4 +1,5 @@
-// Where a call's pictures come from: a Y4M stream, raw I420, or the built-in scene. One thread at a time.
+// Where pictures come from: a Y4M stream, raw I420, any other video file, or the built-in scene. One thread
+// at a time.
 #pragma once
 
 #include <stdint.h>
