@@ -55,22 +55,16 @@ class Lane {
     });
     if (_honest && _random.chance(90)) {
       EXPECT_EQ(starting.result(), OMXI_OK);
-      return goOn();
+      return trafficAndEnd();
     }
     // A pestered session may never get there.
     pester();
     if (eventually([&] { return starting.isDone(); }, std::chrono::milliseconds(_random.draw(20)))) {
-      goOn();
+      trafficAndEnd();
     } else {
       destroy();
     }
     starting.result();
-  }
-
-  void goOn() {
-    pester();
-    traffic();
-    end();
   }
 
   // Until the call is under way: one that begins after the session's end is the application's fault.
@@ -139,7 +133,8 @@ class Lane {
     for (void* id : kept) _session->returnIomxOutputBuffer(id);
   }
 
-  void traffic() {
+  void trafficAndEnd() {
+    pester();
     std::vector<std::thread> feeders;
     for (unsigned feeder = 0; feeder <= _random.draw(3); ++feeder) {
       feeders.emplace_back([this, feeder] { feed(feeder); });
@@ -147,6 +142,7 @@ class Lane {
     if (!_encoding && _random.chance(40)) script().announce(16 * (1 + _random.draw(40)), 144);
     if (!_honest && _random.chance(10)) script().raiseError(OMX_ErrorHardware);
     for (std::thread& feeder : feeders) feeder.join();
+    end();
   }
 
   void feed(unsigned feeder) {
