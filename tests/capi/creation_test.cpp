@@ -7,7 +7,6 @@
 #include "core/omx_interface.h"
 #include "omxbridge/omxbridge.h"
 #include "tests/capi/c_program.h"
-#include "tests/core/log_lines.h"
 #include "tests/encoder/encoder_rig.h"
 
 namespace {
@@ -72,42 +71,40 @@ INSTANTIATE_TEST_SUITE_P(Devices, GenerationTest,
                                            Generation{"msm-unknown", 1920, 1088, 38016, true},
                                            Generation{"omap4", 1920, 1088, 38016, false}));
 
-// A wrong width is that of a definition which is refused; 0: every definition.
-void refuseDefinitions(ScriptedMediaServer& server, Method method, OMX_U32 width) {
-  server.omx().failWhere([=](const Call& call) {
-    const auto definition = call.as<OMX_PARAM_PORTDEFINITIONTYPE>();
-    return call.method == method && call.index == OMX_IndexParamPortDefinition &&
-           (width == 0 || definition->format.video.nFrameWidth == width);
-  });
+// What is missing or refused.
+enum class Missing {
+  Nothing,
+  Server,
+  Omx,
+  Component,
+  Node,
+  Definition,
+  Size,
+  Rates,
+  Avc,
+  MetaData,
+  Settings
+};
+
+void arrange(ScriptedMediaServer& server, Missing what) {
+  RecordingOmx& omx = server.omx();
+  if (what == Missing::Server) server.unregister();
+  if (what == Missing::Omx) server.serveWithoutOmx();
+  if (what == Missing::Component) omx.fail(Method::ListNodes);
+  if (what == Missing::Node) omx.fail(Method::AllocateNode);
+  if (what == Missing::Rates) omx.fail(Method::GetParameter, 5);
+  if (what == Missing::Avc) omx.fail(Method::GetParameter, 3);
+  if (what == Missing::MetaData) omx.fail(Method::StoreMetaDataInBuffers);
+  if (what == Missing::Definition) omx.fail(Method::GetParameter);
+  if (what == Missing::Size) omx.fail(Method::SetParameter, 2);  // the first one is the picture order
 }
-
-using Arrange = void (*)(ScriptedMediaServer& server);
-
-constexpr Arrange kNothing = [](ScriptedMediaServer&) {};
-constexpr Arrange kNoServer = [](ScriptedMediaServer& server) { server.unregister(); };
-constexpr Arrange kNoOmx = [](ScriptedMediaServer& server) { server.serveWithoutOmx(); };
-constexpr Arrange kNoComponent = [](ScriptedMediaServer& server) { server.omx().fail(Method::ListNodes); };
-constexpr Arrange kNoNode = [](ScriptedMediaServer& server) { server.omx().fail(Method::AllocateNode); };
-constexpr Arrange kNotTold = [](ScriptedMediaServer& server) {
-  refuseDefinitions(server, Method::GetParameter, 0);
-};
-constexpr Arrange kNotSized = [](ScriptedMediaServer& server) {
-  refuseDefinitions(server, Method::SetParameter, 1920);
-};
-constexpr Arrange kNoRates = [](ScriptedMediaServer& server) { server.omx().fail(Method::GetParameter, 5); };
-constexpr Arrange kNoAvc = [](ScriptedMediaServer& server) { server.omx().fail(Method::GetParameter, 3); };
-constexpr Arrange kNoMetaData = [](ScriptedMediaServer& server) {
-  server.omx().fail(Method::StoreMetaDataInBuffers);
-};
 
 struct Failure {
   const char* device;
   bool encoder;
-  bool settings;  // are given
-  Arrange arrange;
+  Missing missing;
   int code;
-  const char* description;
-  LogLines lines;  // all but the encoder's first and the last
+  std::string line;  // in front of the last ones; empty: none
 };
 
 class FailureTest : public ::testing::TestWithParam<Failure> {};
@@ -116,97 +113,55 @@ TEST_P(FailureTest, IsReportedAndLeavesNothing) {
   const Failure& failure = GetParam();
   omxhost::LogCapture log;
   ScriptedMediaServer server(failure.device);
-  failure.arrange(server);
+  arrange(server, failure.missing);
   int result = -77;
   webrtc::VideoCodec codec = settings();
-  webrtc::VideoCodec* const given = failure.settings ? &codec : nullptr;
+  webrtc::VideoCodec* const given = failure.missing != Missing::Settings ? &codec : nullptr;
   EXPECT_EQ(failure.encoder ? encoder_create(&result, given) : decoder_create(&result, nullptr), nullptr);
   EXPECT_EQ(result, failure.code);
-  LogLines lines = failure.lines;
+  LogLines lines;
   if (failure.encoder) {
-    lines.insert(lines.begin(), std::string("4/zol-video enter hardCodec encoder_create: build time:") +
-                                    g_strPrgCreatTime + " ");
+    lines.push_back(std::string("4/zol-video enter hardCodec encoder_create: build time:") +
+                    g_strPrgCreatTime + " ");
+  }
+  if (!failure.line.empty()) lines.push_back("E " + failure.line);
+  if (failure.missing >= Missing::Rates && failure.missing <= Missing::MetaData) {
+    lines.emplace_back("E OMXINTERFACE - [ENC] Init: failed to setup params!");
   }
   lines.push_back(std::string("E OMXINTERFACE - ERROR creating ") +
                   (failure.encoder ? "encoder: " : "decoder: ") + std::to_string(failure.code) + " (" +
-                  failure.description + ")");
+                  resultDescription(failure.code) + ")");
   EXPECT_EQ(logLines(log), lines);
   EXPECT_EQ(server.leaks(), "");
 }
 
-constexpr const char* kNoDescription = "Could not define result\n";
-constexpr const char* kIomx = "Could not Acquire iOMX Interface";
-constexpr const char* kNoServerLine = "E OMXINTERFACE: CANNOT ACQUIRE MEDIA PLAYER SERVICE";
-constexpr const char* kNotConfigured = "E OMXINTERFACE - [ENC] Init: failed to setup params!";
-std::string nodeLine(const char* codec) {
-  return std::string("E OMXINTERFACE - Could not allocate node: OMX.qcom.video.") + codec +
-         ".avc -- error -2147483648";
-}
+const std::string kNoServer = "OMXINTERFACE: CANNOT ACQUIRE MEDIA PLAYER SERVICE";
+const std::string kNoOmx = "OMXINTERFACE: MEDIA PLAYER SERVICE CANNOT GET IOMX INTERFACE";
+const std::string kNotFound = "OMXINTERFACE: CODEC NOT FOUND: OMX.qcom.video.decoder.avc";
+const std::string kNoNode = "OMXINTERFACE - Could not allocate node: OMX.qcom.video.";
+const std::string kNotSet = "OMXINTERFACE - SETUP PORT PARAMETERS: Set Port Definition Failed: -2147483648\n";
+const std::string kNoRates = "OMXINTERFACE - RATE CONTROL: ERROR getting bitrate parameters: -2147483648";
+const std::string kNoAvc = "OMXINTERFACE - RATE CONTROL: ERROR getting avc parameters: -2147483648";
 
-INSTANTIATE_TEST_SUITE_P(
-    Decoder, FailureTest,
-    ::testing::Values(
-        Failure{"msm8960", false, false, kNoServer, 3, kIomx, {kNoServerLine}},
-        Failure{"msm8960",
-                false,
-                false,
-                kNoOmx,
-                3,
-                kIomx,
-                {"E OMXINTERFACE: MEDIA PLAYER SERVICE CANNOT GET IOMX INTERFACE"}},
-        Failure{"msm8960",
-                false,
-                false,
-                kNoComponent,
-                6,
-                "OMX Component Node Not Found.",
-                {"E OMXINTERFACE: CODEC NOT FOUND: OMX.qcom.video.decoder.avc"}},
-        Failure{"msm8960",
-                false,
-                false,
-                kNoNode,
-                4,
-                "Could not Allocate OpenMax Component",
-                {nodeLine("decoder")}},
-        Failure{"msm8960", false, false, kNotTold, 13, "Could not get port definition", {}},
-        Failure{"msm8960",
-                false,
-                false,
-                kNotSized,
-                14,
-                "Could not set port definition",
-                {"E OMXINTERFACE - SETUP PORT PARAMETERS: Set Port Definition Failed: -2147483648\n"}},
-        Failure{"exynos4", false, false, kNothing, 36, kNoDescription, {}}));
+INSTANTIATE_TEST_SUITE_P(Decoder, FailureTest,
+                         ::testing::Values(Failure{"msm8960", false, Missing::Server, 3, kNoServer},
+                                           Failure{"msm8960", false, Missing::Omx, 3, kNoOmx},
+                                           Failure{"msm8960", false, Missing::Component, 6, kNotFound},
+                                           Failure{"msm8960", false, Missing::Node, 4,
+                                                   kNoNode + "decoder.avc -- error -2147483648"},
+                                           Failure{"msm8960", false, Missing::Definition, 13, ""},
+                                           Failure{"msm8960", false, Missing::Size, 14, kNotSet},
+                                           Failure{"exynos4", false, Missing::Nothing, 36, ""}));
 
-INSTANTIATE_TEST_SUITE_P(
-    Encoder, FailureTest,
-    ::testing::Values(
-        Failure{"msm8960", true, true, kNoServer, 3, kIomx, {kNoServerLine}},
-        Failure{
-            "msm8960", true, true, kNoNode, 4, "Could not Allocate OpenMax Component", {nodeLine("encoder")}},
-        Failure{
-            "msm8960",
-            true,
-            true,
-            kNoRates,
-            17,
-            "Could not get Bitrate Parameters",
-            {"E OMXINTERFACE - RATE CONTROL: ERROR getting bitrate parameters: -2147483648", kNotConfigured}},
-        Failure{"msm8960",
-                true,
-                true,
-                kNoAvc,
-                34,
-                kNoDescription,
-                {"E OMXINTERFACE - RATE CONTROL: ERROR getting avc parameters: -2147483648", kNotConfigured}},
-        Failure{"omap4",
-                true,
-                true,
-                kNoMetaData,
-                -1,
-                kNoDescription,
-                {"E Storing meta data in video buffers is not supported", kNotConfigured}},
-        Failure{"msm8960", true, false, kNothing, 28, "Invalid Encoding Parameters submitted.", {}}));
+INSTANTIATE_TEST_SUITE_P(Encoder, FailureTest,
+                         ::testing::Values(Failure{"msm8960", true, Missing::Server, 3, kNoServer},
+                                           Failure{"msm8960", true, Missing::Node, 4,
+                                                   kNoNode + "encoder.avc -- error -2147483648"},
+                                           Failure{"msm8960", true, Missing::Rates, 17, kNoRates},
+                                           Failure{"msm8960", true, Missing::Avc, 34, kNoAvc},
+                                           Failure{"omap4", true, Missing::MetaData, -1,
+                                                   "Storing meta data in video buffers is not supported"},
+                                           Failure{"msm8960", true, Missing::Settings, 28, ""}));
 
 TEST(Create, WorksWithoutAPlaceForTheResult) {
   ScriptedMediaServer server("msm8960");

@@ -3,8 +3,6 @@
 #include <string.h>
 
 #include <atomic>
-#include <map>
-#include <thread>
 
 #include <utils/String8.h>
 
@@ -271,31 +269,6 @@ TEST_F(InputTest, TellsWhoeverWaitsForTheInputBuffersOrTheEndMark) {
   EXPECT_EQ(posts(1), std::pair(2, 0));
   _session->_endOfInputPending = true;
   EXPECT_EQ(posts(1), std::pair(3, 1));
-}
-
-TEST_F(InputTest, LetsSeveralThreadsFeed) {
-  start();
-  // Two threads that took the same buffer would send the component a buffer that it has.
-  constexpr int kThreads = 4;
-  constexpr int kEach = 200;
-  std::vector<std::thread> feeders;
-  for (int thread = 0; thread < kThreads; ++thread) {
-    feeders.emplace_back([this, thread] {
-      for (int i = 0; i < kEach;) {
-        const int result = feed(std::to_string(thread) + ":" + std::to_string(i), i);
-        EXPECT_TRUE(result == 0 || result == -1) << result;
-        if (result == 0) ++i;
-        if (result == -1) std::this_thread::yield();
-      }
-    });
-  }
-  for (std::thread& feeder : feeders) feeder.join();
-  ASSERT_TRUE(script().waitForInputs(kThreads * kEach));
-  std::map<char, int> next;
-  for (const Packet& input : script().inputs()) {
-    EXPECT_EQ(input.text().substr(2), std::to_string(next[input.text()[0]]++));
-  }
-  EXPECT_EQ(log(), LogLines{});
 }
 
 }  // namespace

@@ -47,18 +47,6 @@ TEST_F(LifecycleTest, GoesToExecutingAndBackToLoadedAndFreesEverything) {
   EXPECT_EQ(log(), LogLines{kEncoderOver});
 }
 
-TEST_F(LifecycleTest, WaitsForTheEndOfOutputBeforeItGoesIdle) {
-  start();
-  script().holdOutput();
-  ASSERT_EQ(beginEndOfInput().result(), 0);
-  const size_t before = omx().count();
-  Later<int> ending = beginDeInit();
-  waitForSleeper(&SessionState::endOfOutputWaiters);
-  EXPECT_EQ(omx().count(), before);
-  script().passOutput();
-  EXPECT_EQ(ending.result(), OMXI_OK);
-}
-
 TEST_F(LifecycleTest, WaitsForEachStateThatItAsksFor) {
   connect();
   messages().hold(anyEvent());

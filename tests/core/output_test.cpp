@@ -80,14 +80,6 @@ TEST_F(OutputTest, GivesOnlyTheIdWhenTheComponentHasAHeapOfItsOwn) {
   EXPECT_EQ(output.bufferId, bufferId(1, 0));
 }
 
-TEST_F(OutputTest, RecyclesEverythingWithoutAnOutputCallback) {
-  start();
-  _session->registerOutputCallback(nullptr, nullptr);
-  for (size_t i = 0; i < 3 * kOutputs; ++i) componentProduces("nobody looks");
-  waitForFills(4 * kOutputs);
-  EXPECT_TRUE(_application.outputs().empty());
-}
-
 TEST_F(OutputTest, LeavesABufferWithTheApplicationUntilItComesBack) {
   start();
   _application.onOutput([](const Output& output) { return output.bytes == "keep" ? 5 : 0; });

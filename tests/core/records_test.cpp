@@ -84,16 +84,6 @@ void* item(uintptr_t number) {
   return reinterpret_cast<void*>(number);
 }
 
-TEST(SimpleNode, OwnsTheNodesBehindItUntilTheyAreTaken) {
-  SimpleNode second(item(2));
-  SimpleNode first(item(1));
-  first.setNext(&second);
-  second.setNext(new SimpleNode(item(3)));  // a leak where nobody frees it
-  EXPECT_EQ(first.getNext(), &second);
-  EXPECT_EQ(first.getNext()->getData(), item(2));
-  first.setNext(nullptr);
-}
-
 TEST(SimpleQueue, BehavesAsAFifoUnderRandomUse) {
   std::mt19937 random(20120912);
   SimpleQueue queue;

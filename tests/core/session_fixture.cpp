@@ -37,26 +37,6 @@ std::string commandText(const Call& call) {
 
 }  // namespace
 
-std::string describeState(OmxInterface& session) {
-  SessionState& state = *session._state;
-  const SessionState::Lock held(state.lock, std::try_to_lock);
-  const auto* const ports = session._portBuffers;
-  return android::String8::format(
-             "lock free %d; state %d awaited %d reached %d error %d; input %zu of %zu busy, output %zu of "
-             "%zu\n"
-             "ending %d calls %d output thread %d event thread %d delivering %d uses %d %d; tearing down %d "
-             "reconfiguring %d step %d handling %d\n"
-             "waiting: %d state, %d end of output, %d output buffers, %d input buffer\n",
-             held.owns_lock(), static_cast<int>(session._omxState), state.awaitedState,
-             state.awaitedStateReached, static_cast<int>(session._threadError), countBusy(ports[0]),
-             ports[0].size(), countBusy(ports[1]), ports[1].size(), state.ending, state.calls,
-             state.outputThread.running, state.eventThread.running, state.delivering, state.ports[0].uses,
-             state.ports[1].uses, state.tearingDown, static_cast<bool>(session._portReconfiguring),
-             state.reconfigurationStep, state.handlingEvent, state.stateWaiters, state.endOfOutputWaiters,
-             state.outputReturnWaiters, state.inputFreeWaiters)
-      .string();
-}
-
 Trace traceOf(RecordingOmx& omx, size_t from) {
   Trace lines;
   std::map<void*, std::string> names;
@@ -110,7 +90,6 @@ SessionTest::SessionTest(const char* device) : _server(device) {
     for (const Trace& lines : {trace(), log()}) {
       for (const std::string& line : lines) fprintf(stderr, "%s\n", line.c_str());
     }
-    if (_session != nullptr) fprintf(stderr, "%s", describeState(*_session).c_str());
   };
 }
 

@@ -28,9 +28,6 @@ inline constexpr const char* kRefusedText = "-2147483648";
 inline constexpr const char* kEncoderOver = "W OMXINTERFACE - ===DataOutputThread over! enc thread!\n";
 inline constexpr const char* kDecoderOver = "W OMXINTERFACE - ===DataOutputThread over! dec thread!\n";
 
-// What a session's threads are about, for a test that hangs. Reads what it can get at.
-std::string describeState(OmxInterface& session);
-
 // The calls as text, buffers by their place: "fillBuffer out0"; without the first `from` of them.
 Trace traceOf(RecordingOmx& omx, size_t from = 0);
 

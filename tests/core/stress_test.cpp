@@ -8,143 +8,20 @@
 #include <stdlib.h>
 #include <string.h>
 
-#include <algorithm>
-#include <atomic>
-#include <map>
-#include <random>
 #include <set>
 #include <thread>
 
 #include "decoder/omx_interface_decoder.h"
+#include "tests/core/mischief.h"
 #include "tests/core/session_fixture.h"
 
 namespace omxtest::stress {
 namespace {
 
-// Any thread.
-class Random {
- public:
-  explicit Random(unsigned seed) : _engine(seed) {}
-  // One of 0 to `count` - 1.
-  unsigned draw(size_t count) {
-    const std::lock_guard<std::mutex> lock(_mutex);
-    return static_cast<unsigned>(_engine() % count);
-  }
-  // True in `percent` of the cases.
-  bool chance(unsigned percent) { return draw(100) < percent; }
-
- private:
-  std::mutex _mutex;
-  std::mt19937 _engine;
-};
-
 unsigned setting(const char* name, unsigned otherwise) {
   const char* const text = getenv(name);
   return text != nullptr ? static_cast<unsigned>(strtoul(text, nullptr, 10)) : otherwise;
 }
-
-// What is between the sessions and their components: late and repeated messages, forged ones, failed calls.
-class Mischief {
- public:
-  Mischief(ScriptedMediaServer& server, unsigned seed) : _server(server), _random(seed) {
-    server.messages().setFilter([this](const android::omx_message& message) { return fate(message); });
-    server.omx().failWhere([this](const Call& call) {
-      return call.method != Method::FreeNode && isVictim(call.node) && _random.chance(2);
-    });
-    _thread = std::thread([this] { run(); });
-  }
-  ~Mischief() {
-    _over = true;
-    _thread.join();
-    _server.messages().passAll();
-    _server.messages().releaseAll();
-    _server.omx().failNothing();
-  }
-
-  // From now on this node's messages and calls are tampered with, and messages with these buffers are forged.
-  void pester(void* node, std::vector<void*> buffers) {
-    const std::lock_guard<std::mutex> lock(_mutex);
-    _victims[node] = std::move(buffers);
-  }
-  void leaveAlone(void* node) {
-    const std::lock_guard<std::mutex> lock(_mutex);
-    _victims.erase(node);
-  }
-
- private:
-  bool isVictim(void* node) {
-    const std::lock_guard<std::mutex> lock(_mutex);
-    return _victims.contains(node);
-  }
-
-  Fate fate(const android::omx_message& message) {
-    const std::lock_guard<std::mutex> lock(_mutex);
-    const bool victim = _victims.contains(message.node);
-    // Late messages of an honest component still come in their order: one holds up those behind it.
-    size_t& held = _held[message.node];
-    if (_random.chance(10) || (!victim && held > 0)) {
-      ++held;
-      return Fate::Hold;
-    }
-    return victim && _random.chance(10) ? Fate::Repeat : Fate::Pass;
-  }
-
-  // Lets one of the held messages go, some of them after their session.
-  void releaseOne() {
-    const std::vector<android::omx_message> held = _server.messages().held();
-    if (held.empty()) return;
-    size_t position = _random.draw(held.size());
-    void* const node = held[position].node;
-    for (size_t older = 0; older < position && !isVictim(node); ++older) {
-      if (held[older].node == node) position = older;
-    }
-    _server.messages().release(position);
-    const std::lock_guard<std::mutex> lock(_mutex);
-    --_held[node];
-  }
-
-  void run() {
-    MessageTap& messages = _server.messages();
-    for (unsigned round = 1; !_over; ++round) {
-      if (messages.waitForHeld(1, std::chrono::milliseconds(1))) releaseOne();
-      if (_random.chance(30)) forge();
-      if (round % 128 == 0) messages.forgetFreedNodes();  // each may have a thread for its late messages
-    }
-  }
-
-  void forge() {
-    void* node = nullptr;
-    void* buffer = this;
-    {
-      const std::lock_guard<std::mutex> lock(_mutex);
-      if (_victims.empty()) return;
-      const auto victim = std::next(_victims.begin(), _random.draw(_victims.size()));
-      node = victim->first;
-      const auto& buffers = victim->second;
-      if (!buffers.empty() && _random.chance(90)) buffer = buffers[_random.draw(buffers.size())];
-    }
-    const OMX_U32 few = _random.draw(5);
-    const auto event = static_cast<OMX_EVENTTYPE>(_random.draw(8));
-    const android::omx_message messages[] = {
-        makeEvent(event, few, few),
-        makeEvent(OMX_EventCmdComplete, OMX_CommandStateSet, few),
-        makeEvent(OMX_EventCmdComplete, _random.draw(5), few),
-        makeEvent(OMX_EventPortSettingsChanged, 1, 0),
-        makeEmptyBufferDone(buffer),
-        makeEmptyBufferDone(buffer),
-        makeFillBufferDone(buffer, few, _random.chance(10) ? OMX_BUFFERFLAG_EOS : 0),
-        makeFillBufferDone(buffer, few)};
-    _server.messages().forge(node, messages[_random.draw(std::size(messages))]);
-  }
-
-  ScriptedMediaServer& _server;
-  Random _random;
-  std::mutex _mutex;  // guards the two below
-  std::map<void*, std::vector<void*>> _victims;
-  std::map<void*, size_t> _held;  // by node
-  std::atomic<bool> _over{false};
-  std::thread _thread;
-};
 
 // One session after the other, of one kind, on a thread of its own.
 class Lane {
@@ -156,12 +33,6 @@ class Lane {
     for (unsigned number = 0; number < sessions; ++number) live(number);
   }
 
-  std::string where() const {
-    std::string text = std::string(_encoding ? "encoder " : "decoder ") + std::to_string(_number) + ", " +
-                       _phase.load() + (_honest ? "" : ", pestered") + "\n";
-    if (OmxInterface* const session = _shown) text += describeState(*session);
-    return text;
-  }
   size_t pictures() const { return _pictures; }
   unsigned streamsEnded() const { return _streamsEnded; }
 
@@ -178,30 +49,22 @@ class Lane {
     if (!_honest) _application->onInput([this] { useSessionInCallback(); });
     connect();
     if (_random.chance(50)) pester();
-    _phase = "starting";
     Later<int> starting("init()", [session = _session] { return session->init(); });
     awaitBegun(starting, [](const SessionState& state) {
       return state.outputThread.joinable || state.eventThread.joinable;
     });
     if (_honest && _random.chance(90)) {
-      EXPECT_EQ(starting.result(), OMXI_OK) << where();
-      return goOn();
+      EXPECT_EQ(starting.result(), OMXI_OK);
+      return trafficAndEnd();
     }
     // A pestered session may never get there.
     pester();
     if (eventually([&] { return starting.isDone(); }, std::chrono::milliseconds(_random.draw(20)))) {
-      goOn();
+      trafficAndEnd();
     } else {
       destroy();
     }
-    _phase = "collecting the init() of a destroyed session";
     starting.result();
-  }
-
-  void goOn() {
-    pester();
-    traffic();
-    end();
   }
 
   // Until the call is under way: one that begins after the session's end is the application's fault.
@@ -217,7 +80,6 @@ class Lane {
   }
 
   void connect() {
-    _phase = "connecting";
     if (_encoding) {
       _session = new OmxInterface;
       _session->_isEncoder = true;
@@ -228,7 +90,6 @@ class Lane {
       _session = decoder;
     }
     _node = _session->_node;
-    _shown = _session;
     _application->attach(*_session);
   }
 
@@ -272,8 +133,8 @@ class Lane {
     for (void* id : kept) _session->returnIomxOutputBuffer(id);
   }
 
-  void traffic() {
-    _phase = "feeding";
+  void trafficAndEnd() {
+    pester();
     std::vector<std::thread> feeders;
     for (unsigned feeder = 0; feeder <= _random.draw(3); ++feeder) {
       feeders.emplace_back([this, feeder] { feed(feeder); });
@@ -281,6 +142,7 @@ class Lane {
     if (!_encoding && _random.chance(40)) script().announce(16 * (1 + _random.draw(40)), 144);
     if (!_honest && _random.chance(10)) script().raiseError(OMX_ErrorHardware);
     for (std::thread& feeder : feeders) feeder.join();
+    end();
   }
 
   void feed(unsigned feeder) {
@@ -293,7 +155,7 @@ class Lane {
         result = send(text);
         giveKeptBack();
       } while (_honest && result == -1);
-      EXPECT_TRUE(!_honest || result == 0) << result << " " << where();
+      EXPECT_TRUE(!_honest || result == 0) << result;
       if (!_honest && _random.chance(2)) _session->setThreadError(OMXI_ERR_APPLICATION);
       const std::lock_guard<std::mutex> lock(_mutex);
       if (_honest) _fed.insert(text);
@@ -341,7 +203,6 @@ class Lane {
   // The application's proper way out: everything comes back, and then the end.
   void endStream() {
     if (!_honest || _session->_omxState != OMX_StateExecuting) return destroy();
-    _phase = "waiting for the pictures in flight";
     requireEventually(
         [this] {
           giveKeptBack();
@@ -349,9 +210,8 @@ class Lane {
         },
         "the pictures in flight");
     giveKeptBack();
-    _phase = "ending the stream";
     EXPECT_EQ(await("sendEndOfInputFlag()", [this] { return _session->sendEndOfInputFlag(0); }), 0);
-    EXPECT_EQ(await("deInit()", [this] { return _session->deInit(); }), OMXI_OK) << where();
+    EXPECT_EQ(await("deInit()", [this] { return _session->deInit(); }), OMXI_OK);
     std::multiset<std::string> delivered;
     for (const std::string& text : _application->outputTexts()) {
       if (!text.empty()) delivered.insert(text);
@@ -367,15 +227,13 @@ class Lane {
 
   void fail() {
     if (!_honest || _session->_omxState != OMX_StateExecuting) return destroy();
-    _phase = "failing";
     _session->setThreadError(OMXI_ERR_APPLICATION);
-    EXPECT_EQ(await("deInit()", [this] { return _session->deInit(); }), OMXI_ERR_APPLICATION) << where();
+    EXPECT_EQ(await("deInit()", [this] { return _session->deInit(); }), OMXI_ERR_APPLICATION);
     destroy();
   }
 
   template <typename Begun>
   void destroyDuring(const char* what, std::function<int()> call, Begun begun) {
-    _phase = what;
     Later<int> later(what, std::move(call));
     awaitBegun(later, begun);
     destroy();
@@ -383,9 +241,7 @@ class Lane {
   }
 
   void destroy() {
-    _phase = "destroying";
     if (_random.chance(30)) _mischief.leaveAlone(_node);  // else to the last moment
-    _shown = nullptr;
     Later<bool>("destruction", [session = _session] {
       delete session;
       return true;
@@ -409,11 +265,8 @@ class Lane {
   size_t _pictures = 0;
   unsigned _streamsEnded = 0;
 
-  // For the report of a hang.
-  std::atomic<unsigned> _number{0};
-  std::atomic<bool> _honest{true};
-  std::atomic<const char*> _phase{"beginning"};
-  std::atomic<OmxInterface*> _shown{nullptr};
+  unsigned _number = 0;
+  bool _honest = true;
 };
 
 TEST(StressTest, SessionsStandEveryOrderOfEvents) {
@@ -427,13 +280,9 @@ TEST(StressTest, SessionsStandEveryOrderOfEvents) {
     Mischief mischief(server, seed);
     Lane encoders(server, mischief, true, seed + 1);
     Lane decoders(server, mischief, false, seed + 2);
-    hangReport() = [&] {
-      fprintf(stderr, "seed %u\n%s%s", seed, encoders.where().c_str(), decoders.where().c_str());
-    };
     std::thread encoderThread([&] { encoders.run(sessions / 2); });
     decoders.run(sessions / 2);
     encoderThread.join();
-    hangReport() = nullptr;
     // Else it was no stress.
     for (const Lane* lane : {&encoders, &decoders}) {
       printf("%zu pictures, %u streams to their end\n", lane->pictures(), lane->streamsEnded());

@@ -47,6 +47,19 @@ class DecoderSessionTest : public SessionTest {
   void waitForEndOfEventThread();
   // Also waits until the picture is among pictures(): the application counts an output before it handles it.
   void feedThrough(const std::string& text, int timestamp = 0);
+  // New settings, told by the test at the moment of its choice, and the session's answer: the command to
+  // disable the port has gone out.
+  void announceAndDisable() {
+    deliverEvent(OMX_EventPortSettingsChanged, kOmxOutputPort, 0);
+    requireEventually([this] { return !commands().empty() && commands().back() == "sendCommand disable 1"; },
+                      "the disable");
+  }
+  Trace commands() {
+    Trace lines = trace();
+    std::erase_if(lines, [](const std::string& line) { return line.find("sendCommand") != 0; });
+    return lines;
+  }
+  size_t freed() { return omx().count(Method::FreeBuffer); }
   void waitForPictures(size_t count);
   std::vector<Picture> pictures() const;
   // What the application's output callback answers.

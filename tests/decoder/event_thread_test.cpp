@@ -262,14 +262,6 @@ TEST_F(EventThreadTest, AThreadThatHandlesAnEventFindsItsQueueGoneAfterwards) {
   EXPECT_EQ(sortedLog(), sorted({queueGone(290), kDecoderOver}));
 }
 
-TEST_F(EventThreadTest, EndsQuietlyOnceTheSessionIsOver) {
-  startDecoder();
-  finishStream();
-  EXPECT_EQ(deInit(), OMXI_OK);
-  destroy();
-  EXPECT_EQ(sortedLog(), sorted({kEndEvent, kDecoderOver}));
-}
-
 TEST_F(EventThreadTest, ThreadsThatStartAfterTheEndHasBegunEndToo) {
   // A second init() is about to start threads when destruction has woken and ended those of the first one.
   // The new ones must look for themselves: nobody will wake them again.

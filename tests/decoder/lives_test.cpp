@@ -19,6 +19,7 @@ constexpr const char* kTiLine = "E g_hwVersion::OMAP4\n";
 struct Life {
   const char* device;
   int version;
+  int dataType;
   Trace settings;     // made at creation
   LogLines refusals;  // when all of these are refused
 };
@@ -91,6 +92,7 @@ TEST_P(LifeTest, TakesTheseCalls) {
   EXPECT_EQ(decoder().setInputCompressionFormat(0), 0);
   EXPECT_EQ(_session->setupPortParameters(0, 176, 144, 24), OMXI_OK);
   EXPECT_EQ(init(), OMXI_OK);
+  const android::Vector<BufferInfo> outputs = _session->_portBuffers[1];
   for (size_t i = 0; i < kPictures; ++i) decodeOne(static_cast<int>(100 + i));
   finishStream(200);
   EXPECT_EQ(deInit(), OMXI_OK);
@@ -99,9 +101,19 @@ TEST_P(LifeTest, TakesTheseCalls) {
 
   EXPECT_EQ(trace(), wholeLife());
   EXPECT_EQ(omx().buffersFreedWithNode(), 0u);
-  const std::vector<Picture> delivered = pictures();
-  ASSERT_EQ(delivered.size(), kPictures);
-  for (size_t i = 0; i < kPictures; ++i) EXPECT_EQ(delivered[i].output.timestamp, 100 + i);
+  ASSERT_EQ(pictures().size(), kPictures);
+  for (size_t i = 0; i < kPictures; ++i) {
+    const auto [output, info] = pictures()[i];
+    const bool converted = info.dataType == DECODED_DATA_RGB565;
+    EXPECT_EQ(info.dataType, GetParam().dataType);
+    EXPECT_EQ(info.width, 176u);
+    EXPECT_EQ(info.height, 144u);
+    EXPECT_EQ(output.timestamp, 100 + i);
+    EXPECT_EQ(output.bufferId, outputs[i].bufferId);
+    EXPECT_EQ(output.data == outputs[i].data, !converted);
+    EXPECT_EQ(output.length, converted ? 50688u : 11u);
+    EXPECT_TRUE(converted || output.bytes == "access unit");
+  }
   EXPECT_EQ(_application.inputCallbacks().size(), kPictures + 1);
   EXPECT_EQ(sortedLog(), sorted({kEndEvent, kDecoderOver}));
 }
@@ -120,17 +132,19 @@ TEST_P(LifeTest, DoesNotNeedItsSettings) {
 INSTANTIATE_TEST_SUITE_P(
     EveryVersion, LifeTest,
     ::testing::Values(
-        Life{"msm-unknown", HW_VERSION_UNKNOWN, kPictureOrder, kOrderRefused},
-        Life{"msm8960", HW_VERSION_QCOM_OTHER, kPictureOrder, kOrderRefused},
-        Life{"msm7x30", HW_VERSION_MSM7X30, kPictureOrder, kOrderRefused},
-        Life{"msm8x55", HW_VERSION_MSM8X55, kPictureOrder, kOrderRefused},
+        Life{"msm-unknown", HW_VERSION_UNKNOWN, DECODED_DATA_NATIVE, kPictureOrder, kOrderRefused},
+        Life{"msm8960", HW_VERSION_QCOM_OTHER, DECODED_DATA_NATIVE, kPictureOrder, kOrderRefused},
+        Life{"msm7x30", HW_VERSION_MSM7X30, DECODED_DATA_NATIVE, kPictureOrder, kOrderRefused},
+        Life{"msm8x55", HW_VERSION_MSM8X55, DECODED_DATA_NATIVE, kPictureOrder, kOrderRefused},
         Life{"msm8x60",
              HW_VERSION_MSM8X60,
+             DECODED_DATA_RGB565,
              {kPictureOrder[0], "setParameter 0x7f000002 size 24"},
              {kOrderRefused[0], std::string("E OMXINTERFACE - Could not set input frame packing format (") +
                                     kRefusedText + ")"}},
         Life{"omap4",
              HW_VERSION_OMAP4,
+             DECODED_DATA_CROPPED,
              kTiSettings,
              {kTiLine, std::string("E get OMX_IndexParamVideoPortFormat OutPort Error:") + kRefusedText}}));
 

@@ -39,19 +39,6 @@ class NewSettingsTest : public DecoderSessionTest {
     EXPECT_EQ(pictures().back().output.bytes, text);
     EXPECT_EQ(pictures().back().info.width, width);
   }
-  // New settings, told by the test at the moment of its choice, and the session's answer: the command to
-  // disable the port has gone out.
-  void announceAndDisable() {
-    deliverEvent(OMX_EventPortSettingsChanged, kOmxOutputPort, 0);
-    requireEventually([this] { return !commands().empty() && commands().back() == "sendCommand disable 1"; },
-                      "the disable");
-  }
-  Trace commands() {
-    Trace lines = trace();
-    std::erase_if(lines, [](const std::string& line) { return line.find("sendCommand") != 0; });
-    return lines;
-  }
-  size_t freed() { return omx().count(Method::FreeBuffer); }
   // Until the port has come back that many times, with all its buffers at the component.
   void requireReconfigured(size_t times = 1) {
     require(messages().waitForDelivered(commandComplete(OMX_CommandPortEnable), times), "the port's return");
@@ -68,9 +55,6 @@ class NewSettingsTest : public DecoderSessionTest {
           return _session->_state->outputReturnWaiters == 1;
         },
         "an event thread that waits for the output buffers");
-  }
-  void requireTearingDown() {
-    requireUnderLock([](SessionState& state) { return state.tearingDown; }, "deInit()'s first step");
   }
 };
 
@@ -150,23 +134,6 @@ TEST_F(NewSettingsTest, AreCarriedOutOneAfterTheOther) {
     destroy();
   }
   EXPECT_EQ(_server.leaks(), "");
-}
-
-TEST_F(NewSettingsTest, DoNotHoldUpTheEndBehindThem) {
-  startDecoder();
-  script().holdOutput();
-  ASSERT_EQ(feed("the last picture of the old size"), 0);
-  requireEventually([this] { return script().waiting() == 1; }, "the picture");
-  script().announce(320, 240);
-  ASSERT_EQ(feed("the only one of the new size"), 0);
-  ASSERT_EQ(beginEndOfInput().result(), 0);
-  script().passOutput();
-  EXPECT_EQ(deInit(), OMXI_OK);
-  ASSERT_EQ(pictures().size(), 2u);
-  EXPECT_EQ(pictures()[0].info.width, 176u);
-  EXPECT_EQ(pictures()[1].info.width, 320u);
-  destroy();
-  EXPECT_EQ(omx().buffersFreedWithNode(), 0u);
 }
 
 TEST_F(NewSettingsTest, WaitForThePicturesOfTheOldSize) {
@@ -258,141 +225,6 @@ TEST_F(NewSettingsTest, DoNotWaitForAnOutputThreadThatHasEnded) {
   script().announce(352, 288);
   requireReconfigured();
   EXPECT_EQ(pictures().size(), 0u);
-}
-
-TEST_F(NewSettingsTest, DoNotWaitForTheBuffersOfAFailedComponent) {
-  // It never returns them. The error event waits behind the change that waits for them; and then deInit()
-  // waits for them, or destruction ends its wait.
-  for (const bool destroyed : {false, true}) {
-    startDecoder();
-    omx().clearCalls();
-    messages().hold(fillBufferDone());
-    announceAndDisable();
-    waitForSleeper(&SessionState::outputReturnWaiters);
-    if (destroyed) {
-      destroy();
-      EXPECT_EQ(trace().back(), "freeNode");
-    } else {
-      deliverEvent(OMX_EventError, 0x80001009, 0);
-      waitForEvents();
-      EXPECT_EQ(_session->threadError(), OMXI_ERR_EVENT_ERROR);
-      Later<int> ending = beginDeInit();
-      waitForSleeper(&SessionState::outputReturnWaiters);
-      EXPECT_EQ(freed(), 0u);  // it may still be writing into them
-      letMessagesCome();
-      EXPECT_EQ(ending.result(), OMXI_ERR_EVENT_ERROR);
-      EXPECT_EQ(freed(), kInputBuffers + kOutputBuffers);
-      destroy();
-    }
-    messages().passAll();
-  }
-}
-
-TEST_F(NewSettingsTest, AndDeInitAreBothWokenByTheBuffers) {
-  // The event thread waits for the buffers, and then deInit() does too. There is one post when the last one
-  // comes: whoever took it and went would leave the other asleep. And both free the port: each buffer may be
-  // freed once only.
-  startDecoder();
-  messages().hold(fillBufferDone());
-  announceAndDisable();
-  waitForSleeper(&SessionState::outputReturnWaiters, 1);
-  _session->setThreadError(OMXI_ERR_APPLICATION);
-  Later<int> ending = beginDeInit();
-  waitForSleeper(&SessionState::outputReturnWaiters, 2);
-  letMessagesCome();
-  EXPECT_EQ(ending.result(), OMXI_ERR_APPLICATION);
-  EXPECT_EQ(freed(), kInputBuffers + kOutputBuffers);
-  EXPECT_EQ(commands().back(), "sendCommand state 1");
-}
-
-TEST_F(NewSettingsTest, FinishAStepOfCallsBeforeDeInitGoesOn) {
-  // The enable has gone out and the new buffers are being made when deInit() comes. A command to go Idle in
-  // the middle would have the component take buffers in a state in which it takes none, and deInit() would
-  // free a table that is being filled. Or the event thread is in the middle of freeing the port when
-  // deInit(), which has seen all buffers back, comes to free it too.
-  for (const Method method : {Method::AllocateBufferWithBackup, Method::FreeBuffer}) {
-    const bool enabled = method == Method::AllocateBufferWithBackup;
-    startDecoder();
-    endOfOutput();
-    omx().clearCalls();
-    Gate& gate = newGate();
-    omx().before(method, [&](const Call&) { gate.pass(); });
-    script().announce(352, 288);
-    gate.waitForArrival();
-    Later<int> ending = beginDeInit();
-    requireTearingDown();
-    EXPECT_EQ(commands().size(), enabled ? 2u : 1u);
-    gate.open();
-    EXPECT_EQ(ending.result(), OMXI_OK);
-    EXPECT_EQ(freed(), kInputBuffers + (enabled ? 2 : 1) * kOutputBuffers);
-    Trace expected{"sendCommand disable 1", "sendCommand state 2", "sendCommand state 1"};
-    if (enabled) expected.insert(expected.begin() + 1, "sendCommand enable 1");
-    EXPECT_EQ(commands(), expected);
-    destroy();
-    omx().before(method, nullptr);
-  }
-}
-
-TEST_F(NewSettingsTest, BeginNoFurtherStepOnceDeInitHasBegun) {
-  // The disable completes after deInit() has begun. An enable now would follow the command to go Idle, and
-  // the port would get buffers that deInit() does not free.
-  startDecoder();
-  endOfOutput();
-  messages().hold(commandComplete(OMX_CommandPortDisable));
-  script().announce(352, 288);
-  require(messages().waitForHeld(1), "the completed disable");
-  omx().clearCalls();
-  messages().hold(commandComplete(OMX_CommandStateSet, OMX_StateIdle));
-  Later<int> ending = beginDeInit();
-  require(messages().waitForHeld(2), "the component's way to Idle");
-  EXPECT_TRUE(messages().release(0));
-  deliverEvent(OMX_EventPortSettingsChanged, 1, 0);  // nor a new reconfiguration
-  waitForEvents();
-  EXPECT_TRUE(messages().release(0));
-  EXPECT_EQ(ending.result(), OMXI_OK);
-  EXPECT_EQ(commands(), (Trace{"sendCommand state 2", "sendCommand state 1"}));
-  messages().passAll();
-}
-
-TEST_F(NewSettingsTest, ThatCompleteBehindDeInitsCommandAreNoFailure) {
-  // The component is in Idle already when the event thread comes to a completed disable or enable. In any
-  // other moment that would be the wrong state for it; here it would make a session that ended well fail.
-  for (const OMX_COMMANDTYPE command : {OMX_CommandPortDisable, OMX_CommandPortEnable}) {
-    startDecoder();
-    endOfOutput();
-    messages().hold(commandComplete(command));
-    script().announce(352, 288);
-    require(messages().waitForHeld(1), "the completion");
-    Gate& gate = newGate();
-    omx().before(Method::SendCommand, [&](const Call& call) {
-      if (call.param == OMX_StateLoaded && call.command == OMX_CommandStateSet) gate.pass();
-    });
-    Later<int> ending = beginDeInit();
-    gate.waitForArrival();
-    letMessagesCome();
-    require(messages().waitForDelivered(commandComplete(command), 1), "the completion");
-    waitForEvents();
-    gate.open();
-    EXPECT_EQ(ending.result(), OMXI_OK);
-    destroy();
-    omx().before(Method::SendCommand, nullptr);
-  }
-}
-
-TEST_F(NewSettingsTest, FinishTheCallThatTheyAreInBeforeTheSessionIsDestroyed) {
-  for (const Method method : {Method::SendCommand, Method::FreeBuffer, Method::AllocateBufferWithBackup}) {
-    startDecoder();
-    Gate& gate = newGate();
-    omx().before(method, [&](const Call&) { gate.pass(); });
-    script().announce(352, 288);
-    gate.waitForArrival();
-    Later<bool> destroyed = beginDestroyOfBusySession();
-    gate.open();
-    destroyed.result();
-    omx().before(method, nullptr);
-    EXPECT_EQ(trace().back(), "freeNode");
-    messages().forgetFreedNodes();
-  }
 }
 
 }  // namespace

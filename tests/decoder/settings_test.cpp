@@ -99,26 +99,5 @@ TEST_F(SettingsTest, TheClipTableClampsToAByteAndOutlivesItsSession) {
   for (int value = -278; value <= 535; ++value) EXPECT_EQ(clip[value], std::clamp(value, 0, 255));
 }
 
-TEST_F(SettingsTest, ASettingAndTheWrappersEndExcludeEachOther) {
-  // A setting is on its way to the component when deInit() comes to delete the wrapper: deleted now, it
-  // would be used after its end. Whoever comes later is told that there is none.
-  startDecoder();
-  endOfOutput();
-  Gate& gate = newGate();
-  omx().before(Method::SetParameter, [&](const Call&) { gate.pass(); });
-  Later<int> setting("setPictureOrder()", [this] { return decoder().setPictureOrder(0); });
-  gate.waitForArrival();
-  Later<int> ending = beginDeInit();
-  requireUnderLock([this](SessionState&) { return _session->_platformWrapper == nullptr; },
-                   "the wrapper's removal");
-  EXPECT_FALSE(ending.isDone());
-  EXPECT_EQ(decoder().setPictureOrder(1), OMXI_ERR_NO_PLATFORM_WRAPPER);
-  EXPECT_EQ(decoder().setInputPackingFormat(1), OMXI_ERR_NO_PLATFORM_WRAPPER);
-  EXPECT_EQ(decoder().setOutputColorFormat(0), OMXI_ERR_NO_PLATFORM_WRAPPER);
-  gate.open();
-  EXPECT_NE(setting.result(), OMXI_ERR_NO_PLATFORM_WRAPPER);
-  EXPECT_EQ(ending.result(), OMXI_OK);
-}
-
 }  // namespace
 }  // namespace omxtest

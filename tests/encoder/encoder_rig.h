@@ -2,6 +2,8 @@
 // their wrappers say about records. The device is detected once a process: one rig a device and process.
 #pragma once
 
+#include <gtest/gtest.h>
+
 #include <cstring>
 #include <functional>
 #include <memory>
@@ -13,6 +15,7 @@
 #include "core/omx_interface.h"
 #include "encoder/omx_interface_encoder.h"
 #include "omxbridge/codec_settings.h"
+#include "tests/core/log_lines.h"
 #include "tests/support/scripted_media_server.h"
 
 namespace omxtest {
@@ -91,6 +94,30 @@ inline std::vector<std::string> inShort(const std::vector<Call>& calls) {
     result.emplace_back(text);
   }
   return result;
+}
+
+// Refuses one step of the configuration after the other: creation ends there, with the step's code and its
+// line, if it has one.
+inline void expectStopsAtEachRefusal(const char* device, const std::vector<std::string>& steps,
+                                     const std::vector<std::pair<int, std::string>>& refusals) {
+  EncoderRig rig(device);
+  ASSERT_EQ(refusals.size(), steps.size());
+  for (size_t step = 0; step < steps.size(); ++step) {
+    SCOPED_TRACE(steps[step]);
+    // Gets and sets take turns.
+    Method method = step % 2 == 0 ? Method::GetParameter : Method::SetParameter;
+    const bool metaData = steps[step][0] == 's' && step % 2 == 0;
+    if (metaData) method = Method::StoreMetaDataInBuffers;
+    rig.server.omx().fail(method, metaData ? 1 : step / 2 + 1);
+    EXPECT_EQ(rig.create(), refusals[step].first);
+    EXPECT_EQ(rig.session, nullptr);
+    EXPECT_EQ(inShort(settingCalls(rig.server.omx())),
+              std::vector<std::string>(steps.begin(), steps.begin() + static_cast<ptrdiff_t>(step) + 1));
+    LogLines lines{"E OMXINTERFACE - [ENC] Init: failed to setup params!"};
+    if (!refusals[step].second.empty()) lines.insert(lines.begin(), "E " + refusals[step].second);
+    EXPECT_EQ(logLines(rig.log), lines);
+    rig.server.omx().failNothing();
+  }
 }
 
 // What has to be written after `read`: its record with some fields changed, everything else, padding

@@ -1,7 +1,6 @@
 // The encoder's own records: what the application's settings become, and what refusals are reported as.
 #include <gtest/gtest.h>
 
-#include "tests/core/log_lines.h"
 #include "tests/encoder/encoder_rig.h"
 
 namespace {

@@ -5,7 +5,6 @@
 #include <future>
 #include <thread>
 
-#include "tests/core/log_lines.h"
 #include "tests/encoder/encoder_rig.h"
 
 namespace {

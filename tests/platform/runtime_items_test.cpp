@@ -1,7 +1,6 @@
 // What each item that can be changed while an encoder runs sends to the component, per vendor.
 #include <gtest/gtest.h>
 
-#include "tests/core/log_lines.h"
 #include "tests/encoder/encoder_rig.h"
 
 namespace {

@@ -171,16 +171,11 @@ void RecordingOmx::keepBooks(const Call& call) {
 
 // --- Each operation: written down, and forwarded.
 
-namespace {
-
-using NodeId = android::IOMX::node_id;
-
-Call recordCall(Method method, NodeId node, OMX_INDEXTYPE index, const void* params, size_t size) {
+static Call recordCall(Method method, android::IOMX::node_id node, OMX_INDEXTYPE index, const void* params,
+                       size_t size) {
   const auto* const bytes = static_cast<const uint8_t*>(params);
   return {.method = method, .node = node, .index = index, .record = {bytes, bytes + size}, .size = size};
 }
-
-}  // namespace
 
 status_t RecordingOmx::listNodes(android::List<ComponentInfo>* list) {
   return run({.method = Method::ListNodes}, [&](Call&) { return _omx->listNodes(list); });
