@@ -15,8 +15,8 @@ namespace faults {
 // The functions that can be made to fail once.
 enum class Failing { New, NothrowNew, Malloc, Thread };
 
-// Fails the next allocation of exactly `number` bytes on any thread, or the `number`-th pthread_create()
-// from now on, counting from 1; 0: none.
+// Fails the product's next allocation of exactly `number` bytes on any thread, or the `number`-th
+// pthread_create() from now on, counting from 1; 0: none.
 class Fault {
  public:
   Fault(Failing function, size_t number);
