@@ -1,13 +1,64 @@
-// The input semaphore: whatever order it is used in, and while others use it.
+// The input semaphore: whatever order it is used in, and while others use it. The executable's own functions
+// for semaphores check that a semaphore exists when it is used, which neither the library nor a sanitizer
+// notices, and pass the call on.
+#include <dlfcn.h>
 #include <gtest/gtest.h>
+#include <semaphore.h>
 
 #include <atomic>
+#include <mutex>
+#include <set>
 #include <thread>
 
 #include "core/omx_interface.h"
 #include "omxbridge/omxbridge.h"
-#include "tests/capi/semaphore_watch.h"
 #include "tests/encoder/encoder_rig.h"
+
+namespace {
+
+// How often a semaphore was used that did not exist, or was made anew without having been destroyed.
+std::atomic<int> misuses{0};
+
+// The semaphores that exist. Held over each call: what is used is not destroyed in between.
+struct Semaphores {
+  std::mutex lock;
+  std::set<sem_t*> existing;
+};
+
+Semaphores& semaphores() {
+  static auto& kSemaphores = *new Semaphores;
+  return kSemaphores;
+}
+
+template <typename Function>
+Function* next(const char* name) {
+  return reinterpret_cast<Function*>(dlsym(RTLD_NEXT, name));
+}
+
+}  // namespace
+
+#define EXPORTED extern "C" __attribute__((visibility("default")))
+
+EXPORTED int sem_init(sem_t* semaphore, int shared, unsigned int value) noexcept {
+  static auto* const forward = next<int(sem_t*, int, unsigned int)>("sem_init");
+  const std::lock_guard<std::mutex> held(semaphores().lock);
+  if (!semaphores().existing.insert(semaphore).second) ++misuses;
+  return forward(semaphore, shared, value);
+}
+
+EXPORTED int sem_post(sem_t* semaphore) noexcept {
+  static auto* const forward = next<int(sem_t*)>("sem_post");
+  const std::lock_guard<std::mutex> held(semaphores().lock);
+  if (!semaphores().existing.contains(semaphore)) ++misuses;
+  return forward(semaphore);
+}
+
+EXPORTED int sem_destroy(sem_t* semaphore) noexcept {
+  static auto* const forward = next<int(sem_t*)>("sem_destroy");
+  const std::lock_guard<std::mutex> held(semaphores().lock);
+  if (semaphores().existing.erase(semaphore) == 0) ++misuses;
+  return forward(semaphore);
+}
 
 namespace {
 
@@ -21,7 +72,7 @@ TEST(InputSemaphore, MayBeUsedInAnyOrder) {
   for (int sequence = 0; sequence < 3 * 3 * 3 * 3 * 3; ++sequence) {
     for (int rest = sequence, i = 0; i < 5; ++i, rest /= 3) EXPECT_EQ(operations[rest % 3](), 0);
   }
-  EXPECT_EQ(semaphoreMisuses(), 0);
+  EXPECT_EQ(misuses, 0);
 }
 
 TEST(InputSemaphore, MayBePostedWhileItComesAndGoes) {
@@ -39,7 +90,7 @@ TEST(InputSemaphore, MayBePostedWhileItComesAndGoes) {
   }
   done = true;
   for (std::thread& poster : posters) poster.join();
-  EXPECT_EQ(semaphoreMisuses(), 0);
+  EXPECT_EQ(misuses, 0);
 }
 
 TEST(InputSemaphore, TakesThePlaceOfTheInputCallback) {
@@ -68,7 +119,7 @@ TEST(InputSemaphore, TakesThePlaceOfTheInputCallback) {
   }
   EXPECT_EQ(context, 0);
   rig.session.reset();
-  EXPECT_EQ(semaphoreMisuses(), 0);
+  EXPECT_EQ(misuses, 0);
 }
 
 }  // namespace

@@ -181,8 +181,9 @@ TEST_F(LifecycleTest, StartsAgainWithTheThreadOfAFailedStart) {
 TEST_F(LifecycleTest, CanBeTakenDownAgainAfterARefusal) {
   start();
   _application.onOutput([](const Output&) { return 1; });
-  feedThrough("kept");
   _session->setThreadError(OMXI_ERR_EVENT_ERROR);  // recorded, so nobody waits for the end of output
+  feedThrough("kept");
+  waitForOutputThreadToEnd();  // has found the failure
   size_t before = omx().count();
   omx().fail(Method::SendCommand, 1);
   EXPECT_EQ(deInit(), OMXI_ERR_SEND_COMMAND_STATE);

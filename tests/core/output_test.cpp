@@ -176,14 +176,17 @@ TEST_F(OutputTest, ParksBuffersOnceTheEndOfInputIsPending) {
   start();
   feedThrough("before");
   waitForFills(kOutputs + 1);
-  script().holdOutput();
-  ASSERT_EQ(feed("during"), 0);
+  script().holdInput();
   ASSERT_EQ(beginEndOfInput().result(), 0);
-  script().passOutput();
+  componentProduces("during");
+  _application.waitForOutputs(2);
+  componentProduces("more");  // the pass of "during" is over when this comes
+  _application.waitForOutputs(3);
+  script().passInput();
   waitForOutputThreadToEnd();
-  EXPECT_EQ(_application.outputTexts(), (Texts{"before", "during", ""}));
+  EXPECT_EQ(_application.outputTexts(), (Texts{"before", "during", "more", ""}));
   EXPECT_EQ(fills(), kOutputs + 1);
-  EXPECT_EQ(busyCount(1), kOutputs - 2);
+  EXPECT_EQ(busyCount(1), kOutputs - 3);
 }
 
 TEST_F(OutputTest, CallsNobodyByItself) {
