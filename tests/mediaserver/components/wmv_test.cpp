@@ -1,18 +1,16 @@
 // WMV: the three ways in which a stream can tell what it is. No encoder is at hand, so headers are written
 // here and the pictures' payload is arbitrary bits, which decode to arbitrary pictures.
 
-#include <gtest/gtest.h>
-
 #include "host/mediaserver/components/annex_b.h"
-#include "tests/mediaserver/components/decoder_fixture.h"
+#include "tests/mediaserver/components/runs.h"
 
 namespace componenttest {
 namespace {
 
 using Bytes = std::vector<uint8_t>;
 
-constexpr uint32_t kWidth = 48;
-constexpr uint32_t kHeight = 32;
+constexpr uint8_t kWidth = 48;
+constexpr uint8_t kHeight = 32;
 
 void fill(mediaserver::BitWriter* writer, uint32_t seed) {
   for (int i = 0; i < 300; ++i) {
@@ -45,9 +43,7 @@ Bytes mainPicture(bool predicted, uint32_t seed) {
 
 Bytes advancedHeaders() {
   mediaserver::BitWriter sequence;
-  sequence.bits(3, 2);
-  sequence.bits(1, 3);
-  sequence.bits(1, 2);  // 4:2:0
+  sequence.bits(3 << 5 | 1 << 2 | 1, 7);  // advanced, some level, 4:2:0
   sequence.bits(0, 9);
   sequence.bits(kWidth / 2 - 1, 12);
   sequence.bits(kHeight / 2 - 1, 12);
@@ -81,18 +77,20 @@ void append(Bytes* to, const Bytes& from) {
   to->insert(to->end(), from.begin(), from.end());
 }
 
-Bytes littleEndian(uint32_t word) {
-  Bytes bytes;
-  for (int shift = 0; shift < 32; shift += 8) bytes.push_back(static_cast<uint8_t>(word >> shift));
+// The header of a file.
+Bytes fileHeader() {
+  Bytes bytes = {3, 0, 0, 0xC5, 4, 0, 0, 0};
+  append(&bytes, mainSequence());
+  append(&bytes, {kHeight, 0, 0, 0, kWidth, 0, 0, 0});
+  bytes.resize(36);
   return bytes;
 }
 
-TEST(Wmv, DecodesMainProfileBehindItsSequenceHeader) {
+TEST(Wmv, TellsByItsHeadersHowItIsDecodedAndSurvivesThemCut) {
   const std::vector<Unit> units = {
       {mainPicture(false, 1), 0}, {mainPicture(true, 2), 1}, {mainPicture(true, 3), 2}};
   const std::vector<Decoded> wanted = decode("wmv3", units, mainSequence(), kWidth, kHeight);
   ASSERT_EQ(wanted.size(), 3U);
-
   DecoderRun settings("msm8960");
   settings.setInput(OMX_VIDEO_CodingWMV, kWidth, kHeight);
   settings.start();
@@ -102,52 +100,25 @@ TEST(Wmv, DecodesMainProfileBehindItsSequenceHeader) {
   settings.finish();
   expectSame(settings.pictures(), wanted);
 
-  // The header of a file, and the first picture behind it in the same buffer.
-  Bytes file = {3, 0, 0, 0xC5};
-  append(&file, littleEndian(4));
-  append(&file, mainSequence());
-  append(&file, littleEndian(kHeight));
-  append(&file, littleEndian(kWidth));
-  file.resize(36);
-  std::vector<Unit> whole = units;
-  append(&file, units[0].bytes);
-  whole[0].bytes = file;
-  DecoderRun run("omap4");
-  run.setInput(OMX_VIDEO_CodingWMV);
-  run.start();
-  run.sendAll(whole);
-  run.finish();
-  expectSame(run.pictures(), wanted);
-  EXPECT_EQ(run.errors(), std::vector<std::string>{});
-}
-
-TEST(Wmv, DecodesAdvancedProfileFromTheStreamItself) {
-  std::vector<Unit> units = {{advancedHeaders(), 0}, {advancedPicture(4), 1}};
-  append(&units[0].bytes, advancedPicture(3));
-  const std::vector<Decoded> wanted = decode("vc1", units, advancedHeaders(), kWidth, kHeight);
-  ASSERT_EQ(wanted.size(), 2U);
-  DecoderRun run("msm8x60");
-  run.setInput(OMX_VIDEO_CodingWMV);
-  run.start();
-  run.sendAll(units);
-  run.finish();
-  expectSame(run.pictures(), wanted);
-}
-
-TEST(Wmv, SurvivesHeadersThatAreCut) {
-  Bytes file = {3, 0, 0, 0xC5, 4, 0, 0, 0};
-  append(&file, mainSequence());
-  for (const Bytes& header : {file, advancedHeaders(), Bytes{0, 0, 1, 0x0F}, Bytes{1}}) {
-    for (size_t size = 1; size <= header.size(); size += 3) {
-      DecoderRun run("msm8960");
-      run.setInput(OMX_VIDEO_CodingWMV);
-      run.start();
-      run.send({header.begin(), header.begin() + static_cast<ptrdiff_t>(size)}, 0,
-               OMX_BUFFERFLAG_CODECCONFIG);
-      run.send(mainPicture(false, 5), 0);
-      run.finish();
-      EXPECT_EQ(run.errors(), std::vector<std::string>{});
-    }
+  // The header of a file or of the advanced profile, and the first picture behind it in the same buffer.
+  std::vector<Unit> file = units;
+  file[0].bytes = joined({{fileHeader()}, units[0]});
+  const std::vector<Unit> advanced = {{joined({{advancedHeaders()}, {advancedPicture(3)}}), 0},
+                                      {advancedPicture(4), 1}};
+  const auto expectDecoded = [](const std::vector<Unit>& stream, const std::vector<Decoded>& pictures) {
+    DecoderRun run("omap4");
+    run.setInput(OMX_VIDEO_CodingWMV);
+    run.start();
+    run.sendAll(stream);
+    run.finish();
+    expectSame(run.pictures(), pictures);
+    EXPECT_EQ(run.errors(), Errors{});
+  };
+  expectDecoded(file, wanted);
+  expectDecoded(advanced, decode("vc1", advanced, advancedHeaders(), kWidth, kHeight));
+  for (size_t size = 1; size < 36; size += 3) {
+    const std::vector<uint8_t> header = fileHeader();
+    expectDecoded({{{header.begin(), header.begin() + static_cast<ptrdiff_t>(size)}, 0}}, {});
   }
 }
 
