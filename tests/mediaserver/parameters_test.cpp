@@ -165,27 +165,6 @@ TEST_F(Parameters, TheSizeArgumentCountsAndNotTheRecordsOwn) {
   }
 }
 
-TEST_F(Parameters, FailuresReachClientsAsTheirTwoStatuses) {
-  const auto node = client();
-  OMX_VIDEO_PARAM_AVCTYPE record{};
-  const auto index = OMX_IndexParamVideoAvc;
-  const size_t size = sizeof(record);
-  for (const auto& [error, status] : {std::pair{OMX_ErrorUnsupportedSetting, kUnsupported},
-                                      {OMX_ErrorNoMore, kUnknownError},
-                                      {OMX_ErrorUnsupportedIndex, kUnknownError},
-                                      {OMX_ErrorBadParameter, kUnknownError}}) {
-    for (const Access access :
-         {Access::GetParameter, Access::SetParameter, Access::GetConfig, Access::SetConfig}) {
-      decoder.refuse(access, index, error);
-    }
-    EXPECT_EQ(get(*node, index, &record), status);
-    EXPECT_EQ(set(*node, index, record), status);
-    EXPECT_EQ(server->getConfig(node->node(), index, &record, size), status);
-    EXPECT_EQ(server->setConfig(node->node(), index, &record, size), status);
-  }
-  EXPECT_EQ(get(*node, OMX_IndexParamVideoMpeg4, &record), kUnknownError) << "an index that nobody knows";
-}
-
 TEST_F(Parameters, StandardRecordsOfAComponentAreAnswered) {
   const auto node = client();
   OMX_PORT_PARAM_TYPE ports{};

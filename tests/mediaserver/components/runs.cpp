@@ -57,30 +57,6 @@ android::status_t EncoderRun::setAvc(const std::function<void(OMX_VIDEO_PARAM_AV
   return set(OMX_IndexParamVideoAvc, record);
 }
 
-android::status_t EncoderRun::changeBitRate(uint32_t bitsPerSecond) {
-  auto record = makeRecord<OMX_VIDEO_CONFIG_BITRATETYPE>(kOutputPort);
-  record.nEncodeBitrate = bitsPerSecond;
-  return setConfig(OMX_IndexConfigVideoBitrate, record);
-}
-
-android::status_t EncoderRun::changeFrameRate(uint32_t framesPerSecond) {
-  auto record = makeRecord<OMX_CONFIG_FRAMERATETYPE>(isTi() ? kInputPort : kOutputPort);
-  record.xEncodeFramerate = framesPerSecond << 16;
-  return setConfig(OMX_IndexConfigVideoFramerate, record);
-}
-
-android::status_t EncoderRun::requestKey() {
-  auto record = makeRecord<OMX_CONFIG_INTRAREFRESHVOPTYPE>(kOutputPort);
-  record.IntraRefreshVOP = OMX_TRUE;
-  return setConfig(OMX_IndexConfigVideoIntraVOPRefresh, record);
-}
-
-android::status_t EncoderRun::rotate(int32_t degrees) {
-  auto record = makeRecord<OMX_CONFIG_ROTATIONTYPE>(kOutputPort);
-  record.nRotation = degrees;
-  return setConfig(OMX_IndexConfigCommonRotate, record);
-}
-
 Output& EncoderRun::encode(const Picture& picture) {
   const size_t before = outputs().size();
   send(packInput(picture, device().components.encoderInput), static_cast<int64_t>(before) * 1000);

@@ -5,6 +5,7 @@
 
 #include <cstdint>
 #include <optional>
+#include <type_traits>
 #include <vector>
 
 #include <media/stagefright/MediaErrors.h>
@@ -56,10 +57,20 @@ class EncoderRun : public ComponentClient {
   OMX_VIDEO_PARAM_AVCTYPE avc();
 
   // Configurations, on the port that wrappers use.
-  android::status_t changeBitRate(uint32_t bitsPerSecond);
-  android::status_t changeFrameRate(uint32_t framesPerSecond);
-  android::status_t requestKey();
-  android::status_t rotate(int32_t degrees);
+  android::status_t changeBitRate(uint32_t bitsPerSecond) {
+    return change(OMX_IndexConfigVideoBitrate, &OMX_VIDEO_CONFIG_BITRATETYPE::nEncodeBitrate, bitsPerSecond);
+  }
+  android::status_t changeFrameRate(uint32_t framesPerSecond) {
+    return change(OMX_IndexConfigVideoFramerate, &OMX_CONFIG_FRAMERATETYPE::xEncodeFramerate,
+                  framesPerSecond << 16, isTi() ? kInputPort : kOutputPort);
+  }
+  android::status_t requestKey() {
+    return change(OMX_IndexConfigVideoIntraVOPRefresh, &OMX_CONFIG_INTRAREFRESHVOPTYPE::IntraRefreshVOP,
+                  OMX_TRUE);
+  }
+  android::status_t rotate(int32_t degrees) {
+    return change(OMX_IndexConfigCommonRotate, &OMX_CONFIG_ROTATIONTYPE::nRotation, degrees);
+  }
 
   // One picture in the device's layout, and its access unit.
   Output& encode(const Picture& picture);
@@ -73,6 +84,14 @@ class EncoderRun : public ComponentClient {
   double bits(size_t first, size_t count) const;
 
  private:
+  template <typename Record, typename Value>
+  android::status_t change(OMX_INDEXTYPE index, Value Record::*field, std::type_identity_t<Value> value,
+                           OMX_U32 port = kOutputPort) {
+    Record record = makeRecord<Record>(port);
+    record.*field = value;
+    return setConfig(index, record);
+  }
+
   uint32_t _next = 0;
 };
 
