@@ -34,7 +34,6 @@ class Object : public Interface {
 
   int value() const override { return 42; }
 
-  std::atomic<int> uses{0};
   std::function<void()> atDestruction;
   sp<Object> next;
 
@@ -56,16 +55,7 @@ class Object : public Interface {
   Life* const _life;
 };
 
-template <typename Pointer>
-concept TestableAsBool = requires(Pointer p) {
-  p ? 1 : 0;
-}
-|| requires(Pointer p) {
-  !p;
-};
-static_assert(!TestableAsBool<sp<Object>>, "code that relies on it does not compile on a device");
-static_assert(std::is_convertible_v<Object*, sp<Object>> && std::is_convertible_v<sp<Object>, sp<Interface>>);
-static_assert(sizeof(sp<Object>) == sizeof(void*));
+static_assert(!std::is_constructible_v<bool, sp<Object>>, "code that relies on it fails on a device");
 
 void onThreads(int count, const std::function<void(int)>& work) {
   std::latch start(count);
@@ -79,31 +69,24 @@ void onThreads(int count, const std::function<void(int)>& work) {
   for (std::thread& each : threads) each.join();
 }
 
-TEST(StrongPointer, FirstAndLastReferenceAreToldOnce) {
+TEST(StrongPointer, TellsOfTheFirstAndLastReferenceAndTakesTheNewBeforeItDropsTheOld) {
   Life life;
   {
-    sp<Object> first = new Object(&life);
-    EXPECT_EQ(first->getStrongCount(), 1);
-    sp<Interface> second = first;
-    const sp<Object> third = std::move(first);
+    sp<Object> head = new Object(&life);
+    sp<Interface> second = head;
+    const sp<Object> third = std::move(head);
     EXPECT_EQ(third->getStrongCount(), 2);
-    EXPECT_TRUE(first == nullptr && first == NULL && first == 0 && NULL == first);
-    EXPECT_TRUE(second == third && third == second && third.get() == second && !(second < third));
+    EXPECT_TRUE(head == nullptr && head == NULL && second == third && third.get() == second);
     EXPECT_EQ(second->value(), 42);
     EXPECT_EQ(life.destroyed, 0);
   }
   EXPECT_EQ(life.firstRefs, 1);
   EXPECT_EQ(life.lastRefs, 1);
   EXPECT_EQ(life.destroyed, 1);
-}
-
-TEST(StrongPointer, AssignmentTakesTheNewBeforeItDropsTheOld) {
-  Life life;
   sp<Object> head = new Object(&life);
   head->next = new Object(&life);
   head = head->next;  // The only other reference to the new one dies with the old one.
-  EXPECT_EQ(life.destroyed, 1);
-  EXPECT_EQ(head->value(), 42);
+  EXPECT_EQ(life.destroyed, 2);
   // A destructor that looks at the pointer that is being changed sees its new value.
   const Object* seen = head.get();
   const sp<Object>& alias = head;
@@ -111,51 +94,23 @@ TEST(StrongPointer, AssignmentTakesTheNewBeforeItDropsTheOld) {
   head->atDestruction = [&] { seen = head.get(); };
   head = nullptr;
   EXPECT_EQ(seen, nullptr);
-  EXPECT_EQ(life.destroyed, 2);
+  EXPECT_EQ(life.destroyed, 3);
 }
 
-TEST(StrongPointer, ManyThreadsDestroyOnceAndAfterTheLastUse) {
-  for (int round = 0; round < 20; ++round) {
-    Life life;
-    int usesAtTheEnd = 0;
-    sp<Object> shared = new Object(&life);
-    shared->atDestruction = [&usesAtTheEnd, object = shared.get()] { usesAtTheEnd = object->uses; };
-    std::vector<sp<Object>> held(4, shared);
-    shared.clear();
-    onThreads(4, [&](int i) {
-      sp<Object> mine = std::move(held[static_cast<size_t>(i)]);
-      for (int n = 0; n < 2000; ++n) {
-        const sp<Interface> copy = mine;
-        mine->uses.fetch_add(1, std::memory_order_relaxed);  // only the count orders it before the destructor
-      }
-    });
-    ASSERT_EQ(life.firstRefs, 1);
-    ASSERT_EQ(life.destroyed, 1);
-    ASSERT_EQ(usesAtTheEnd, 4 * 2000);
-  }
-}
-
-TEST(WeakPointer, PromotesExactlyWhileTheObjectLives) {
+TEST(WeakPointer, PromotesExactlyWhileTheObjectLivesOrBeforeItWasHeld) {
   Life life;
   wp<Object> weak;
   EXPECT_EQ(weak.promote(), nullptr);
-  {
-    const sp<Object> strong = new Object(&life);
-    weak = strong;
-    const wp<Interface> asInterface = strong;
-    EXPECT_EQ(weak.promote(), strong);
-    EXPECT_EQ(asInterface.promote(), strong);
-    EXPECT_EQ(strong->getStrongCount(), 1);
-  }
-  EXPECT_EQ(life.destroyed, 1);
+  sp<Object> strong = new Object(&life);
+  weak = strong;
+  EXPECT_EQ(wp<Interface>(strong).promote(), strong);
+  EXPECT_EQ(strong->getStrongCount(), 1);
+  strong.clear();
   EXPECT_EQ(weak.promote(), nullptr);
-
-  // Promotion may make the first reference.
   weak = new Object(&life);
   EXPECT_NE(weak.promote(), nullptr);
   EXPECT_EQ(life.firstRefs, 2);
   EXPECT_EQ(life.destroyed, 2);
-  EXPECT_EQ(weak.promote(), nullptr);
 }
 
 TEST(WeakPointer, PromotionRacesTheLastRelease) {
@@ -174,7 +129,7 @@ TEST(WeakPointer, PromotionRacesTheLastRelease) {
       const sp<Object> got = mine.promote();
       if (got == nullptr) return;
       ++promoted;
-      EXPECT_EQ(got->value(), 42);
+      for (int n = 0; n < 100; ++n) EXPECT_EQ(sp<Interface>(got)->value(), 42);
       EXPECT_EQ(life.destroyed, 0);
     });
     won += promoted;

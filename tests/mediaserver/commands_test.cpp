@@ -148,22 +148,9 @@ TEST_F(Commands, LeavingExecutingReturnsEveryBufferBeforeIdleIsReported) {
     node->empty(0, "a");
     node->executingToIdle();
     EXPECT_EQ(node->heard(), (Words{"emptied", "filled", "filled", "complete state 2"}));
-    for (const Packet& output : node->outputs()) EXPECT_TRUE(output.bytes.empty());
-    node->idleToLoaded();
+    EXPECT_EQ(decoder.inputCount(), 0u);
     decoder.passInput();
   }
-}
-
-TEST_F(Commands, APausedNodeTakesBuffersAndGoesOnWithThemLater) {
-  const auto node = client();
-  reach(node.get(), OMX_StatePause);
-  node->fillAll();
-  ASSERT_EQ(node->empty(0, "kept"), android::OK);
-  settle(node.get());
-  EXPECT_EQ(decoder.inputCount(), 0u);
-  node->command(OMX_CommandStateSet, OMX_StateExecuting);
-  node->expect(fillBufferDone());
-  EXPECT_EQ(node->outputs().front().text(), "kept");
 }
 
 }  // namespace

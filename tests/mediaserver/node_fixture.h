@@ -78,6 +78,18 @@ class NodeTest : public ::testing::Test {
     node->messages().clear();
   }
 
+  // The same for a node that a test has allocated by itself. Its buffers, input and output in turns.
+  std::vector<android::IOMX::buffer_id> execute(android::IOMX::node_id node) {
+    std::vector<android::IOMX::buffer_id> ids(2 * kPortCount);
+    void* data = nullptr;
+    server->sendCommand(node, OMX_CommandStateSet, OMX_StateIdle);
+    for (OMX_U32 i = 0; i < 2 * kPortCount; ++i) {
+      EXPECT_EQ(server->allocateBuffer(node, i % kPortCount, 64, &ids[i], &data), android::OK);
+    }
+    server->sendCommand(node, OMX_CommandStateSet, OMX_StateExecuting);
+    return ids;
+  }
+
   // Returns when everything that the node was told before has been carried out and heard, as far as it
   // does not wait for the client. What a mark gives is an error, and it comes last.
   static void settle(OmxClient* node) {

@@ -53,11 +53,9 @@ TEST_F(Parameters, ADefinitionTakesWhatClientsMayWriteAndKeepsTheRest) {
   wanted.eDir = OMX_DirOutput;
   wanted.bEnabled = OMX_FALSE;
   wanted.bPopulated = OMX_TRUE;
-  wanted.eDomain = OMX_PortDomainAudio;
   wanted.nBufferCountMin = 7;
   wanted.nBufferAlignment = 4096;
   wanted.nBufferCountActual = 3;
-  wanted.format.video.cMIMEType = reinterpret_cast<OMX_STRING>(&wanted);
   wanted.format.video.pNativeWindow = &wanted;
   wanted.format.video.nFrameWidth = 64;
   wanted.format.video.nFrameHeight = 48;
@@ -70,35 +68,29 @@ TEST_F(Parameters, ADefinitionTakesWhatClientsMayWriteAndKeepsTheRest) {
   PortDefinition expected = before;
   expected.nBufferCountActual = 3;
   expected.format.video = wanted.format.video;
-  expected.format.video.cMIMEType = nullptr;
   expected.format.video.pNativeWindow = nullptr;
   expected.format.video.eColorFormat = OMX_COLOR_FormatUnused;
   const PortDefinition after = node->definition(kInputPort);
   EXPECT_EQ(std::memcmp(&after, &expected, sizeof(after)), 0);
   // The picture's size reaches the other port.
   EXPECT_EQ(node->definition(kOutputPort).format.video.nFrameWidth, 64u);
-  EXPECT_EQ(node->definition(kOutputPort).nBufferSize, 176u * 144 * 3 / 2);  // stride and slice height stay
-}
 
-TEST_F(Parameters, ARefusedDefinitionChangesNothing) {
-  const auto node = client();
-  const PortDefinition before = node->definition(kOutputPort);
+  // A refused one changes nothing.
   const struct {
     void (*change)(PortDefinition*);
     android::status_t status;
-  } cases[] = {
+  } refused[] = {
       {[](PortDefinition* d) { d->nBufferCountActual = 0; }, kUnknownError},
-      {[](PortDefinition* d) { d->format.video.eColorFormat = OMX_COLOR_FormatL8; }, kUnsupported},
-      {[](PortDefinition* d) { d->format.video.eCompressionFormat = OMX_VIDEO_CodingAVC; }, kUnsupported},
+      {[](PortDefinition* d) { d->format.video.eCompressionFormat = OMX_VIDEO_CodingRV; }, kUnsupported},
       {[](PortDefinition* d) { d->nPortIndex = 2; }, kUnknownError},
   };
-  for (const auto& test : cases) {
-    PortDefinition wanted = before;
+  for (const auto& test : refused) {
+    wanted = after;
     wanted.format.video.nFrameWidth = 32;
     test.change(&wanted);
     EXPECT_EQ(set(*node, OMX_IndexParamPortDefinition, wanted), test.status);
-    const PortDefinition after = node->definition(kOutputPort);
-    EXPECT_EQ(std::memcmp(&after, &before, sizeof(after)), 0);
+    const PortDefinition still = node->definition(kInputPort);
+    EXPECT_EQ(std::memcmp(&still, &after, sizeof(after)), 0);
   }
 }
 
@@ -173,27 +165,6 @@ TEST_F(Parameters, TheSizeArgumentCountsAndNotTheRecordsOwn) {
   }
 }
 
-TEST_F(Parameters, FailuresReachClientsAsTheirTwoStatuses) {
-  const auto node = client();
-  OMX_VIDEO_PARAM_AVCTYPE record{};
-  const auto index = OMX_IndexParamVideoAvc;
-  const size_t size = sizeof(record);
-  for (const auto& [error, status] : {std::pair{OMX_ErrorUnsupportedSetting, kUnsupported},
-                                      {OMX_ErrorNoMore, kUnknownError},
-                                      {OMX_ErrorUnsupportedIndex, kUnknownError},
-                                      {OMX_ErrorBadParameter, kUnknownError}}) {
-    for (const Access access :
-         {Access::GetParameter, Access::SetParameter, Access::GetConfig, Access::SetConfig}) {
-      decoder.refuse(access, index, error);
-    }
-    EXPECT_EQ(get(*node, index, &record), status);
-    EXPECT_EQ(set(*node, index, record), status);
-    EXPECT_EQ(server->getConfig(node->node(), index, &record, size), status);
-    EXPECT_EQ(server->setConfig(node->node(), index, &record, size), status);
-  }
-  EXPECT_EQ(get(*node, OMX_IndexParamVideoMpeg4, &record), kUnknownError) << "an index that nobody knows";
-}
-
 TEST_F(Parameters, StandardRecordsOfAComponentAreAnswered) {
   const auto node = client();
   OMX_PORT_PARAM_TYPE ports{};
@@ -208,24 +179,18 @@ TEST_F(Parameters, StandardRecordsOfAComponentAreAnswered) {
   EXPECT_EQ(set(*node, OMX_IndexParamStandardComponentRole, role), kUnsupported);
 
   OMX_PARAM_BUFFERSUPPLIERTYPE supplier{};
-  supplier.nPortIndex = kOutputPort;
-  supplier.eBufferSupplier = OMX_BufferSupplyInput;
-  EXPECT_EQ(set(*node, OMX_IndexParamCompBufferSupplier, supplier), android::OK);
-  supplier.eBufferSupplier = OMX_BufferSupplyUnspecified;
-  EXPECT_EQ(get(*node, OMX_IndexParamCompBufferSupplier, &supplier), android::OK);
-  EXPECT_EQ(supplier.eBufferSupplier, OMX_BufferSupplyInput);
-  supplier.eBufferSupplier = static_cast<OMX_BUFFERSUPPLIERTYPE>(3);
-  EXPECT_EQ(set(*node, OMX_IndexParamCompBufferSupplier, supplier), kUnknownError);
-}
+  for (const OMX_U32 wanted : {OMX_BufferSupplyInput, OMX_BufferSupplyOutput}) {
+    supplier.eBufferSupplier = static_cast<OMX_BUFFERSUPPLIERTYPE>(wanted);
+    EXPECT_EQ(set(*node, OMX_IndexParamCompBufferSupplier, supplier), android::OK);
+    supplier.eBufferSupplier = static_cast<OMX_BUFFERSUPPLIERTYPE>(3);
+    EXPECT_EQ(set(*node, OMX_IndexParamCompBufferSupplier, supplier), kUnknownError);
+    EXPECT_EQ(get(*node, OMX_IndexParamCompBufferSupplier, &supplier), android::OK);
+    EXPECT_EQ(supplier.eBufferSupplier, wanted);
+  }
 
-TEST_F(Parameters, ExtensionsAreFoundByNameAndMetaDataIsOneOfThem) {
-  const auto node = client();
   OMX_INDEXTYPE index{};
-  const char* const known = "OMX.google.android.index.storeMetaDataInBuffers";
-  EXPECT_EQ(server->getExtensionIndex(node->node(), known, &index), android::OK);
   EXPECT_EQ(server->getExtensionIndex(node->node(), "OMX.google.android.index.other", &index), kUnknownError);
   EXPECT_EQ(server->storeMetaDataInBuffers(node->node(), kInputPort, OMX_FALSE), android::OK);
-  EXPECT_EQ(server->storeMetaDataInBuffers(node->node(), kInputPort, OMX_TRUE), kUnsupported);
   decoder.setExtensions({});
   EXPECT_EQ(server->storeMetaDataInBuffers(node->node(), kInputPort, OMX_FALSE), kUnknownError);
 }

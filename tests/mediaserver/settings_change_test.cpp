@@ -73,19 +73,6 @@ TEST_F(SettingsChange, GoesThroughDisableAndEnableAndLosesNoPicture) {
   }
 }
 
-TEST_F(SettingsChange, WaitsForABufferThatCanBeHeldBack) {
-  const auto node = client();
-  node->toExecuting();
-  decoder.announce(320, 240);
-  settle(node.get());
-  EXPECT_EQ(node->messages().count(changed), 0u);
-  node->fill(1);
-  node->expect(changed);
-  EXPECT_EQ(node->messages().count(fillBufferDone()), 0u);
-  reallocate(node.get(), 1);
-  EXPECT_EQ(node->definition(kOutputPort).nBufferSize, 320u * 240 * 3 / 2);
-}
-
 // The definition describes what the client is reading until it has read that. Here time does not help it.
 TEST_F(SettingsChange, WaitsForAReaderUntilItHasSentBackFreedOrGivenUpWhatItReads) {
   const auto sendBack = [](OmxClient* node) { EXPECT_EQ(node->fill(0), android::OK); };
@@ -136,16 +123,6 @@ TEST_F(SettingsChange, IsFollowedByNoEventBeforeTheBuffersAreBack) {
   EXPECT_EQ(node->heard(), (Words{"filled", "filled", corrupt, "complete disable 1", "complete enable 1"}));
   node->fillAll();
   node->expect(eventIs(OMX_EventBufferFlag));
-}
-
-TEST_F(SettingsChange, OfAConfigurationAloneKeepsTheBuffers) {
-  const auto node = running();
-  decoder.announce([](PortDefinition&) {}, OMX_IndexConfigCommonOutputCrop);
-  node->empty(0, "cropped");
-  node->expect(fillBufferDone());
-  Words heard = node->heard();
-  std::erase(heard, "emptied");
-  EXPECT_EQ(heard, (Words{"settings 1 0x700000f", "filled"}));
 }
 
 TEST_F(SettingsChange, IsAnnouncedAgainAfterIdleAndSettledByLoaded) {

@@ -22,7 +22,9 @@ struct SequenceSet {
   uint32_t pictureOrderType = 0;
   uint32_t macroblocks = 0;  // of a frame
   // How many pictures can come before one that is displayed earlier, where the stream says so.
-  std::optional<uint32_t> reorderFrames;
+  std::optional<uint32_t> reorderFrames = std::nullopt;
+
+  bool operator==(const SequenceSet&) const = default;
 };
 
 // `nal` without start code. Nothing for one that is damaged.

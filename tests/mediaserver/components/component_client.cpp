@@ -20,9 +20,8 @@ ComponentClient::ComponentClient(const char* device, Kind kind)
   _node = std::make_unique<omxtest::OmxClient>(_server, name);
   // As our wrappers do.
   using omxtest::Giving;
-  const bool ti = _device->components.vendor == omxhost::Vendor::Ti;
-  _node->setGiving(kInputPort, ti ? Giving::Backup : Giving::Use);
-  _node->setGiving(kOutputPort, ti || kind == Kind::Decoder ? Giving::Backup : Giving::Use);
+  _node->setGiving(kInputPort, isTi() ? Giving::Backup : Giving::Use);
+  _node->setGiving(kOutputPort, isTi() || kind == Kind::Decoder ? Giving::Backup : Giving::Use);
 }
 
 void ComponentClient::start() {

@@ -45,6 +45,7 @@ class ComponentClient {
 
   omxtest::OmxClient& node() { return *_node; }
   const omxhost::Device& device() const { return *_device; }
+  bool isTi() const { return _device->components.vendor == omxhost::Vendor::Ti; }
 
   // Records. The index and what it takes are the caller's business.
   template <typename T>

@@ -1,19 +1,9 @@
 // Sizes of decoded pictures: what ports and rectangles say, and what happens when the stream changes them.
 
-#include <gtest/gtest.h>
-
-#include <media/stagefright/MediaErrors.h>
-
-#include "tests/mediaserver/components/decoder_fixture.h"
+#include "tests/mediaserver/components/runs.h"
 
 namespace componenttest {
 namespace {
-
-using mediaserver::kInputPort;
-using mediaserver::kOutputPort;
-using mediaserver::QcomOrder;
-
-constexpr auto kUnsupported = static_cast<android::status_t>(android::ERROR_UNSUPPORTED);
 
 struct Size {
   uint32_t width;
@@ -41,22 +31,20 @@ TEST(DecoderGeometry, FollowsTheStreamAndLosesNoPicture) {
   const std::vector<Size> sizes = {{64, 48}, {160, 128}, {16, 16}, {98, 54}, {176, 144}};
   std::vector<Decoded> displayed;
   const std::vector<Unit> units = changingStream(sizes, 7, &displayed);
-  for (const char* device : {"msm8x55", "msm8x60", "msm8960", "omap4"}) {
-    for (const QcomOrder order : {QcomOrder::Display, QcomOrder::Decode}) {
+  for (const char* device : kDevices) {
+    for (const bool decoding : {false, true}) {
+      SCOPED_TRACE(std::string(device) + (decoding ? " decoding" : " display"));
       DecoderRun run(device);
-      if (run.isTi() && order == QcomOrder::Decode) continue;
-      if (!run.isTi()) {
-        ASSERT_EQ(run.setOrder(order), android::OK);
-      }
+      if (run.isTi() && decoding) continue;
+      EXPECT_TRUE(!decoding || run.setOrder(QcomOrder::Decode) == android::OK);
       run.start();
       // As fast as it goes: pictures of the old size are still on their way when the new one is decoded.
       run.sendAll(units);
       run.awaitOutputs(units.size() - 6);
       run.finish();
-      SCOPED_TRACE(std::string(device) + (order == QcomOrder::Decode ? " decoding" : " display"));
-      expectSame(run.pictures(), order == QcomOrder::Decode ? inDecodingOrder(displayed, units) : displayed);
+      expectSame(run.pictures(), decoding ? inDecodingOrder(displayed, units) : displayed);
       EXPECT_GE(run.reconfigurations(), run.isTi() ? 2U : sizes.size());
-      EXPECT_EQ(run.errors(), std::vector<std::string>{});
+      EXPECT_EQ(run.errors(), Errors{});
     }
   }
 }
@@ -74,105 +62,79 @@ TEST(DecoderGeometry, ChangesTheRectangleWithoutNewBuffers) {
 }
 
 TEST(DecoderGeometry, IsWhatEachDeviceMakesOfASize) {
-  struct {
+  const struct {
     const char* device;
     Size size;
     Size frame;
     uint32_t bytes;
     Size corner;
-  } const cases[] = {
+  } cases[] = {
       {"msm8960", {176, 144}, {176, 144}, 38016, {0, 0}}, {"msm7x30", {98, 54}, {98, 54}, 7938, {0, 0}},
       {"msm8x60", {176, 144}, {176, 144}, 65536, {0, 0}}, {"msm8x60", {640, 480}, {640, 480}, 475136, {0, 0}},
       {"omap4", {176, 144}, {256, 240}, 92160, {32, 24}}, {"omap4", {640, 478}, {768, 576}, 663552, {32, 24}},
   };
   for (const auto& each : cases) {
-    const std::vector<Picture> pictures = {Picture(each.size.width, each.size.height)};
-    const std::vector<Unit> units = encode({"libx264", {{"preset", "ultrafast"}}}, pictures);
-    DecoderRun run(each.device);
-    run.start();
-    run.sendAll(units);
-    run.finish();
-    ASSERT_EQ(run.outputs().size(), 1U);
-    const Output& output = run.outputs().front();
     SCOPED_TRACE(each.device);
-    EXPECT_EQ(output.definition.format.video.nFrameWidth, each.frame.width);
-    EXPECT_EQ(output.definition.format.video.nFrameHeight, each.frame.height);
-    EXPECT_EQ(output.bytes.size(), each.bytes);
-    EXPECT_EQ(output.definition.nBufferSize, each.bytes);
-    EXPECT_EQ(output.crop.nLeft, static_cast<OMX_S32>(each.corner.width));
-    EXPECT_EQ(output.crop.nTop, static_cast<OMX_S32>(each.corner.height));
-    EXPECT_EQ(output.crop.nWidth, each.size.width);
-    EXPECT_EQ(output.crop.nHeight, each.size.height);
-  }
-}
-
-TEST(DecoderGeometry, TakesTheClientsForecastForBothPorts) {
-  const std::vector<Unit> units = encode({"libx264", {}}, scenes(160, 128, 2));
-  for (const char* device : {"msm8960", "omap4"}) {
-    DecoderRun run(device);
-    run.setInput(OMX_VIDEO_CodingAVC, 160, 128);
-    EXPECT_GE(run.node().definition(kInputPort).nBufferSize, 160U * 128 * 3 / 2);
-    run.start();
-    run.sendAll(units);
-    run.finish();
-    expectSame(run.pictures(), decode("h264", units));
-    EXPECT_EQ(run.reconfigurations(), 0U) << device;
-  }
-}
-
-TEST(DecoderGeometry, GivesOutputTwoBuffersMoreThanInput) {
-  for (const omxhost::Device& device : omxhost::devices()) {
-    if (device.decoderComponent == nullptr) continue;
-    DecoderRun run(device.name);
-    EXPECT_GE(run.node().definition(kOutputPort).nBufferCountActual,
-              run.node().definition(kInputPort).nBufferCountActual + 2)
-        << device.name;
+    for (const bool forecast : {false, true}) {
+      DecoderRun run(each.device);
+      EXPECT_GE(run.node().definition(kOutputPort).nBufferCountActual,
+                run.node().definition(kInputPort).nBufferCountActual + 2);
+      if (forecast) run.setInput(OMX_VIDEO_CodingAVC, each.size.width, each.size.height);
+      run.start();
+      run.sendAll(
+          encode({"libx264", {{"preset", "ultrafast"}}}, {Picture(each.size.width, each.size.height)}));
+      run.finish();
+      ASSERT_EQ(run.outputs().size(), 1U);
+      const Output& output = run.outputs().front();
+      EXPECT_EQ(output.definition.format.video.nFrameWidth, each.frame.width);
+      EXPECT_EQ(output.definition.format.video.nFrameHeight, each.frame.height);
+      EXPECT_EQ(output.bytes.size(), each.bytes);
+      EXPECT_EQ(output.definition.nBufferSize, each.bytes);
+      EXPECT_EQ(output.crop.nLeft, static_cast<OMX_S32>(each.corner.width));
+      EXPECT_EQ(output.crop.nTop, static_cast<OMX_S32>(each.corner.height));
+      EXPECT_EQ(output.crop.nWidth, each.size.width);
+      EXPECT_EQ(output.crop.nHeight, each.size.height);
+      EXPECT_TRUE(!forecast || run.reconfigurations() == 0) << "the client's forecast counts for both ports";
+    }
   }
 }
 
 TEST(DecoderGeometry, SkipsPicturesThatAreTooLarge) {
   std::vector<Decoded> displayed;
   const std::vector<Unit> small = changingStream({{64, 48}}, 3, &displayed);
-  const std::vector<Unit> large = encode({"libx264", {{"preset", "ultrafast"}}}, {Picture(2048, 1104)});
   DecoderRun run("msm8960");
+  auto definition = run.node().definition(kInputPort);
+  definition.format.video.nFrameWidth = 2048;
+  definition.format.video.nFrameHeight = 1104;
+  EXPECT_EQ(run.node().define(kInputPort, definition), kUnsupported);
   run.start();
-  run.sendAll(large);
+  run.sendAll(encode({"libx264", {{"preset", "ultrafast"}}}, {Picture(2048, 1104)}));
   run.sendAll(small);
   run.finish();
   expectSame(run.pictures(), displayed);
-  EXPECT_EQ(run.errors(), std::vector<std::string>{});
-  auto definition = run.node().definition(kInputPort);
-  DecoderRun other("msm8960");
-  definition.format.video.nFrameWidth = 2048;
-  definition.format.video.nFrameHeight = 1104;
-  EXPECT_EQ(other.node().define(kInputPort, definition), kUnsupported);
+  EXPECT_EQ(run.errors(), Errors{});
 }
 
 // MPEG-4 has odd sizes. Clients get even ones, with the last column and row twice.
 TEST(DecoderGeometry, RoundsOddPicturesUp) {
   const std::vector<Unit> units = encode({"mpeg4", {}}, scenes(67, 35, 2));
-  const std::vector<Decoded> wanted = decode("mpeg4", units);
+  std::vector<Decoded> wanted = decode("mpeg4", units);
+  for (Decoded& each : wanted) {
+    Picture even(68, 36);
+    for (uint32_t y = 0; y < 36; ++y) {
+      const uint8_t* const row = each.picture.plane(0) + size_t{std::min(y, 34U)} * 67;
+      for (uint32_t x = 0; x < 68; ++x) even.plane(0)[y * 68 + x] = row[std::min(x, 66U)];
+    }
+    std::copy_n(each.picture.plane(1), 2 * 34 * 18, even.plane(1));
+    each.picture = even;
+  }
   for (const char* device : {"msm8960", "msm8x60", "omap4"}) {
     DecoderRun run(device);
     run.setInput(OMX_VIDEO_CodingMPEG4);
     run.start();
     run.sendAll(units);
     run.finish();
-    const std::vector<Decoded> got = run.pictures();
-    ASSERT_EQ(got.size(), wanted.size());
-    for (size_t i = 0; i < got.size(); ++i) {
-      EXPECT_EQ(got[i].picture.width, 68U);
-      EXPECT_EQ(got[i].picture.height, 36U);
-      for (uint32_t y = 0; y < 36; ++y) {
-        for (uint32_t x = 0; x < 68; ++x) {
-          const size_t from = size_t{std::min(y, 34U)} * 67 + std::min(x, 66U);
-          ASSERT_EQ(got[i].picture.plane(0)[y * 68 + x], wanted[i].picture.plane(0)[from]) << device;
-        }
-      }
-      const size_t chroma = size_t{34} * 18;
-      EXPECT_TRUE(std::equal(wanted[i].picture.plane(1), wanted[i].picture.plane(1) + 2 * chroma,
-                             got[i].picture.plane(1)));
-    }
+    expectSame(run.pictures(), wanted);
   }
 }
 

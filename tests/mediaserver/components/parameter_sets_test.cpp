@@ -1,38 +1,25 @@
 // Byte streams, parameter sets and levels by themselves.
 
-#include <gtest/gtest.h>
-
 #include "host/mediaserver/components/annex_b.h"
-#include "host/mediaserver/components/avc_level.h"
-#include "host/mediaserver/components/sequence_set.h"
-#include "tests/mediaserver/components/reference_codec.h"
+#include "tests/mediaserver/components/runs.h"
 
 namespace componenttest {
 namespace {
 
 using namespace mediaserver;  // NOLINT(google-build-using-namespace): everything here is about it
 
-std::vector<std::vector<uint8_t>> split(const std::vector<uint8_t>& bytes) {
-  std::vector<std::vector<uint8_t>> nals;
-  Bytes stream(bytes);
-  for (Bytes nal = takeNal(&stream); !nal.empty(); nal = takeNal(&stream))
-    nals.emplace_back(nal.begin(), nal.end());
-  return nals;
-}
-
 TEST(AnnexB, FindsUnitsBetweenStartCodes) {
   using Nals = std::vector<std::vector<uint8_t>>;
-  EXPECT_EQ(split({}), Nals{});
-  EXPECT_EQ(split({0, 0}), Nals{});
-  EXPECT_EQ(split({0, 0, 1}), Nals{});
-  EXPECT_EQ(split({9, 9, 0, 0, 1, 5}), (Nals{{5}}));
-  EXPECT_EQ(split({0, 0, 1, 5, 0, 0, 0, 1, 6, 7, 0, 0}), (Nals{{5}, {6, 7}}));
-  EXPECT_EQ(split({0, 0, 1, 0, 0, 1, 0, 0, 0, 1, 8, 1, 1}), (Nals{{8, 1, 1}}));
-  EXPECT_EQ(split({0, 0, 0, 0, 1, 2, 0, 1, 0, 0, 2}), (Nals{{2, 0, 1, 0, 0, 2}}));
+  EXPECT_EQ(nals({}), Nals{});
+  EXPECT_EQ(nals({0, 0}), Nals{});
+  EXPECT_EQ(nals({0, 0, 1}), Nals{});
+  EXPECT_EQ(nals({9, 9, 0, 0, 1, 5}), (Nals{{5}}));
+  EXPECT_EQ(nals({0, 0, 1, 5, 0, 0, 0, 1, 6, 7, 0, 0}), (Nals{{5}, {6, 7}}));
+  EXPECT_EQ(nals({0, 0, 1, 0, 0, 1, 0, 0, 0, 1, 8, 1, 1}), (Nals{{8, 1, 1}}));
+  EXPECT_EQ(nals({0, 0, 0, 0, 1, 2, 0, 1, 0, 0, 2}), (Nals{{2, 0, 1, 0, 0, 2}}));
 }
 
 TEST(SequenceSet, IsReadAsTheEncoderWroteIt) {
-  using Options = std::map<std::string, std::string>;
   struct {
     Options options;
     int profile;
@@ -42,20 +29,20 @@ TEST(SequenceSet, IsReadAsTheEncoderWroteIt) {
       {{{"profile", "baseline"}, {"refs", "3"}}, 66, 3, 0},
       {{{"profile", "main"}, {"bf", "1"}, {"refs", "2"}}, 77, 2, 1},
       {{{"bf", "3"}, {"b-pyramid", "normal"}, {"refs", "4"}}, 100, 4, 2},
-      {{{"bf", "0"}, {"nal-hrd", "vbr"}, {"b", "100000"}, {"maxrate", "200000"}, {"bufsize", "100000"}},
-       100,
-       3,
-       0},
-      {{{"bf", "0"}, {"x264-params", "cqm=jvt:overscan=show:colorprim=bt709:chromaloc=1:sar=40/33"}},
+      {{{"bf", "0"},
+        {"nal-hrd", "vbr"},
+        {"b", "100000"},
+        {"maxrate", "200000"},
+        {"bufsize", "100000"},
+        {"x264-params", "cqm=jvt:overscan=show:colorprim=bt709:chromaloc=1:sar=40/33"}},
        100,
        3,
        0},
   };
   for (const auto& each : cases) {
     const std::vector<Unit> units = encode({"libx264", each.options}, scenes(98, 54, 2));
-    const auto nals = split(units.front().bytes);
-    ASSERT_FALSE(nals.empty());
-    const auto set = readSequenceSet(nals[0]);
+    const std::vector<uint8_t> nal = nals(units.front().bytes).at(0);
+    const auto set = readSequenceSet(nal);
     ASSERT_TRUE(set);
     EXPECT_EQ(set->profileIdc, each.profile);
     EXPECT_EQ(set->referenceFrames, each.references);
@@ -65,20 +52,16 @@ TEST(SequenceSet, IsReadAsTheEncoderWroteIt) {
 
     // A higher profile is declared, and everything else stays.
     std::vector<uint8_t> raised;
-    appendSequenceSet(nals[0], kProfileHigh, &raised);
-    const auto again = readSequenceSet(split(raised).front());
-    ASSERT_TRUE(again);
-    EXPECT_EQ(again->profileIdc, kProfileHigh);
-    EXPECT_EQ(again->levelIdc, set->levelIdc);
-    EXPECT_EQ(again->referenceFrames, set->referenceFrames);
-    EXPECT_EQ(again->macroblocks, set->macroblocks);
-    EXPECT_EQ(again->reorderFrames, set->reorderFrames);
+    appendSequenceSet(nal, kProfileHigh, &raised);
+    SequenceSet again = sequenceSet(raised);
+    EXPECT_EQ(std::exchange(again.profileIdc, set->profileIdc), kProfileHigh);
+    EXPECT_EQ(again, *set);
 
     // Whatever is cut off or flipped is read to some end.
-    for (size_t size = 0; size < nals[0].size(); ++size) {
-      std::vector<uint8_t> damaged(nals[0].begin(), nals[0].begin() + static_cast<ptrdiff_t>(size));
+    for (size_t size = 0; size < nal.size(); ++size) {
+      std::vector<uint8_t> damaged(nal.begin(), nal.begin() + static_cast<ptrdiff_t>(size));
       static_cast<void>(readSequenceSet(damaged));
-      damaged = nals[0];
+      damaged = nal;
       for (int bit = 0; bit < 8; ++bit) {
         damaged[size] = static_cast<uint8_t>(damaged[size] ^ 1 << bit);
         if (const auto read = readSequenceSet(damaged)) {
@@ -90,21 +73,15 @@ TEST(SequenceSet, IsReadAsTheEncoderWroteIt) {
 }
 
 TEST(SequenceSet, LimitsReorderingByTheLevelWhereNothingElseDoes) {
-  SequenceSet set;
-  set.profileIdc = kProfileMain;
-  set.levelIdc = 31;
-  set.macroblocks = 3600;
-  EXPECT_EQ(reorderDepth(set), 5U);
-  set.macroblocks = 99;
+  const SequenceSet large{.profileIdc = kProfileMain, .levelIdc = 31, .macroblocks = 3600};
+  EXPECT_EQ(reorderDepth(large), 5U);
+  SequenceSet set{.profileIdc = kProfileMain, .levelIdc = 31, .macroblocks = 99};
   EXPECT_EQ(reorderDepth(set), 16U);
   set.reorderFrames = 99;
   EXPECT_EQ(reorderDepth(set), 16U);
-  set.reorderFrames.reset();
   set.pictureOrderType = 2;
   EXPECT_EQ(reorderDepth(set), 0U);
-  set.pictureOrderType = 0;
-  set.profileIdc = kProfileBaseline;
-  EXPECT_EQ(reorderDepth(set), 0U);
+  EXPECT_EQ(reorderDepth({.profileIdc = kProfileBaseline, .levelIdc = 31, .macroblocks = 99}), 0U);
 }
 
 }  // namespace

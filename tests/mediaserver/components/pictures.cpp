@@ -90,6 +90,23 @@ double psnr(const Picture& a, const Picture& b) {
   return error == 0 ? 100 : 10 * std::log10(255.0 * 255.0 * static_cast<double>(count) / error);
 }
 
+std::vector<uint16_t> rgb565(const Picture& picture) {
+  std::vector<uint16_t> pixels;
+  for (uint32_t y = 0; y < picture.height; ++y) {
+    for (uint32_t x = 0; x < picture.width; ++x) {
+      const size_t chroma = size_t{y / 2} * picture.chromaWidth() + x / 2;
+      const int luma = 298 * (picture.plane(0)[size_t{y} * picture.width + x] - 16);
+      const int u = picture.plane(1)[chroma] - 128;
+      const int v = picture.plane(2)[chroma] - 128;
+      const int red = std::clamp((luma + 409 * v) / 256, 0, 255) >> 3;
+      const int green = std::clamp((luma - 208 * v - 100 * u) / 256, 0, 255) >> 2;
+      const int blue = std::clamp((luma + 517 * u) / 256, 0, 255) >> 3;
+      pixels.push_back(static_cast<uint16_t>(red << 11 | green << 5 | blue));
+    }
+  }
+  return pixels;
+}
+
 Picture turned(const Picture& picture, int quarters) {
   if (quarters == 0) return picture;
   Picture out(picture.height, picture.width);

@@ -30,6 +30,9 @@ Picture scene(uint32_t width, uint32_t height, uint32_t number);
 // In decibels; 100 for equal pictures. Compares luma.
 double psnr(const Picture& a, const Picture& b);
 
+// As a converter makes it: full range from limited, each step rounded down.
+std::vector<uint16_t> rgb565(const Picture& picture);
+
 // Turned clockwise by quarter turns.
 Picture turned(const Picture& picture, int quarters);
 

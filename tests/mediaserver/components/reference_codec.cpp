@@ -6,6 +6,7 @@
 #include <cstring>
 
 extern "C" {
+#include <libavutil/imgutils.h>
 #include <libavutil/opt.h>
 }
 
@@ -20,26 +21,18 @@ using mediaserver::AvPacket;
 namespace {
 
 void copyIn(const Picture& picture, AVFrame* frame) {
-  for (int plane = 0; plane < 3; ++plane) {
-    const uint32_t width = plane == 0 ? picture.width : picture.chromaWidth();
-    const uint32_t height = plane == 0 ? picture.height : picture.chromaHeight();
-    for (uint32_t y = 0; y < height; ++y) {
-      std::copy_n(picture.plane(plane) + size_t{y} * width, width,
-                  frame->data[plane] + static_cast<ptrdiff_t>(y) * frame->linesize[plane]);
-    }
-  }
+  const uint8_t* planes[4] = {picture.plane(0), picture.plane(1), picture.plane(2), nullptr};
+  const int pitches[4] = {static_cast<int>(picture.width), static_cast<int>(picture.chromaWidth()),
+                          static_cast<int>(picture.chromaWidth()), 0};
+  av_image_copy(frame->data, frame->linesize, planes, pitches, AV_PIX_FMT_YUV420P, frame->width,
+                frame->height);
 }
 
 Picture copyOut(const AVFrame& frame) {
   Picture picture(static_cast<uint32_t>(frame.width), static_cast<uint32_t>(frame.height));
-  for (int plane = 0; plane < 3; ++plane) {
-    const uint32_t width = plane == 0 ? picture.width : picture.chromaWidth();
-    const uint32_t height = plane == 0 ? picture.height : picture.chromaHeight();
-    for (uint32_t y = 0; y < height; ++y) {
-      std::copy_n(frame.data[plane] + static_cast<ptrdiff_t>(y) * frame.linesize[plane], width,
-                  picture.plane(plane) + size_t{y} * width);
-    }
-  }
+  EXPECT_GE(av_image_copy_to_buffer(picture.bytes.data(), static_cast<int>(picture.bytes.size()), frame.data,
+                                    frame.linesize, AV_PIX_FMT_YUV420P, frame.width, frame.height, 1),
+            0);
   return picture;
 }
 

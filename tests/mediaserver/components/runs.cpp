@@ -1,13 +1,32 @@
-#include "tests/mediaserver/components/encoder_fixture.h"
-
-#include <gtest/gtest.h>
+#include "tests/mediaserver/components/runs.h"
 
 #include "host/mediaserver/components/annex_b.h"
 
 namespace componenttest {
 
-using mediaserver::kInputPort;
-using mediaserver::kOutputPort;
+android::status_t DecoderRun::setOrder(QcomOrder order) {
+  auto record = makeRecord<mediaserver::QcomPictureOrder>(kInputPort);
+  record.eOutputPictureOrder = static_cast<OMX_U32>(order);
+  return set(mediaserver::kQcomPictureOrderIndex, record);
+}
+
+android::status_t DecoderRun::setPacking(QcomPacking packing) {
+  auto record = makeRecord<mediaserver::QcomPortDefinition>(kInputPort);
+  record.nFramePackingFormat = static_cast<OMX_U32>(packing);
+  return set(mediaserver::kQcomPortDefinitionIndex, record);
+}
+
+void DecoderRun::setInput(OMX_VIDEO_CODINGTYPE coding, uint32_t width, uint32_t height) {
+  auto definition = node().definition(kInputPort);
+  definition.format.video.eCompressionFormat = coding;
+  if (width != 0) definition.format.video.nFrameWidth = width;
+  if (height != 0) definition.format.video.nFrameHeight = height;
+  EXPECT_EQ(node().define(kInputPort, definition), android::OK);
+}
+
+void DecoderRun::sendAll(const std::vector<Unit>& units) {
+  for (const Unit& unit : units) send(unit.bytes, unit.timestamp);
+}
 
 void EncoderRun::setSize(uint32_t width, uint32_t height, uint32_t framesPerSecond) {
   for (const OMX_U32 port : {kInputPort, kOutputPort}) {
@@ -36,31 +55,6 @@ android::status_t EncoderRun::setAvc(const std::function<void(OMX_VIDEO_PARAM_AV
   OMX_VIDEO_PARAM_AVCTYPE record = avc();
   change(record);
   return set(OMX_IndexParamVideoAvc, record);
-}
-
-android::status_t EncoderRun::changeBitRate(uint32_t bitsPerSecond) {
-  auto record = makeRecord<OMX_VIDEO_CONFIG_BITRATETYPE>(kOutputPort);
-  record.nEncodeBitrate = bitsPerSecond;
-  return setConfig(OMX_IndexConfigVideoBitrate, record);
-}
-
-android::status_t EncoderRun::changeFrameRate(uint32_t framesPerSecond) {
-  const bool ti = device().components.vendor == omxhost::Vendor::Ti;
-  auto record = makeRecord<OMX_CONFIG_FRAMERATETYPE>(ti ? kInputPort : kOutputPort);
-  record.xEncodeFramerate = framesPerSecond << 16;
-  return setConfig(OMX_IndexConfigVideoFramerate, record);
-}
-
-android::status_t EncoderRun::requestKey() {
-  auto record = makeRecord<OMX_CONFIG_INTRAREFRESHVOPTYPE>(kOutputPort);
-  record.IntraRefreshVOP = OMX_TRUE;
-  return setConfig(OMX_IndexConfigVideoIntraVOPRefresh, record);
-}
-
-android::status_t EncoderRun::rotate(int32_t degrees) {
-  auto record = makeRecord<OMX_CONFIG_ROTATIONTYPE>(kOutputPort);
-  record.nRotation = degrees;
-  return setConfig(OMX_IndexConfigCommonRotate, record);
 }
 
 Output& EncoderRun::encode(const Picture& picture) {
@@ -94,21 +88,37 @@ double EncoderRun::bits(size_t first, size_t count) const {
   return static_cast<double>(bytes) * 8;
 }
 
-std::optional<mediaserver::SequenceSet> sequenceSet(const std::vector<uint8_t>& unit) {
-  mediaserver::Bytes stream(unit);
-  for (auto nal = mediaserver::takeNal(&stream); !nal.empty(); nal = mediaserver::takeNal(&stream)) {
-    if (mediaserver::nalType(nal) == mediaserver::kNalSequenceSet) return mediaserver::readSequenceSet(nal);
+void expectSame(const std::vector<Decoded>& got, const std::vector<Decoded>& wanted, bool timed) {
+  ASSERT_EQ(got.size(), wanted.size());
+  for (size_t i = 0; i < got.size(); ++i) {
+    EXPECT_TRUE(got[i].picture == wanted[i].picture)
+        << "picture " << i << ": " << got[i].picture.width << "x" << got[i].picture.height << " for "
+        << wanted[i].picture.width << "x" << wanted[i].picture.height;
+    EXPECT_TRUE(!timed || got[i].timestamp == wanted[i].timestamp) << "picture " << i;
   }
-  return std::nullopt;
 }
 
-std::vector<unsigned> nalTypes(const std::vector<uint8_t>& unit) {
-  std::vector<unsigned> types;
-  mediaserver::Bytes stream(unit);
-  for (auto nal = mediaserver::takeNal(&stream); !nal.empty(); nal = mediaserver::takeNal(&stream)) {
-    types.push_back(mediaserver::nalType(nal));
+std::vector<std::vector<uint8_t>> nals(const std::vector<uint8_t>& stream) {
+  std::vector<std::vector<uint8_t>> found;
+  mediaserver::Bytes rest(stream);
+  for (auto nal = mediaserver::takeNal(&rest); !nal.empty(); nal = mediaserver::takeNal(&rest)) {
+    found.emplace_back(nal.begin(), nal.end());
   }
+  return found;
+}
+
+NalTypes nalTypes(const std::vector<uint8_t>& unit) {
+  NalTypes types;
+  for (const auto& nal : nals(unit)) types.push_back(mediaserver::nalType(nal));
   return types;
+}
+
+mediaserver::SequenceSet sequenceSet(const std::vector<uint8_t>& unit) {
+  for (const auto& nal : nals(unit)) {
+    if (const auto set = mediaserver::readSequenceSet(nal)) return *set;
+  }
+  ADD_FAILURE() << "no sequence set";
+  return {};
 }
 
 }  // namespace componenttest
