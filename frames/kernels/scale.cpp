@@ -1,6 +1,5 @@
 #include "frames/kernels/scale.h"
 
-#include <cstring>
 
 #include "frames/kernels/targets.h"
 
@@ -184,13 +183,17 @@ void expandInsert(const std::uint8_t* above, const std::uint8_t* below, std::uin
 
 void blend(const std::uint8_t* row0, const std::uint8_t* row1, unsigned fraction, std::uint8_t* dst,
            std::size_t n) {
-  run(Blend{row0, row1, static_cast<std::uint16_t>(fraction), dst}, n);
+  if (fraction == 128) {
+    run(BlendHalves{row0, row1, dst}, n);
+  } else {
+    run(Blend{row0, row1, static_cast<std::uint16_t>(fraction), dst}, n);
+  }
 }
 
+// Forward only: windows are those of whole groups of columns.
 template <bool kNear>
-void resample(const std::uint8_t* src, const std::uint16_t* at, const std::uint16_t* fraction,
-              std::uint8_t* dst, std::size_t n) {
-  run(Resample<kNear>{src, at, fraction, dst}, n);
+void resample(const std::uint8_t* src, const ResamplePlan& plan, std::uint8_t* dst, std::size_t n) {
+  runInPlace(Resample<kNear>{src, plan, dst}, n);
 }
 
 }  // namespace
