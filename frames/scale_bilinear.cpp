@@ -149,12 +149,16 @@ class PlaneScaler {
       _pick[i] = static_cast<std::uint16_t>(leftIsCloser ? left | right << 8 : right | left << 8);
       _weight[i] = static_cast<std::uint16_t>(leftIsCloser ? fraction : kOne - 1 - fraction);
     }
-    _resample = near ? scaleKernels().resampleNear : scaleKernels().resampleFar;
+    const ScaleKernels& kernels = scaleKernels();
+    _resample = from == 2 * to   ? kernels.resampleToHalf
+                : to == 2 * from ? kernels.resampleToTwice
+                : near           ? kernels.resampleNear
+                                 : kernels.resampleFar;
   }
 
   Bytes _row;
   std::vector<std::uint16_t> _window, _pick, _weight;
-  decltype(ScaleKernels::resampleNear) _resample = nullptr;
+  ResampleRow _resample = nullptr;
 };
 
 void scaleFrame(const Source& source, std::uint8_t* dst, unsigned width, unsigned height) {

@@ -136,6 +136,48 @@ struct Resample {
   }
 };
 
+// The two ratios for which nothing but 0 and one half comes up as a fraction: the closer sample's 65535 /
+// 65536 are the sample less one, unless that is 0, and averages are those of two such bytes.
+
+struct ResampleToHalf {
+  using Lane = std::uint8_t;  // a unit is a byte of the output
+  const std::uint8_t* src;
+  std::uint8_t* dst;
+
+  template <class D>
+  HWY_INLINE void operator()(D d, std::size_t i) const {
+    const auto first = hn::LoadU(d, src + 2 * i), second = hn::LoadU(d, src + 2 * i + hn::Lanes(d));
+    hn::StoreU(hn::SaturatedSub(ConcatEven(d, second, first), hn::Set(d, 1)), d, dst + i);
+  }
+
+  void plain(std::size_t begin, std::size_t end) const {
+    for (std::size_t i = begin; i < end; ++i) dst[i] = lessOne(src[2 * i]);
+  }
+
+  static std::uint8_t lessOne(std::uint8_t sample) {
+    return static_cast<std::uint8_t>(sample - (sample != 0 ? 1 : 0));
+  }
+};
+
+struct ResampleToTwice {
+  using Lane = std::uint8_t;  // a unit is a byte of the input
+  const std::uint8_t* src;
+  std::uint8_t* dst;
+
+  template <class D>
+  HWY_INLINE void operator()(D d, std::size_t i) const {
+    const auto left = hn::SaturatedSub(hn::LoadU(d, src + i), hn::Set(d, 1));
+    hn::StoreInterleaved2(left, averageDown(left, hn::LoadU(d, src + i + 1)), d, dst + 2 * i);
+  }
+
+  void plain(std::size_t begin, std::size_t end) const {
+    for (std::size_t i = begin; i < end; ++i) {
+      dst[2 * i] = ResampleToHalf::lessOne(src[i]);
+      dst[2 * i + 1] = static_cast<std::uint8_t>((dst[2 * i] + src[i + 1]) / 2);
+    }
+  }
+};
+
 }  // namespace
 }  // namespace webrtc::detail::HWY_NAMESPACE
 HWY_AFTER_NAMESPACE();

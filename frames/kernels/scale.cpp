@@ -1,6 +1,5 @@
 #include "frames/kernels/scale.h"
 
-
 #include "frames/kernels/targets.h"
 
 // clang-format off
@@ -196,6 +195,15 @@ void resample(const std::uint8_t* src, const ResamplePlan& plan, std::uint8_t* d
   runInPlace(Resample<kNear>{src, plan, dst}, n);
 }
 
+void resampleToHalf(const std::uint8_t* src, const ResamplePlan& /*plan*/, std::uint8_t* dst, std::size_t n) {
+  run(ResampleToHalf{src, dst}, n);
+}
+
+void resampleToTwice(const std::uint8_t* src, const ResamplePlan& /*plan*/, std::uint8_t* dst,
+                     std::size_t n) {
+  run(ResampleToTwice{src, dst}, n / 2);
+}
+
 }  // namespace
 
 const ScaleKernels& scaleTable() {
@@ -209,6 +217,8 @@ const ScaleKernels& scaleTable() {
       .blend = blend,
       .resampleNear = resample<true>,
       .resampleFar = resample<false>,
+      .resampleToHalf = resampleToHalf,
+      .resampleToTwice = resampleToTwice,
   };
   return kTable;
 }

@@ -21,6 +21,9 @@ struct ResamplePlan {
   const std::uint16_t *window, *pick, *weight;
 };
 
+using ResampleRow = void (*)(const std::uint8_t* src, const ResamplePlan& plan, std::uint8_t* dst,
+                             std::size_t n);
+
 struct ScaleKernels {
   // dst[k] = average of src[2k] and src[2k + 1]. dst may be src, or anything before it.
   void (*halve)(const std::uint8_t* src, std::uint8_t* dst, std::size_t n);
@@ -40,8 +43,9 @@ struct ScaleKernels {
                 std::size_t n);
   // dst[i] from the two samples that plan has for it.
   // near: the columns 8 * k to 8 * k + 7 share a window of kWindow bytes, all of which must be readable.
-  void (*resampleNear)(const std::uint8_t* src, const ResamplePlan& plan, std::uint8_t* dst, std::size_t n);
-  void (*resampleFar)(const std::uint8_t* src, const ResamplePlan& plan, std::uint8_t* dst, std::size_t n);
+  ResampleRow resampleNear, resampleFar;
+  // The same without looking at the plan, where n is half or twice the width of the row.
+  ResampleRow resampleToHalf, resampleToTwice;
 };
 
 inline constexpr std::size_t kWindow = 16;

@@ -52,6 +52,8 @@ TEST(ScaleBilinearArithmetic, EqualsReferenceForEveryWidth) {
   for (unsigned width = 1; width <= 200 && !HasFailure(); ++width) {
     expectScaled(content, {width % 5 * 32 + 32, width % 6 + 1}, {width, width % 9 + 1});
     expectScaled(content, {content.number(1, 200), content.number(1, 9)}, {width, 4});
+    expectScaled(content, {2 * width, 3}, {width, 5});
+    expectScaled(content, {width, 3}, {2 * width, 5});
   }
 }
 
