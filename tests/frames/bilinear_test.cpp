@@ -68,15 +68,6 @@ TEST(ScaleBilinearArithmetic, EqualsReferenceForNotedRatios) {
   }
 }
 
-TEST(ScaleBilinearArithmetic, FlatValuesLoseOneWhereTheWidthChanges) {
-  const std::vector<std::uint8_t> src(64 * 32 * 3 / 2, 255);
-  std::uint8_t* destination = nullptr;
-  unsigned size = 0;
-  ASSERT_EQ(ScaleBilinear(src.data(), destination, 64, 32, 48, 32, size), 32);
-  const std::unique_ptr<std::uint8_t[]> owner(destination);
-  EXPECT_TRUE(std::all_of(destination, destination + size, [](std::uint8_t b) { return b == 254; }));
-}
-
 TEST(ScaleBilinearMemory, ReplacesADestinationThatIsTooSmall) {
   Content content(43);
   const Size from{48, 20}, to{31, 33};
