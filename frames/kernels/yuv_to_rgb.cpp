@@ -26,23 +26,20 @@ struct Components {
 
 template <class D, class V>
 HWY_INLINE V wordsOf(Rgb565, D d, const Components<V>& c) {
-  const V red = hn::And(c.r, hn::Set(d, 0xF800));
-  const V green = hn::And(hn::ShiftRight<5>(c.g), hn::Set(d, 0x07E0));
-  return hn::Xor(hn::Or3(red, green, hn::ShiftRight<11>(c.b)), hn::Set(d, 0x8410));
+  const V lower = hn::OrAnd(hn::ShiftRight<11>(c.b), hn::ShiftRight<5>(c.g), hn::Set(d, 0x07E0));
+  return hn::Xor(hn::OrAnd(lower, c.r, hn::Set(d, 0xF800)), hn::Set(d, 0x8410));
 }
 
 template <class D, class V>
 HWY_INLINE V wordsOf(Argb4444, D d, const Components<V>& c) {
-  const V red = hn::And(hn::ShiftRight<4>(c.r), hn::Set(d, 0x0F00));
-  const V green = hn::And(hn::ShiftRight<8>(c.g), hn::Set(d, 0x00F0));
-  return hn::Xor(hn::Or3(red, green, hn::ShiftRight<12>(c.b)), hn::Set(d, 0xF888));
+  const V lower = hn::OrAnd(hn::ShiftRight<12>(c.b), hn::ShiftRight<8>(c.g), hn::Set(d, 0x00F0));
+  return hn::Xor(hn::OrAnd(lower, hn::ShiftRight<4>(c.r), hn::Set(d, 0x0F00)), hn::Set(d, 0xF888));
 }
 
 template <class D, class V>
 HWY_INLINE V wordsOf(Argb1555, D d, const Components<V>& c) {
-  const V red = hn::And(hn::ShiftLeft<2>(c.r), hn::Set(d, 0xE000));
-  const V green = hn::And(hn::ShiftRight<5>(c.g), hn::Set(d, 0x07C0));
-  return hn::Xor(hn::Or3(red, green, hn::ShiftRight<11>(c.b)), hn::Set(d, 0x8410));
+  const V lower = hn::OrAnd(hn::ShiftRight<11>(c.b), hn::ShiftRight<5>(c.g), hn::Set(d, 0x07C0));
+  return hn::Xor(hn::OrAnd(lower, hn::ShiftLeft<2>(c.r), hn::Set(d, 0xE000)), hn::Set(d, 0x8410));
 }
 
 // 16-bit words.
