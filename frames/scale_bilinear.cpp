@@ -109,7 +109,7 @@ class PlaneScaler {
       blendRows(src, y, yStep, blended);
       if (resize) {
         blended[src.width] = blended[src.width - 1];
-        _resample(blended, _at.data(), _fraction.data(), dst, width);
+        _resample(blended, {_window.data(), _pick.data(), _weight.data()}, dst, width);
       } else if (width > 1) {
         // Kept: part of the arithmetic that applications compare with.
         dst[width - 1] = dst[width - 2];
@@ -135,20 +135,30 @@ class PlaneScaler {
 
   void planColumns(std::size_t from, std::size_t to) {
     const std::uint32_t xStep = step(from, to);
-    _row.assign(from + kBlendSlack, 0);
-    _at.resize(to);
-    _fraction.resize(to);
+    const bool near = xStep <= 2 * kOne;  // eight columns then span no more than a window
+    _row.assign(from + kWindow, 0);
+    _window.resize(to);
+    _pick.resize(to);
+    _weight.resize(to);
     for (std::uint32_t i = 0; i < to; ++i) {
-      const std::uint32_t x = i * xStep;
-      _at[i] = static_cast<std::uint16_t>(x / kOne);
-      _fraction[i] = static_cast<std::uint16_t>(x % kOne);
+      const std::uint32_t x = i * xStep, fraction = x % kOne;
+      const std::uint32_t window = (near ? i / 8 * 8 * xStep : x) / kOne;
+      const std::uint32_t left = x / kOne - window, right = left + 1;
+      const bool leftIsCloser = fraction < kOne / 2;
+      _window[i] = static_cast<std::uint16_t>(window);
+      _pick[i] = static_cast<std::uint16_t>(leftIsCloser ? left | right << 8 : right | left << 8);
+      _weight[i] = static_cast<std::uint16_t>(leftIsCloser ? fraction : kOne - 1 - fraction);
     }
-    _resample = xStep <= 2 * kOne ? scaleKernels().resampleNear : scaleKernels().resampleFar;
+    const ScaleKernels& kernels = scaleKernels();
+    _resample = from == 2 * to   ? kernels.resampleToHalf
+                : to == 2 * from ? kernels.resampleToTwice
+                : near           ? kernels.resampleNear
+                                 : kernels.resampleFar;
   }
 
   Bytes _row;
-  std::vector<std::uint16_t> _at, _fraction;
-  decltype(ScaleKernels::resampleNear) _resample = nullptr;
+  std::vector<std::uint16_t> _window, _pick, _weight;
+  ResampleRow _resample = nullptr;
 };
 
 void scaleFrame(const Source& source, std::uint8_t* dst, unsigned width, unsigned height) {

@@ -2,3 +2,4 @@
 BUILD_PACKAGES="cmake g++ ninja-build pkg-config libavcodec-dev libavformat-dev libavutil-dev libcli11-dev libhwy-dev libpng-dev libswscale-dev nlohmann-json3-dev"
 TEST_PACKAGES="$BUILD_PACKAGES binutils libgtest-dev"
 CI_PACKAGES="$TEST_PACKAGES clang-14 clang-format-14 libclang-rt-14-dev"
+FRAMES_BENCH_PACKAGES="libavfilter-dev libopencv-imgproc-dev libswscale-dev"

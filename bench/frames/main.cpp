@@ -2,8 +2,9 @@
 // and how many times the limit it takes. The limit is the shorter time of memcpy and a plain vector loop that
 // copy half of the bytes that the function reads and writes.
 //
-// Arguments: parts of functions' names to take only those; --seconds N, how long each contender of a case runs
-// in all (default 0.1); --target NAME, the instruction set of the frame functions instead of the best one.
+// Arguments: parts of functions' names to take only those; --seconds N, how long each contender of a case
+// runs in all (default 0.1); --target NAME, the instruction set of the frame functions instead of the best
+// one.
 #include <hwy/highway.h>
 #include <hwy/targets.h>
 
@@ -11,6 +12,7 @@
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
+#include <fstream>
 
 #include "bench/frames/measure.h"
 
@@ -67,9 +69,21 @@ std::string fixed(double value, int digits) {
   return text;
 }
 
+std::string processor() {
+  const std::string key = "model name";
+  std::ifstream info("/proc/cpuinfo");
+  for (std::string line; std::getline(info, line);) {
+    const std::size_t colon = line.find(": ");
+    if (line.compare(0, key.size(), key) == 0 && colon != std::string::npos) return line.substr(colon + 2);
+  }
+  return "unknown";
+}
+
 class Table {
  public:
   void head() {
+    std::printf("Processor: %s; instruction set of the frame functions: %s\n\n", processor().c_str(),
+                hwy::TargetName(hwy::SupportedAndGeneratedTargets().front()));
     std::puts("| Function | Size | Time, us | Best peer | Peer / ours | Ours / limit | Goal | |");
     std::puts("| --- | --- | ---: | --- | ---: | ---: | --- | --- |");
   }
@@ -109,7 +123,8 @@ class Table {
 int main(int argc, char** argv) {
   Options options;
   if (!parse(argc, argv, options)) {
-    std::fprintf(stderr, "usage: %s [--seconds N] [--target NAME] [PART OF A FUNCTION'S NAME ...]\n", argv[0]);
+    std::fprintf(stderr, "usage: %s [--seconds N] [--target NAME] [PART OF A FUNCTION'S NAME ...]\n",
+                 argv[0]);
     return 2;
   }
   if (!options.target.empty() && !choose(options.target)) {

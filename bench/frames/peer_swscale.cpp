@@ -5,6 +5,7 @@
 
 extern "C" {
 #include <libavutil/imgutils.h>
+#include <libavutil/log.h>
 #include <libswscale/swscale.h>
 }
 #endif
@@ -63,6 +64,7 @@ struct Picture {
 Contenders swscale(Format from, Size fromSize, Format to, Size toSize, const Buffers& buffers,
                    bool bottomUp) {
   Contenders result;
+  av_log_set_level(AV_LOG_ERROR);  // it warns of conversions that it has in plain C only
   const auto add = [&](const char* name, int flags) {
     std::shared_ptr<SwsContext> context(
         sws_getContext(static_cast<int>(fromSize.width), static_cast<int>(fromSize.height), pixelFormat(from),

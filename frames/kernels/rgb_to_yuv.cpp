@@ -9,6 +9,7 @@
 #include <hwy/foreach_target.h>
 #include <hwy/highway.h>
 #include "frames/kernels/run-inl.h"
+#include "frames/kernels/lanes-inl.h"
 // clang-format on
 
 HWY_BEFORE_NAMESPACE();
@@ -16,26 +17,46 @@ namespace webrtc::detail::HWY_NAMESPACE {
 namespace {
 namespace hn = hwy::HWY_NAMESPACE;
 
-// The layouts for whole vectors of components, one byte per pixel.
+// The components of the pixels at even or odd columns, times 256, one a lane of 16 bits.
+template <class V>
+struct Components {
+  V r, g, b;
+};
 
 template <class D, class V>
-HWY_INLINE void loadPixels(Bgr24, D d, const std::uint8_t* from, V& r, V& g, V& b) {
-  hn::LoadInterleaved3(d, from, b, g, r);
+HWY_INLINE void splitColumns(D d16, V r, V g, V b, Components<hn::Vec<D>>& even,
+                             Components<hn::Vec<D>>& odd) {
+  even = {evenBytes(d16, r), evenBytes(d16, g), evenBytes(d16, b)};
+  odd = {oddBytes(d16, r), oddBytes(d16, g), oddBytes(d16, b)};
 }
 
 template <class D, class V>
-HWY_INLINE void loadPixels(Argb, D d, const std::uint8_t* from, V& r, V& g, V& b) {
-  V ignored;
-  hn::LoadInterleaved4(d, from, ignored, r, g, b);
+HWY_INLINE void loadPixels(Bgr24, D d16, const std::uint8_t* from, Components<V>& even, Components<V>& odd) {
+  const hn::Repartition<std::uint8_t, D> d8;
+  hn::Vec<decltype(d8)> b, g, r;
+  hn::LoadInterleaved3(d8, from, b, g, r);
+  splitColumns(d16, r, g, b, even, odd);
 }
 
 template <class D, class V>
-HWY_INLINE void loadPixels(Rgb565, D d, const std::uint8_t* from, V& r, V& g, V& b) {
-  V low, high;
-  hn::LoadInterleaved2(d, from, low, high);
-  r = hn::And(high, hn::Set(d, 0xF8));
-  g = hn::And(hn::Or(hn::ShiftLeft<5>(high), hn::ShiftRight<3>(low)), hn::Set(d, 0xFC));
-  b = hn::ShiftLeft<3>(low);
+HWY_INLINE void loadPixels(Argb, D d16, const std::uint8_t* from, Components<V>& even, Components<V>& odd) {
+  const hn::Repartition<std::uint8_t, D> d8;
+  hn::Vec<decltype(d8)> ignored, r, g, b;
+  hn::LoadInterleaved4(d8, from, ignored, r, g, b);
+  splitColumns(d16, r, g, b, even, odd);
+}
+
+template <class D, class V>
+HWY_INLINE void loadPixels(Rgb565, D d16, const std::uint8_t* from, Components<V>& even, Components<V>& odd) {
+  const hn::Repartition<std::uint8_t, D> d8;
+  const V front = hn::BitCast(d16, hn::LoadU(d8, from));
+  const V back = hn::BitCast(d16, hn::LoadU(d8, from + hn::Lanes(d8)));
+  const auto widen = [d16](V words) HWY_ATTR {
+    return Components<V>{hn::And(words, hn::Set(d16, 0xF800)),
+                         hn::And(hn::ShiftLeft<5>(words), hn::Set(d16, 0xFC00)), hn::ShiftLeft<11>(words)};
+  };
+  even = widen(ConcatEven(d16, back, front));
+  odd = widen(ConcatOdd(d16, back, front));
 }
 
 template <class Layout, bool kChroma>
@@ -44,45 +65,31 @@ struct Row {
   const std::uint8_t* src;
   std::uint8_t *y, *u, *v;
 
+  // The sums fit 16 bits, those of chroma with a sign. The offset of the results is added before the upper
+  // byte is taken: what wraps then would not be part of it.
   template <class D>
   HWY_INLINE void operator()(D d16, std::size_t i) const {
     const hn::Repartition<std::uint8_t, D> d8;
-    hn::Vec<decltype(d8)> r, g, b;
-    loadPixels(Layout{}, d8, src + 2 * i * Layout::kBytes, r, g, b);
-
-    // The sums of luma fit 16 bits without a sign: at most 220 * 255 + 128.
-    const auto low = hn::Set(d16, 0xFF);
-    const auto r16 = hn::BitCast(d16, r), g16 = hn::BitCast(d16, g), b16 = hn::BitCast(d16, b);
-    const auto rEven = hn::And(r16, low), gEven = hn::And(g16, low), bEven = hn::And(b16, low);
-    const auto even = hn::ShiftRight<8>(luma(d16, rEven, gEven, bEven));
-    const auto odd = luma(d16, hn::ShiftRight<8>(r16), hn::ShiftRight<8>(g16), hn::ShiftRight<8>(b16));
-    const auto sum = hn::BitCast(d8, hn::Or(even, hn::AndNot(low, odd)));
-    hn::StoreU(hn::Add(sum, hn::Set(d8, 16)), d8, y + 2 * i);
+    Components<hn::Vec<D>> even, odd;
+    loadPixels(Layout{}, d16, src + 2 * i * Layout::kBytes, even, odd);
+    hn::StoreU(upperBytes(luma(even), luma(odd)), d8, y + 2 * i);
     if constexpr (kChroma) {
-      storeChroma(d16, rEven, gEven, bEven, -38, -74, 112, u + i);
-      storeChroma(d16, rEven, gEven, bEven, 112, -94, -18, v + i);
+      const auto offset = hn::Set(d16, 128 * 256 + 128);
+      const auto cb =
+          hn::Sub(hn::Add(times<112>(even.b), offset), hn::Add(times<38>(even.r), times<74>(even.g)));
+      const auto cr =
+          hn::Sub(hn::Add(times<112>(even.r), offset), hn::Add(times<94>(even.g), times<18>(even.b)));
+      const hn::Half<decltype(d8)> half;
+      const auto both = ConcatOdd(d8, hn::BitCast(d8, cr), hn::BitCast(d8, cb));
+      hn::StoreU(LowerHalf(half, both), half, u + i);
+      hn::StoreU(UpperHalf(half, both), half, v + i);
     }
   }
 
-  template <class D, class V>
-  static HWY_INLINE V luma(D d16, V r, V g, V b) {
-    const V red = hn::Mul(r, hn::Set(d16, 66));
-    const V green = hn::Mul(g, hn::Set(d16, 129));
-    const V blue = hn::Mul(b, hn::Set(d16, 25));
-    return hn::Add(hn::Add(red, green), hn::Add(blue, hn::Set(d16, 128)));
-  }
-
-  // The sums fit 16 bits with their sign: at most 112 * 255 + 128 either way.
-  template <class D, class V>
-  static HWY_INLINE void storeChroma(D, V r, V g, V b, std::int16_t cr, std::int16_t cg, std::int16_t cb,
-                                     std::uint8_t* to) {
-    const hn::RebindToSigned<D> di16;
-    const hn::Rebind<std::uint8_t, D> d8;
-    const auto red = hn::Mul(hn::BitCast(di16, r), hn::Set(di16, cr));
-    const auto green = hn::Mul(hn::BitCast(di16, g), hn::Set(di16, cg));
-    const auto blue = hn::Mul(hn::BitCast(di16, b), hn::Set(di16, cb));
-    const auto sum = hn::Add(hn::Add(red, green), hn::Add(blue, hn::Set(di16, 128)));
-    hn::StoreU(hn::DemoteTo(d8, hn::Add(hn::ShiftRight<8>(sum), hn::Set(di16, 128))), d8, to);
+  template <class V>
+  static HWY_INLINE V luma(const Components<V>& c) {
+    const V offset = hn::Set(hn::DFromV<V>(), 16 * 256 + 128);
+    return hn::Add(hn::Add(times<66>(c.r), times<129>(c.g)), hn::Add(times<25>(c.b), offset));
   }
 
   void plain(std::size_t begin, std::size_t end) const {

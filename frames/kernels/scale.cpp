@@ -1,7 +1,5 @@
 #include "frames/kernels/scale.h"
 
-#include <cstring>
-
 #include "frames/kernels/targets.h"
 
 // clang-format off
@@ -184,13 +182,26 @@ void expandInsert(const std::uint8_t* above, const std::uint8_t* below, std::uin
 
 void blend(const std::uint8_t* row0, const std::uint8_t* row1, unsigned fraction, std::uint8_t* dst,
            std::size_t n) {
-  run(Blend{row0, row1, static_cast<std::uint16_t>(fraction), dst}, n);
+  if (fraction == 128) {
+    run(BlendHalves{row0, row1, dst}, n);
+  } else {
+    run(Blend{row0, row1, static_cast<std::uint16_t>(fraction), dst}, n);
+  }
 }
 
+// Forward only: windows are those of whole groups of columns.
 template <bool kNear>
-void resample(const std::uint8_t* src, const std::uint16_t* at, const std::uint16_t* fraction,
-              std::uint8_t* dst, std::size_t n) {
-  run(Resample<kNear>{src, at, fraction, dst}, n);
+void resample(const std::uint8_t* src, const ResamplePlan& plan, std::uint8_t* dst, std::size_t n) {
+  runInPlace(Resample<kNear>{src, plan, dst}, n);
+}
+
+void resampleToHalf(const std::uint8_t* src, const ResamplePlan& /*plan*/, std::uint8_t* dst, std::size_t n) {
+  run(ResampleToHalf{src, dst}, n);
+}
+
+void resampleToTwice(const std::uint8_t* src, const ResamplePlan& /*plan*/, std::uint8_t* dst,
+                     std::size_t n) {
+  run(ResampleToTwice{src, dst}, n / 2);
 }
 
 }  // namespace
@@ -206,6 +217,8 @@ const ScaleKernels& scaleTable() {
       .blend = blend,
       .resampleNear = resample<true>,
       .resampleFar = resample<false>,
+      .resampleToHalf = resampleToHalf,
+      .resampleToTwice = resampleToTwice,
   };
   return kTable;
 }

@@ -14,6 +14,16 @@ struct ExpandRows {
   void (*insert)(const std::uint8_t* above, const std::uint8_t* below, std::uint8_t* dst, std::size_t n);
 };
 
+// Columns of a resampled row, each of them
+//   (closer * (65535 - weight) + other * weight) / 65536
+// with a weight below 32768. closer and other lie pick's low and high byte behind window.
+struct ResamplePlan {
+  const std::uint16_t *window, *pick, *weight;
+};
+
+using ResampleRow = void (*)(const std::uint8_t* src, const ResamplePlan& plan, std::uint8_t* dst,
+                             std::size_t n);
+
 struct ScaleKernels {
   // dst[k] = average of src[2k] and src[2k + 1]. dst may be src, or anything before it.
   void (*halve)(const std::uint8_t* src, std::uint8_t* dst, std::size_t n);
@@ -31,15 +41,14 @@ struct ScaleKernels {
   // dst = (row0 * (256 - fraction) + row1 * fraction) / 256, fraction 1 to 255.
   void (*blend)(const std::uint8_t* row0, const std::uint8_t* row1, unsigned fraction, std::uint8_t* dst,
                 std::size_t n);
-  // dst[i] = (src[at[i] + 1] * fraction[i] + src[at[i]] * (65535 - fraction[i])) / 65536. at must not fall.
-  // near: at[i + 7] - at[i] is never above 14, and kBlendSlack bytes behind the last sample are readable.
-  void (*resampleNear)(const std::uint8_t* src, const std::uint16_t* at, const std::uint16_t* fraction,
-                       std::uint8_t* dst, std::size_t n);
-  void (*resampleFar)(const std::uint8_t* src, const std::uint16_t* at, const std::uint16_t* fraction,
-                      std::uint8_t* dst, std::size_t n);
+  // dst[i] from the two samples that plan has for it.
+  // near: the columns 8 * k to 8 * k + 7 share a window of kWindow bytes, all of which must be readable.
+  ResampleRow resampleNear, resampleFar;
+  // The same without looking at the plan, where n is half or twice the width of the row.
+  ResampleRow resampleToHalf, resampleToTwice;
 };
 
-inline constexpr std::size_t kBlendSlack = 16;
+inline constexpr std::size_t kWindow = 16;
 
 const ScaleKernels& scaleKernels();
 

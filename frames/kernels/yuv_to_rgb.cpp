@@ -9,6 +9,7 @@
 #include <hwy/foreach_target.h>
 #include <hwy/highway.h>
 #include "frames/kernels/run-inl.h"
+#include "frames/kernels/lanes-inl.h"
 // clang-format on
 
 HWY_BEFORE_NAMESPACE();
@@ -25,23 +26,20 @@ struct Components {
 
 template <class D, class V>
 HWY_INLINE V wordsOf(Rgb565, D d, const Components<V>& c) {
-  const V red = hn::And(c.r, hn::Set(d, 0xF800));
-  const V green = hn::And(hn::ShiftRight<5>(c.g), hn::Set(d, 0x07E0));
-  return hn::Xor(hn::Or3(red, green, hn::ShiftRight<11>(c.b)), hn::Set(d, 0x8410));
+  const V lower = hn::OrAnd(hn::ShiftRight<11>(c.b), hn::ShiftRight<5>(c.g), hn::Set(d, 0x07E0));
+  return hn::Xor(hn::OrAnd(lower, c.r, hn::Set(d, 0xF800)), hn::Set(d, 0x8410));
 }
 
 template <class D, class V>
 HWY_INLINE V wordsOf(Argb4444, D d, const Components<V>& c) {
-  const V red = hn::And(hn::ShiftRight<4>(c.r), hn::Set(d, 0x0F00));
-  const V green = hn::And(hn::ShiftRight<8>(c.g), hn::Set(d, 0x00F0));
-  return hn::Xor(hn::Or3(red, green, hn::ShiftRight<12>(c.b)), hn::Set(d, 0xF888));
+  const V lower = hn::OrAnd(hn::ShiftRight<12>(c.b), hn::ShiftRight<8>(c.g), hn::Set(d, 0x00F0));
+  return hn::Xor(hn::OrAnd(lower, hn::ShiftRight<4>(c.r), hn::Set(d, 0x0F00)), hn::Set(d, 0xF888));
 }
 
 template <class D, class V>
 HWY_INLINE V wordsOf(Argb1555, D d, const Components<V>& c) {
-  const V red = hn::And(hn::ShiftLeft<2>(c.r), hn::Set(d, 0xE000));
-  const V green = hn::And(hn::ShiftRight<5>(c.g), hn::Set(d, 0x07C0));
-  return hn::Xor(hn::Or3(red, green, hn::ShiftRight<11>(c.b)), hn::Set(d, 0x8410));
+  const V lower = hn::OrAnd(hn::ShiftRight<11>(c.b), hn::ShiftRight<5>(c.g), hn::Set(d, 0x07C0));
+  return hn::Xor(hn::OrAnd(lower, hn::ShiftLeft<2>(c.r), hn::Set(d, 0xE000)), hn::Set(d, 0x8410));
 }
 
 // 16-bit words.
@@ -55,19 +53,18 @@ HWY_INLINE void storePixels(Layout layout, D d16, const Components<V>& even, con
 }
 
 // The bytes of a component in the order of the columns.
-template <class D, class V>
-HWY_INLINE auto bytesInOrder(D d16, V even, V odd) {
-  const hn::Repartition<std::uint8_t, D> d8;
-  const V merged = hn::OrAnd(hn::ShiftRight<8>(even), odd, hn::Set(d16, 0xFF00));
-  return hn::Xor(hn::BitCast(d8, merged), hn::Set(d8, 0x80));
+template <class V>
+HWY_INLINE auto bytesInOrder(V even, V odd) {
+  const auto bytes = upperBytes(even, odd);
+  return hn::Xor(bytes, hn::Set(hn::DFromV<decltype(bytes)>(), 0x80));
 }
 
 template <class D, class V>
 HWY_INLINE void storePixels(Bgr24, D d16, const Components<V>& even, const Components<V>& odd,
                             std::uint8_t* to) {
   const hn::Repartition<std::uint8_t, D> d8;
-  hn::StoreInterleaved3(bytesInOrder(d16, even.b, odd.b), bytesInOrder(d16, even.g, odd.g),
-                        bytesInOrder(d16, even.r, odd.r), d8, to);
+  hn::StoreInterleaved3(bytesInOrder(even.b, odd.b), bytesInOrder(even.g, odd.g), bytesInOrder(even.r, odd.r),
+                        d8, to);
 }
 
 template <std::size_t kR, std::size_t kG, std::size_t kB, class D, class V>
@@ -76,9 +73,9 @@ HWY_INLINE void storePixels(FourBytes<kR, kG, kB>, D d16, const Components<V>& e
   const hn::Repartition<std::uint8_t, D> d8;
   const std::size_t lanes = hn::Lanes(d8);
   hn::Vec<decltype(d8)> place[4] = {};
-  place[kR] = bytesInOrder(d16, even.r, odd.r);
-  place[kG] = bytesInOrder(d16, even.g, odd.g);
-  place[kB] = bytesInOrder(d16, even.b, odd.b);
+  place[kR] = bytesInOrder(even.r, odd.r);
+  place[kG] = bytesInOrder(even.g, odd.g);
+  place[kB] = bytesInOrder(even.b, odd.b);
   place[6 - kR - kG - kB] = hn::Set(d8, 255);
   const auto front0 = hn::BitCast(d16, InterleaveLower(d8, place[0], place[1]));
   const auto front1 = hn::BitCast(d16, InterleaveUpper(d8, place[0], place[1]));

@@ -112,17 +112,6 @@ TEST(PadBottomRows, MovesChromaAndFillsInPlace) {
   EXPECT_EQ(outSize, 99u);
 }
 
-TEST(PadBottomRows, SmallFrame) {
-  std::uint8_t buffer[36];
-  for (std::uint8_t i = 0; i < 36; ++i) buffer[i] = i;
-  unsigned outSize = 0;
-  ASSERT_EQ(PadI420BottomRows(buffer, 36, 4, 4, 2, outSize), 0);
-  EXPECT_EQ(outSize, 36u);
-  const std::uint8_t behind[] = {0, 0, 0, 0, 0, 0, 0, 0, 16, 17, 18, 19, 127, 127, 20, 21, 22, 23, 127, 127};
-  EXPECT_TRUE(std::equal(buffer + 16, buffer + 36, behind));
-  EXPECT_EQ(buffer[15], 15);
-}
-
 TEST(CutFrame, EqualsReferenceForEverySize) {
   Content content(54);
   forEachSize([&](Size from) {

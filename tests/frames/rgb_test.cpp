@@ -98,26 +98,6 @@ TEST(I420ToRgbColour, IsExactForEverySample) {
   }
 }
 
-TEST(I420ToRgbColour, KnownColours) {
-  struct {
-    std::uint8_t y, u, v, b, g, r;
-  } const colours[] = {{16, 128, 128, 0, 0, 0},
-                       {235, 128, 128, 255, 255, 255},
-                       {255, 128, 128, 255, 255, 255},
-                       {81, 90, 240, 0, 0, 255}};
-  for (const auto& c : colours) {
-    const std::uint8_t src[] = {c.y, c.y, c.y, c.y, c.u, c.v};
-    std::uint8_t dst[16];
-    ASSERT_EQ(ConvertI420ToARGB(src, dst, 2, 2), 16);
-    for (int k = 0; k < 16; k += 4) {
-      EXPECT_EQ(dst[k], c.b);
-      EXPECT_EQ(dst[k + 1], c.g);
-      EXPECT_EQ(dst[k + 2], c.r);
-      EXPECT_EQ(dst[k + 3], 255);
-    }
-  }
-}
-
 TEST(Rgb24ToArgb, StepsRowsUpByTheSurplusOfTheStride) {
   Content content(2);
   forEachSize([&](Size s) {
@@ -172,18 +152,6 @@ TEST_P(RgbToI420, EqualsReferenceForEverySize) {
   EXPECT_EQ(function.call(nullptr, nullptr, 0, 2), -1);
   EXPECT_EQ(function.call(nullptr, nullptr, 2, 0), -1);
   EXPECT_EQ(function.call(nullptr, nullptr, 0x10000, 0x10000), -1);
-}
-
-TEST(RgbToI420Colour, WhiteAndBlack) {
-  for (const auto& [sample, luma] : {std::pair{255, 235}, std::pair{0, 16}}) {
-    const std::vector<std::uint8_t> src(12, static_cast<std::uint8_t>(sample));
-    std::uint8_t dst[6];
-    ASSERT_EQ(ConvertRGB24ToI420(2, 2, src.data(), dst), 6);
-    EXPECT_EQ(dst[0], luma);
-    EXPECT_EQ(dst[3], luma);
-    EXPECT_EQ(dst[4], 128);
-    EXPECT_EQ(dst[5], 128);
-  }
 }
 
 TEST(Rgb24ToI420Centred, EqualsReferenceWhereverItCropsAndPads) {

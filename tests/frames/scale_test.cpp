@@ -47,13 +47,6 @@ TEST_P(ScaleInPlace, EqualsReferenceForEverySize) {
   EXPECT_EQ(function.call(0xFFFFFFFF, 0xFFFFFFFF, nullptr), -1);
 }
 
-TEST(ScaleUpHalf, DoublesFromTheBytesInFront) {
-  std::uint8_t buffer[12] = {10, 20, 30, 40, 50, 60};
-  const std::uint8_t expected[12] = {10, 10, 15, 20, 25, 30, 35, 40, 45, 50, 55, 60};
-  EXPECT_EQ(ScaleI420UpHalfFrame(4, 2, buffer), 12);
-  EXPECT_TRUE(std::equal(buffer, buffer + 12, expected));
-}
-
 // --- Scalers that may grow the buffer ---
 
 struct Growing {
@@ -157,20 +150,6 @@ TEST_P(ScaleGrowing, RefusesWithoutTouchingAnything) {
   unsigned width = 0, height = 0;
   EXPECT_EQ(function.call(48, 48, none, 1 << 20, width, height), -1);
   EXPECT_EQ(function.call(0x80000000, 0x80000000, none, 0xFFFFFFFF, width, height), -1);
-}
-
-TEST(ScaleDown1_3, SizesThatItTakes) {
-  const struct {
-    unsigned width, height, outWidth, outHeight;  // 0: refused
-  } cases[] = {{176, 144, 58, 48}, {178, 150, 60, 50}, {176, 22, 0, 0}, {176, 147, 0, 0}, {4, 12, 0, 0}};
-  for (const auto& c : cases) {
-    Owned buffer(Bytes(50000));
-    unsigned width = 0, height = 0;
-    const int result = ScaleI420Down1_3(c.width, c.height, buffer.memory, 50000, width, height);
-    EXPECT_EQ(result, c.outWidth == 0 ? -1 : static_cast<int>(c.outHeight * 3 * (c.outWidth / 2)));
-    EXPECT_EQ(width, c.outWidth);
-    EXPECT_EQ(height, c.outHeight);
-  }
 }
 
 }  // namespace

@@ -203,25 +203,6 @@ TEST_P(CentredConversion, RefusesBadSizes) {
   EXPECT_EQ(call(nullptr, 2, 2, nullptr, 0x10000, 0x10000), -1);
 }
 
-TEST(Yuy2Centred, PadsTheMiddleOfALargerFrame) {
-  const std::vector<std::uint8_t> src(320 * 240 * 2, 90);
-  std::vector<std::uint8_t> dst(352 * 288 * 3 / 2, 1);
-  ASSERT_EQ(ConvertYUY2ToI420(src.data(), 320, 240, dst.data(), 352, 288), 352 * 288 * 3 / 2);
-  const auto luma = [&](int row, int x) { return int{dst[static_cast<std::size_t>(row * 352 + x)]}; };
-  const auto chroma = [&](int row, int x) {
-    return int{dst[static_cast<std::size_t>(352 * 288 + row * 176 + x)]};
-  };
-  EXPECT_EQ(luma(23, 176), 0);
-  EXPECT_EQ(luma(24, 15), 0);
-  EXPECT_EQ(luma(24, 16), 90);
-  EXPECT_EQ(luma(263, 335), 90);
-  EXPECT_EQ(luma(263, 336), 0);
-  EXPECT_EQ(luma(264, 176), 0);
-  EXPECT_EQ(chroma(11, 80), 127);
-  EXPECT_EQ(chroma(12, 7), 127);
-  EXPECT_EQ(chroma(12, 8), 90);
-}
-
 TEST(Nv12Crop, CopiesTheRectangle) {
   Content content(14);
   for (unsigned k = 0; k < 300 && !HasFailure(); ++k) {

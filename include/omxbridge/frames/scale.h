@@ -33,12 +33,12 @@ OMXBRIDGE_EXPORT int ScaleI420DownHalfFrame(unsigned int width, unsigned int hei
 // (width / 2) * height * 3, four times the size of the frame made.
 OMXBRIDGE_EXPORT int ScaleI420FrameQuarter(unsigned int width, unsigned int height, unsigned char* buffer);
 
-// --- In the caller's buffer, which may grow
-// ----------------------------------------------------------------- bufferSize: capacity of buffer in bytes,
-// at least the source frame. outWidth and outHeight tell the new size, and with it (outWidth * outHeight * 3
-// / 2, when above bufferSize) the new capacity. Results: outHeight * 3 * (outWidth / 2); -1, with buffer,
-// outWidth and outHeight as they were, for a null buffer, sizes that do not suit, a bufferSize below width *
-// height * 3 / 2, or a result above 2147483647.
+// --- In the caller's buffer, which may grow ---------------------------------------------------------------
+
+// bufferSize: capacity of buffer in bytes, at least the source frame. outWidth and outHeight tell the new
+// size, and with it the new capacity, where outWidth * outHeight * 3 / 2 is above bufferSize.
+// Results: outHeight * 3 * (outWidth / 2); -1, with buffer, outWidth and outHeight as they were, for a null
+// buffer, sizes that do not suit, a bufferSize below width * height * 3 / 2, or a result above 2147483647.
 
 // A third of each direction: of each 3 x 3 block the average of the upper left 2 x 2. Sizes: above 5, even,
 // height / 3 even. An odd outWidth is raised by one: the extra pixel averages the last column's two samples.
@@ -66,7 +66,8 @@ OMXBRIDGE_EXPORT int ScaleI420Up2(unsigned int width, unsigned int height, unsig
 // the frame then keep their value; otherwise replaced (and released last), and destinationSize becomes that
 // number. It may be the source's memory. For odd sizes, planes of (dstWidth / 2) x (dstHeight / 2) directly
 // follow each other and the rest of the frame is left alone (0 in a new array).
-// Results: dstHeight; -1, nothing touched, for a zero size, one above 65535, or an output above 2147483647.
+// Results: dstHeight; -1, nothing touched, for a null source, a zero size, one above 65535, or an output
+// above 2147483647.
 OMXBRIDGE_EXPORT int ScaleBilinear(const unsigned char* source, unsigned char*& destination,
                                    unsigned int srcWidth, unsigned int srcHeight, unsigned int dstWidth,
                                    unsigned int dstHeight, unsigned int& destinationSize);
