@@ -3,7 +3,7 @@
 #include <stdlib.h>
 
 #include <CLI/CLI.hpp>
-#include <charconv>
+#include <algorithm>
 #include <functional>
 
 #include <omxhost/device.h>
@@ -92,12 +92,15 @@ std::optional<int> parseProfile(std::string_view name) {
 }
 
 template <uint64_t low, uint64_t high>
-std::optional<uint64_t> parseCount(std::string_view text) {
-  uint64_t count = 0;
-  const char* const end = text.data() + text.size();
-  const auto [last, error] = std::from_chars(text.data(), end, count);
-  const bool good = error == std::errc() && last == end && count >= low && count <= high;
-  return good ? std::optional(count) : std::nullopt;
+std::optional<uint64_t> parseCountWithin(std::string_view text) {
+  const auto count = parseCount(text);
+  return count && *count >= low && *count <= high ? count : std::nullopt;
+}
+
+std::optional<int64_t> parseDelay(std::string_view text) {
+  constexpr int64_t kLongest = 10'000'000;
+  const auto time = parseTime(text);
+  return time && *time <= kLongest ? time : std::nullopt;
 }
 
 void addPictureOutput(CLI::App& app, std::string& path, std::string& format) {
@@ -117,8 +120,53 @@ struct CodingOptions {
   }
 };
 
+void addChanges(CLI::App& app, std::vector<Change>& changes) {
+  const auto take = [&changes](const std::vector<std::pair<std::string, std::string>>& pairs) {
+    for (const auto& [when, what] : pairs) {
+      const auto time = parseTime(when);
+      if (!time) throw CLI::ValidationError("--at", "\"" + when + "\" is not a time as 3s or 500ms");
+      auto change = parseChange(what);
+      if (!change) {
+        throw CLI::ValidationError("--at",
+                                   "\"" + what +
+                                       "\" is not a change as bitrate=300k, keyframe, rotate=90 (0, 90, "
+                                       "180, 270), fps=15 or intra=30");
+      }
+      change->at = *time;
+      changes.push_back(std::move(*change));
+    }
+    std::stable_sort(changes.begin(), changes.end(),
+                     [](const Change& one, const Change& other) { return one.at < other.at; });
+  };
+  app.add_option_function<std::vector<std::pair<std::string, std::string>>>(
+         "--at", take,
+         "Change something at this time of the video: bitrate=300k, keyframe, rotate=90, fps=15 or intra=30; "
+         "may be given several times")
+      ->type_name("TIME CHANGE")
+      ->allow_extra_args(false);
+}
+
+void addImpairments(CLI::App& app, Impairments& impairments) {
+  addParsed<double>(
+      app, "--loss", "PERCENT", "a share of packets as 2%", parseShare,
+      [&impairments](double share) { impairments.loss = share; },
+      "Lose this share of the packets between the ends, as 2%");
+  addParsed<double>(
+      app, "--reorder", "PERCENT", "a share of packets as 1%", parseShare,
+      [&impairments](double share) { impairments.reorder = share; },
+      "Have this share of the packets overtaken by others, as 1%");
+  addParsed<int64_t>(
+      app, "--delay", "TIME", "a time up to 10s, as 80ms", parseDelay,
+      [&impairments](int64_t delay) { impairments.delay = delay; },
+      "Time that packets and key-frame requests are under way, as 80ms");
+  addParsed<uint64_t>(
+      app, "--seed", "NUMBER", "a number", parseCount,
+      [&impairments](uint64_t seed) { impairments.seed = seed; },
+      "What decides which packets are hit (default 1)");
+}
+
 void addCall(CLI::App& app, Options& options, CodingOptions& coding) {
-  EncoderSettings& encoder = options.call.encoder;
+  EncoderSettings& encoder = options.call.sender.encoder;
   app.footer(std::string(kCallFooter) + kExitCodes);
   app.add_option("INPUT", options.source.path, "Video file, raw I420, or -")->type_name("");
   addParsed<Size>(
@@ -129,8 +177,8 @@ void addCall(CLI::App& app, Options& options, CodingOptions& coding) {
       [&options](FrameRate rate) { options.source.rate = rate; },
       "Frames a second, as 30, 29.97 or 30000/1001 (default: the input's own, or 30)");
   addParsed<uint64_t>(
-      app, "-n,--frames", "COUNT", "a number from 1 on", parseCount<1, uint64_t{1} << 40>,
-      [&options](uint64_t count) { options.call.frameLimit = count; },
+      app, "-n,--frames", "COUNT", "a number from 1 on", parseCountWithin<1, uint64_t{1} << 40>,
+      [&options](uint64_t count) { options.call.sender.frameLimit = count; },
       "End after this many frames (default: all; 300 of the scene)");
   addParsed<uint32_t>(
       app, "-b,--bitrate", "RATE", "a rate from 1k to 1000M, as 800k or 1.5M", parseBitRate,
@@ -140,18 +188,20 @@ void addCall(CLI::App& app, Options& options, CodingOptions& coding) {
       [&encoder](int profile) { encoder.profile = profile; },
       "H.264 profile: baseline (default), main or high");
   addParsed<uint64_t>(
-      app, "-k,--key-interval", "COUNT", "a number from 0 to 100000", parseCount<0, 100000>,
+      app, "-k,--key-interval", "COUNT", "a number from 0 to 100000", parseCountWithin<0, 100000>,
       [&encoder](uint64_t count) { encoder.keyInterval = static_cast<int>(count); },
       "Frames from one key frame to the next; 0: only the first is one (default 150)");
   addParsed<uint64_t>(
-      app, "--refs", "COUNT", "a number from 1 to 16", parseCount<1, 16>,
+      app, "--refs", "COUNT", "a number from 1 to 16", parseCountWithin<1, 16>,
       [&encoder](uint64_t count) { encoder.references = static_cast<uint32_t>(count); },
       "Reference frames, up to 16 (default 1)");
   addChoice(app, "--entropy", coding.entropy, {"cavlc", "cabac"},
             "Entropy coding (default cavlc for baseline, cabac for the others)");
   app.add_flag(
-      "-r,--realtime", options.call.realTime,
+      "-r,--realtime", options.call.sender.realTime,
       "Pace the frames by their rate and drop those that find no free buffer; else as fast as it goes");
+  addChanges(app, options.call.sender.changes);
+  addImpairments(app, options.call.impairments);
   app.add_option("--stream", options.call.streamPath,
                  "Write the coded stream (H.264 Annex B) here; - for standard output")
       ->type_name("FILE");
@@ -204,7 +254,7 @@ std::string contradiction(const Options& options) {
 
 std::optional<Options> parseCommandLine(int argc, char** argv, ExitCode& exitCode) {
   Options options;
-  options.call.encoder.keyInterval = 150;
+  options.call.sender.encoder.keyInterval = 150;
   CodingOptions coding;
   CLI::App app("Video calls through the device's H.264 encoder and decoder.", "omxbridge");
   app.require_subcommand(1);
@@ -238,8 +288,9 @@ std::optional<Options> parseCommandLine(int argc, char** argv, ExitCode& exitCod
     exitCode = app.exit(error) == 0 ? ExitCode::Done : ExitCode::Usage;
     return std::nullopt;
   }
-  coding.apply(options.call.encoder);
-  if (options.source.path.empty() && options.call.frameLimit == 0) options.call.frameLimit = kSceneFrames;
+  coding.apply(options.call.sender.encoder);
+  if (options.source.path.empty() && options.call.sender.frameLimit == 0)
+    options.call.sender.frameLimit = kSceneFrames;
   return options;
 }
 

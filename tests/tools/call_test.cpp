@@ -85,11 +85,46 @@ TEST_P(CallOn, WritesAStreamThatDecodesToThePicturesItWrote) {
   EXPECT_EQ(directory.names().size(), 3U);
 }
 
+// Pictures 0 to 59 as configured, a key frame at 30; then half as many pictures; then turned on their side.
+TEST_P(CallOn, CarriesOutChangesAtThePictureTheyAreMeantFor) {
+  const TemporaryDirectory directory;
+  const std::string pictures = directory.file("a.y4m");
+  const json figures = report({"call",     "-d",   GetParam().name, "-s",        "192x128", "-n",    "120",
+                               "-b",       "200k", "--at",          "2s",        "fps=15",  "--at",  "1s",
+                               "keyframe", "--at", "3000ms",        "rotate=90", "-o",      pictures});
+  EXPECT_EQ(figures["frames_in"], 90);
+  EXPECT_EQ(figures["frames_decoded"], 90);
+  EXPECT_EQ(figures["frames_dropped"], 0);
+  EXPECT_EQ(figures["key_frames"], json({0, 30, 75}));
+  EXPECT_EQ(figures["changes"][0], json({{"seconds", 1.0}, {"change", "keyframe"}}));
+  EXPECT_GE(figures["psnr_y"], GetParam().psnr) << "compared with pictures turned in the same way";
+  EXPECT_EQ(picturesIn(pictures, 192 * 128 * 3 / 2), 90);
+}
+
 INSTANTIATE_TEST_SUITE_P(Device, CallOn,
                          testing::Values(DeviceCase{"msm7x30", 35}, DeviceCase{"msm8x55", 35},
                                          DeviceCase{"msm8x60", 28}, DeviceCase{"msm8960", 35},
                                          DeviceCase{"omap4", 35}),
                          [](const auto& instance) { return std::string(instance.param.name); });
+
+TEST(Call, RecoversFromLossesTheSameWayEveryTime) {
+  const std::vector<std::string> arguments{"call", "-s",     "192x128", "-b",        "600k", "-k",
+                                           "0",    "--loss", "1%",      "--delay",   "40ms", "-n",
+                                           "200",  "--seed", "3",       "--reorder", "2%"};
+  json first = report(arguments);
+  const json again = report(arguments);
+  EXPECT_GT(first["network"]["packets_lost"], 0);
+  EXPECT_GT(first["network"]["packets_late"], 0);
+  EXPECT_EQ(first["network"]["pictures_lost"], first["frames_dropped"]);
+  EXPECT_GT(first["frames_decoded"], 100);
+  EXPECT_EQ(first["frames_out_of_order"], 0);
+  EXPECT_GT(first["psnr_y"], 30) << "broken pictures have been shown";
+  EXPECT_GE(first["latency_ms"]["p50"], 40);
+  EXPECT_GE(first["key_frames"].size(), 2U) << "one for the beginning, others on request";
+  for (const char* const key : {"network", "key_frames", "psnr_y", "bitrate_reached"}) {
+    EXPECT_EQ(first[key], again[key]) << key;
+  }
+}
 
 TEST(Call, TakesItsOwnOutputBackInEveryForm) {
   const TemporaryDirectory directory;

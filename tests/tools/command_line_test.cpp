@@ -45,6 +45,10 @@ TEST(CommandLine, RefusesWhatItDoesNotUnderstandAndSaysWhatItTakes) {
       {{"call", "-o", "-", "--stream", "-"}, "cannot both go to -"},
       {{"call", "-o", "a", "--stream", "a"}, "cannot both go to a"},
       {{"call", "-o", "-", "--json"}, "--json needs standard output for itself"},
+      {{"call", "--at", "soon", "keyframe"}, "\"soon\" is not a time as 3s"},
+      {{"call", "--at", "3s", "rotate=45"}, "\"rotate=45\" is not a change as bitrate=300k"},
+      {{"call", "--loss", "101%"}, "is not a share of packets"},
+      {{"call", "--delay", "11s"}, "is not a time up to 10s"},
       {{"decode"}, "INPUT is required"},
       {{"decode", "a", "--bitrate", "1M"}, "--bitrate"},
   };
@@ -134,6 +138,7 @@ TEST(CommandLine, NamesTheFileThatIsWrong) {
       {{"call", "-o", directory.file("no/a.y4m")}, kOutput, "no/a.y4m"},
       {{"call", "--stream", "/dev/full"}, kOutput, "/dev/full"},
       {{"call", "-o", "/dev/full"}, kOutput, "/dev/full"},
+      {{"call", "--at", "1s", "fps=60"}, kUsage, "fps=60 is more than the input has"},
       {{"call", "-d", "exynos4"}, kDevice, "exynos4"},
       {{"call", "-s", "8192x16", "-n", "1"}, kDevice, "8192x16"},
   };

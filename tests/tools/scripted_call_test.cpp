@@ -199,7 +199,7 @@ TEST(ScriptedCall, MatchesTimeStampsThatHaveWrappedAround) {
 
 TEST(ScriptedCall, DropsInRealTimeWhatFindsNoFreeBuffer) {
   CallRig rig;
-  rig.settings.realTime = true;
+  rig.settings.sender.realTime = true;
   rig.server.encoder().holdInput();
   GraySource source(30, FrameRate{1000, 1});
   source.onRead = [&rig](uint64_t read) {

@@ -74,18 +74,18 @@ TEST(CallBook, MatchesPicturesByTimeStampAndCountsTheRest) {
   CallBook book;
   for (uint32_t frame = 0; frame < 5; ++frame) {
     book.captured();
-    if (frame != 1) book.sending({frame * 1000, Picture(), Clock::time_point()});
+    if (frame != 1) book.sending({frame * 1000, Picture(), Clock::time_point(), frame, 0});
   }
-  for (int i = 0; i < 3; ++i) book.encoded(100);
+  for (const uint32_t timestamp : {0U, 2000U, 3000U}) book.encoded(timestamp, 100, timestamp == 0);
   EXPECT_EQ(book.arrived(0)->timestamp, 0U);
-  book.decoded(std::chrono::milliseconds(3), 40.0);
+  book.decoded(0, std::chrono::milliseconds(3), 40.0);
   EXPECT_FALSE(book.arrived(0)) << "twice";
   book.strayed();
   EXPECT_EQ(book.arrived(3000)->timestamp, 3000U);
-  book.decoded(std::chrono::milliseconds(5), 30.0);
+  book.decoded(3000, std::chrono::milliseconds(5), 30.0);
   EXPECT_FALSE(book.arrived(2000)) << "behind a later one";
   EXPECT_EQ(book.arrived(4000)->timestamp, 4000U);
-  book.decoded(std::chrono::milliseconds(4), std::nullopt);
+  book.decoded(4000, std::chrono::milliseconds(4), std::nullopt);
 
   const CallFigures figures = book.figures();
   EXPECT_EQ(figures.framesIn, 5U);

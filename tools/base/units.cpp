@@ -84,4 +84,32 @@ std::optional<uint32_t> parseBitRate(std::string_view text) {
   return static_cast<uint32_t>(bits);
 }
 
+std::optional<uint64_t> parseCount(std::string_view text) {
+  return parseWhole<uint64_t>(text);
+}
+
+std::optional<int64_t> parseTime(std::string_view text) {
+  constexpr double kSecond = 1e6;
+  constexpr double kDay = 86'400 * kSecond;
+  double unit = kSecond;
+  if (text.ends_with("ms")) {
+    unit = 1e3;
+    text.remove_suffix(2);
+  } else if (text.ends_with('s')) {
+    text.remove_suffix(1);
+  } else if (text.ends_with('m')) {
+    unit = 60 * kSecond;
+    text.remove_suffix(1);
+  }
+  const auto number = parseDecimal(text);
+  if (!number || !(*number * unit <= kDay)) return std::nullopt;
+  return std::llround(*number * unit);
+}
+
+std::optional<double> parseShare(std::string_view text) {
+  if (text.ends_with('%')) text.remove_suffix(1);
+  const auto percent = parseDecimal(text);
+  return percent && *percent <= 100 ? std::optional(*percent / 100) : std::nullopt;
+}
+
 }  // namespace tool

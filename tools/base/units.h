@@ -39,5 +39,11 @@ std::optional<Size> parseSize(std::string_view text);
 std::optional<FrameRate> parseFrameRate(std::string_view text);
 // "800k", "1.5M" or "1000000"; bits per second, 1000 to 1000 M.
 std::optional<uint32_t> parseBitRate(std::string_view text);
+// Digits alone.
+std::optional<uint64_t> parseCount(std::string_view text);
+// "3s", "80ms", "1.5" (seconds) or "2m"; microseconds, up to a day.
+std::optional<int64_t> parseTime(std::string_view text);
+// "2%" or "0.5%" or the number alone, 0 to 100; a share from 0 to 1.
+std::optional<double> parseShare(std::string_view text);
 
 }  // namespace tool

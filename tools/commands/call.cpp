@@ -1,20 +1,18 @@
 #include "tools/commands/call.h"
 
 #include <condition_variable>
+#include <map>
 #include <mutex>
 #include <thread>
 #include <utility>
-#include <vector>
 
 #include "omxbridge/hardware_version.h"
 #include "tools/base/cpu_time.h"
-#include "tools/commands/link.h"
-#include "tools/commands/progress_bar.h"
 #include "tools/files/output_file.h"
 #include "tools/files/picture_writer.h"
-#include "tools/h264/access_units.h"
 #include "tools/video/device_layout.h"
 #include "tools/video/psnr.h"
+#include "tools/video/rework.h"
 
 namespace tool {
 
@@ -23,80 +21,76 @@ namespace {
 // Pictures that may wait between the encoder and the decoder.
 constexpr size_t kLinkLimit = 4;
 
-// Encoders may drop pictures, which only their silence tells.
+// For pictures that the encoder or the decoder drops.
 constexpr std::chrono::seconds kPatience{2};
 
-class Call {
+class Call : private SenderOwner {
  public:
   Call(const CallSettings& settings, FrameSource& source, std::stop_source& enough)
-      : _settings(settings), _source(source), _enough(enough) {}
+      : _settings(settings),
+        _source(source),
+        _enough(enough),
+        _path(settings.impairments),
+        _sender(settings.sender, source, _book, *this, enough.get_token()) {}
 
   Outcome open();
   Outcome run();
   CallReport report() const;
 
  private:
-  using Deadline = std::optional<Clock::time_point>;
-
-  void feed();
-  Deadline awaitTurn(uint64_t frame);
-  Outcome offer(Picture picture, uint64_t frame, Deadline deadline);
-  void onCoded(std::span<const uint8_t> bytes, uint32_t timestamp);
+  bool waitForRoom(const std::stop_token& stop, Deadline deadline) override;
+  bool wantsKeyFrame(int64_t time) override;
+  void onCoded(CodedPicture picture) override;
+  void bringOn(std::vector<CodedPicture> pictures);
   void carry();
   Outcome carryOne(const CodedPicture& picture);
   void onDecoded(const DECODEDDATAINFO& info, std::span<const uint8_t> data, uint32_t timestamp);
-
-  uint32_t timestampOf(uint64_t frame) const;
   void fail(Failure failure);
   bool failed() const { return _broken.stop_requested(); }
+  bool isImpaired() const { return _settings.impairments.any(); }
 
   const CallSettings _settings;
   FrameSource& _source;
   std::stop_source& _enough;  // no more pictures are taken from the source
   std::stop_source _broken;   // nothing is of use any more; requests _enough as well
-  const int _hardwareVersion = getHardwareBaseVersion();
-  Clock::time_point _begin;  // of run()
+  Clock::time_point _begin;   // of run()
   double _cpuAtBegin = 0;
 
   mutable std::mutex _mutex;
-  std::condition_variable_any _stopped;  // only woken by stops
-  Outcome _failure;                      // the first; under the mutex
+  std::condition_variable_any _coded;          // a picture has come from the encoder
+  Outcome _failure;                            // the first; under the mutex
+  uint64_t _codedCount = 0;                    // under the mutex
+  LossyPath _path;                             // under the mutex
+  std::map<uint32_t, int64_t> _networkDelays;  // of pictures on their way, by time stamp; under the mutex
 
-  // The main thread's.
-  Picture _picture;
-  Outcome _inputFailure;
-  // The encoder's output thread's.
-  std::vector<uint8_t> _parameters;  // came without a picture: they go with the next one
-  std::optional<SequenceInfo> _sequence;
   // The link thread's.
   std::unique_ptr<OutputFile> _streamFile;  // null: not kept
   uint64_t _carried = 0;                    // handed to the decoder
   // The decoder's output thread's.
   DecodedPictureReader _reader;
   Picture _decoded;
+  Picture _turned;
   std::unique_ptr<PictureWriter> _writer;
 
   CallBook _book;
   Link _link;
   // Last: when they are gone, no callback uses the rest.
   std::unique_ptr<Session> _decoder;
-  std::unique_ptr<Session> _encoder;
+  Sender _sender;
 };
 
 // Everything that can go wrong before the first picture is sent does so here.
 Outcome Call::open() {
-  const auto first = _source.next(_picture);
-  if (!first.ok()) return first.failure();
-  if (!first.value()) {
-    if (_enough.stop_requested()) return {};
-    return Failure{ExitCode::Input, "the input holds no picture"};
-  }
+  const auto opened = _sender.open();
+  if (!opened.ok()) return opened.failure();
+  if (!opened.value()) return {};
   if (!_settings.streamPath.empty()) {
     auto file = OutputFile::create(_settings.streamPath);
     if (!file.ok()) return file.failure();
     _streamFile = std::move(file.value());
   }
-  auto writer = createPictureWriter(_settings.picturesPath, _settings.picturesFormat, _source.traits());
+  auto writer = createPictureWriter(_settings.picturesPath, _settings.picturesFormat, _source.traits(),
+                                    OtherSizes::Fit);
   if (!writer.ok()) return writer.failure();
   _writer = std::move(writer.value());
 
@@ -104,89 +98,81 @@ Outcome Call::open() {
                                              uint32_t timestamp) { onDecoded(info, data, timestamp); });
   if (!decoder.ok()) return decoder.failure();
   _decoder = std::move(decoder.value());
-  auto encoder = Session::openEncoder(
-      _settings.encoder,
-      [this](std::span<const uint8_t> bytes, uint32_t timestamp) { onCoded(bytes, timestamp); });
-  if (!encoder.ok()) return encoder.failure();
-  _encoder = std::move(encoder.value());
   if (auto failed = _decoder->start()) return failed;
-  return _encoder->start();
+  return _sender.start();
 }
 
 Outcome Call::run() {
   _begin = Clock::now();
   _cpuAtBegin = processCpuSeconds();
-  if (_encoder == nullptr) return {};  // stopped before the first picture
+  if (_decoder == nullptr) return {};  // stopped before the first picture
   {
     const std::jthread carrier([this] { carry(); });
-    feed();
-    const uint64_t sent = _book.figures().framesSent;
-    if (auto failure = _encoder->finish(sent, timestampOf(sent), kPatience)) fail(*failure);
+    if (auto failure = _sender.run()) fail(*failure);
+    bringOn([this] {
+      const std::lock_guard held(_mutex);
+      return _path.drain();
+    }());
     _link.close();
   }
-  if (auto failure = _decoder->finish(_carried, timestampOf(_carried), kPatience)) fail(*failure);
+  const auto end = static_cast<uint32_t>(_sender.timeOf(_carried));
+  if (auto failure = _decoder->finish(_carried, end, kPatience)) fail(*failure);
   if (failed()) {
     const std::lock_guard held(_mutex);
     return _failure;
   }
-  if (_streamFile != nullptr && _carried > 0) {
+  if (_streamFile != nullptr && _book.figures().framesEncoded > 0) {
     if (auto failure = _streamFile->commit()) return failure;
   }
   return _writer->finish();
 }
 
-void Call::feed() {
-  ProgressBar progress(_settings.frameLimit > 0 ? _settings.frameLimit : _source.frameCount());
-  for (uint64_t frame = 0; !_enough.stop_requested(); ++frame) {
-    const Deadline deadline = awaitTurn(frame);
-    if (_enough.stop_requested()) return;
-    if (auto failure = offer(std::move(_picture), frame, deadline)) return fail(*failure);
-    progress.update(frame + 1);
-    if (frame + 1 == _settings.frameLimit) return;
-    const auto more = _source.next(_picture);
-    if (!more.ok()) _inputFailure = more.failure();
-    if (!more.ok() || !more.value()) return;
-  }
-}
-
-// In real time: waits until the frame is due, and returns until when it has to have found a free buffer.
-Call::Deadline Call::awaitTurn(uint64_t frame) {
-  if (!_settings.realTime) return std::nullopt;
-  const FrameRate rate = _settings.encoder.rate;
-  const auto due = [&](uint64_t number) {
-    return _begin + std::chrono::microseconds(rate.microseconds(number));
-  };
+// A way with impairments runs in the time of the video: what happens on it until a picture is taken depends
+// on all pictures before, so these have to be coded first.
+bool Call::waitForRoom(const std::stop_token& stop, Deadline deadline) {
+  if (!_link.waitForRoom(kLinkLimit, stop, deadline)) return false;
+  if (!isImpaired()) return true;
+  const uint64_t sent = _book.figures().framesSent;
   std::unique_lock held(_mutex);
-  _stopped.wait_until(held, _enough.get_token(), due(frame), [] { return false; });
-  return due(frame + 1);
+  _coded.wait_for(held, stop, kPatience, [&] { return _codedCount >= sent; });
+  return !stop.stop_requested();
 }
 
-// Sends one picture, or drops it where no buffer gets free in time.
-Outcome Call::offer(Picture picture, uint64_t frame, Deadline deadline) {
-  const auto captured = Clock::now();
-  const std::stop_token stop = _enough.get_token();
-  std::optional<Session::InputBuffer> buffer;
-  if (_link.waitForRoom(kLinkLimit, stop, deadline)) {
-    const auto reserved = _encoder->reserve(stop, deadline);
-    if (!reserved.ok()) return reserved.failure();
-    buffer = reserved.value();
+bool Call::wantsKeyFrame(int64_t time) {
+  if (!isImpaired()) return false;
+  std::vector<CodedPicture> arrived;
+  bool isKeyWanted = false;
+  {
+    const std::lock_guard held(_mutex);
+    arrived = _path.advance(time);
+    isKeyWanted = _path.takeKeyRequest(time);
   }
-  if (!buffer && stop.stop_requested()) return {};
-  _book.captured();
-  if (!buffer) return {};
-  const uint32_t timestamp = timestampOf(frame);
-  const size_t length = layOutForEncoder(picture, _hardwareVersion, buffer->data);
-  _book.sending({timestamp, std::move(picture), captured});
-  return _encoder->send(*buffer, length, timestamp);
+  bringOn(std::move(arrived));
+  return isKeyWanted;
 }
 
-void Call::onCoded(std::span<const uint8_t> bytes, uint32_t timestamp) {
+void Call::onCoded(CodedPicture picture) {
   if (failed()) return;
-  if (!_sequence) _sequence = findSequenceInfo(bytes);
-  _parameters.insert(_parameters.end(), bytes.begin(), bytes.end());
-  if (!holdsPicture(bytes)) return;
-  _book.encoded(_parameters.size());
-  _link.push({std::exchange(_parameters, {}), timestamp});
+  if (_streamFile != nullptr) {
+    if (auto failure = _streamFile->write(picture.bytes)) return fail(*failure);
+  }
+  if (!isImpaired()) return _link.push(std::move(picture));
+  const int64_t time = _book.timeOf(picture.timestamp);
+  const std::lock_guard held(_mutex);
+  _path.send(std::move(picture), time);
+  ++_codedCount;
+  _coded.notify_all();
+}
+
+// To the decoder, in the order in which they come out of the way.
+void Call::bringOn(std::vector<CodedPicture> pictures) {
+  for (CodedPicture& picture : pictures) {
+    {
+      const std::lock_guard held(_mutex);
+      _networkDelays[picture.timestamp] = picture.networkDelay;
+    }
+    _link.push(std::move(picture));
+  }
 }
 
 void Call::carry() {
@@ -196,9 +182,6 @@ void Call::carry() {
 }
 
 Outcome Call::carryOne(const CodedPicture& picture) {
-  if (_streamFile != nullptr) {
-    if (auto failure = _streamFile->write(picture.bytes)) return failure;
-  }
   const auto sent = _decoder->sendCopy(picture.bytes, picture.timestamp, _broken.get_token());
   if (!sent.ok()) return sent.failure();
   if (sent.value()) ++_carried;
@@ -210,18 +193,20 @@ void Call::onDecoded(const DECODEDDATAINFO& info, std::span<const uint8_t> data,
   if (failed()) return;
   if (auto failure = _reader.read(info, data, _decoded)) return fail(*failure);
   if (const auto source = _book.arrived(timestamp)) {
-    const bool comparable = _decoded.size == source->picture.size;
-    _book.decoded(now - source->captured,
-                  comparable ? std::optional(psnr(_decoded.luma(), source->picture.luma())) : std::nullopt);
+    std::chrono::microseconds onTheWay{0};
+    if (isImpaired()) {
+      const std::lock_guard held(_mutex);
+      onTheWay = std::chrono::microseconds(_networkDelays[timestamp]);
+      _networkDelays.erase(timestamp);
+    }
+    const Picture& before = turned(source->picture, source->rotation, _turned);
+    const bool comparable = _decoded.size == before.size;
+    _book.decoded(timestamp, now - source->captured + onTheWay,
+                  comparable ? std::optional(psnr(_decoded.luma(), before.luma())) : std::nullopt);
   } else {
     _book.strayed();
   }
   if (auto failure = _writer->write(_decoded)) fail(*failure);
-}
-
-uint32_t Call::timestampOf(uint64_t frame) const {
-  // Microseconds, of which the interface carries the low 32 bits.
-  return static_cast<uint32_t>(_settings.encoder.rate.microseconds(frame));
 }
 
 void Call::fail(Failure failure) {
@@ -236,22 +221,24 @@ void Call::fail(Failure failure) {
 CallReport Call::report() const {
   CallReport report;
   report.figures = _book.figures();
-  report.encoder = _settings.encoder;
-  report.sequence = _sequence;
-  report.hardwareVersion = _hardwareVersion;
+  report.trace = _book.trace();
+  report.encoder = _sender.encoder();
+  report.impairments = _settings.impairments;
+  report.path = _path.figures();
+  report.seconds = _sender.seconds();
+  report.meanBitRate = _sender.meanBitRate();
+  report.sequence = _sender.sequence();
+  report.hardwareVersion = getHardwareBaseVersion();
   report.wallSeconds = std::chrono::duration<double>(Clock::now() - _begin).count();
   report.cpuSeconds = processCpuSeconds() - _cpuAtBegin;
-  report.inputFailure = _inputFailure;
+  report.inputFailure = _sender.inputFailure();
   return report;
 }
 
 }  // namespace
 
 Result<CallReport> runCall(const CallSettings& settings, FrameSource& source, std::stop_source& enough) {
-  CallSettings complete = settings;
-  complete.encoder.size = source.size();
-  complete.encoder.rate = source.traits().rate;
-  Call call(complete, source, enough);
+  Call call(settings, source, enough);
   if (auto failure = call.open()) return *failure;
   if (auto failure = call.run()) return *failure;
   return call.report();

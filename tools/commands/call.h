@@ -18,16 +18,16 @@
 
 #include "tools/base/failure.h"
 #include "tools/commands/call_book.h"
+#include "tools/commands/sender.h"
 #include "tools/files/frame_source.h"
 #include "tools/h264/headers.h"
-#include "tools/session/session.h"
+#include "tools/network/lossy_path.h"
 
 namespace tool {
 
 struct CallSettings {
-  EncoderSettings encoder;     // size and rate are the source's
-  uint64_t frameLimit = 0;     // 0: all that the source has
-  bool realTime = false;       // paced by the frame rate; pictures that find no free buffer are dropped
+  SenderSettings sender;
+  Impairments impairments;     // of the way between the ends
   std::string streamPath;      // the coded stream (Annex B); empty: not kept
   std::string picturesPath;    // the decoded pictures; empty: not kept
   std::string picturesFormat;  // see createPictureWriter()
@@ -35,7 +35,12 @@ struct CallSettings {
 
 struct CallReport {
   CallFigures figures;
+  CallTrace trace;
   EncoderSettings encoder;
+  Impairments impairments;
+  PathFigures path;
+  double seconds = 0;                    // of video
+  double meanBitRate = 0;                // asked for, bits per second
   std::optional<SequenceInfo> sequence;  // what the stream says of itself
   int hardwareVersion = 0;
   double wallSeconds = 0;

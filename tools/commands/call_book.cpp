@@ -23,13 +23,39 @@ void CallBook::captured() {
 void CallBook::sending(SentPicture picture) {
   const std::lock_guard held(_mutex);
   ++_figures.framesSent;
+  PictureTrace& trace = _trace.pictures.emplace_back();
+  trace.timestamp = picture.timestamp;
+  trace.time = picture.time;
   _underWay.push_back(std::move(picture));
 }
 
-void CallBook::encoded(size_t bytes) {
+// From the end: what is asked about is hardly ever far from it.
+PictureTrace* CallBook::find(uint32_t timestamp) {
+  const auto found =
+      std::find_if(_trace.pictures.rbegin(), _trace.pictures.rend(),
+                   [timestamp](const PictureTrace& each) { return each.timestamp == timestamp; });
+  return found != _trace.pictures.rend() ? &*found : nullptr;
+}
+
+void CallBook::encoded(uint32_t timestamp, size_t bytes, bool isKey) {
   const std::lock_guard held(_mutex);
   ++_figures.framesEncoded;
   _figures.streamBytes += bytes;
+  if (PictureTrace* const picture = find(timestamp)) {
+    picture->bytes = bytes;
+    picture->isKey = isKey;
+  }
+}
+
+int64_t CallBook::timeOf(uint32_t timestamp) {
+  const std::lock_guard held(_mutex);
+  const PictureTrace* const picture = find(timestamp);
+  return picture != nullptr ? picture->time : 0;
+}
+
+void CallBook::changed(int64_t time, std::string text) {
+  const std::lock_guard held(_mutex);
+  _trace.changes.push_back({time, std::move(text)});
 }
 
 std::optional<SentPicture> CallBook::arrived(uint32_t timestamp) {
@@ -43,13 +69,18 @@ std::optional<SentPicture> CallBook::arrived(uint32_t timestamp) {
   return picture;
 }
 
-void CallBook::decoded(Clock::duration latency, std::optional<double> psnr) {
+void CallBook::decoded(uint32_t timestamp, Clock::duration latency, std::optional<double> psnr) {
   const std::lock_guard held(_mutex);
   ++_figures.framesDecoded;
-  _latencies.push_back(std::chrono::duration<double, std::milli>(latency).count());
-  if (!psnr) return;
-  _figures.psnr += *psnr;
-  ++_compared;
+  if (psnr) {
+    _figures.psnr += *psnr;
+    ++_compared;
+  }
+  if (PictureTrace* const picture = find(timestamp)) {
+    picture->isDecoded = true;
+    picture->psnr = psnr;
+    picture->latency = std::chrono::duration<double, std::milli>(latency).count();
+  }
 }
 
 void CallBook::strayed() {
@@ -62,8 +93,17 @@ CallFigures CallBook::figures() const {
   const std::lock_guard held(_mutex);
   CallFigures figures = _figures;
   if (_compared > 0) figures.psnr /= static_cast<double>(_compared);
-  figures.latencies = percentiles(_latencies);
+  std::vector<double> latencies;
+  for (const PictureTrace& picture : _trace.pictures) {
+    if (picture.isDecoded) latencies.push_back(picture.latency);
+  }
+  figures.latencies = percentiles(std::move(latencies));
   return figures;
+}
+
+CallTrace CallBook::trace() const {
+  const std::lock_guard held(_mutex);
+  return _trace;
 }
 
 }  // namespace tool

@@ -9,6 +9,7 @@
 #include <deque>
 #include <mutex>
 #include <optional>
+#include <string>
 #include <vector>
 
 #include "tools/base/clock.h"
@@ -20,6 +21,30 @@ struct SentPicture {
   uint32_t timestamp = 0;
   Picture picture;
   Clock::time_point captured;
+  int64_t time = 0;  // of the video, microseconds
+  int rotation = 0;  // degrees by which the encoder turns it
+};
+
+// What became of one picture that the encoder took.
+struct PictureTrace {
+  uint32_t timestamp = 0;
+  int64_t time = 0;  // of the video, microseconds
+  size_t bytes = 0;  // 0: the encoder dropped it
+  bool isKey = false;
+  bool isDecoded = false;
+  std::optional<double> psnr;  // dB
+  double latency = 0;          // milliseconds
+};
+
+// A change that was carried out.
+struct ChangeTrace {
+  int64_t time;  // of the first picture that it holds for
+  std::string text;
+};
+
+struct CallTrace {
+  std::vector<PictureTrace> pictures;  // in the order of their time
+  std::vector<ChangeTrace> changes;
 };
 
 struct Percentiles {
@@ -49,22 +74,28 @@ class CallBook {
   void captured();
   // Before the picture is sent: its output may be there at once.
   void sending(SentPicture picture);
-  void encoded(size_t bytes);
+  void encoded(uint32_t timestamp, size_t bytes, bool isKey);
+  // When a picture that was sent is due, in microseconds of the video.
+  int64_t timeOf(uint32_t timestamp);
+  void changed(int64_t time, std::string text);
   // The picture that was sent with this time stamp, no longer under way; those sent before it count as
   // lost. Nothing where there is none.
   std::optional<SentPicture> arrived(uint32_t timestamp);
-  // `psnr` is nothing where the picture could not be compared.
-  void decoded(Clock::duration latency, std::optional<double> psnr);
+  // The picture that has arrived(). `psnr` is nothing where it could not be compared.
+  void decoded(uint32_t timestamp, Clock::duration latency, std::optional<double> psnr);
   // A picture was decoded that is not under way.
   void strayed();
 
   CallFigures figures() const;
+  CallTrace trace() const;
 
  private:
+  PictureTrace* find(uint32_t timestamp);
+
   mutable std::mutex _mutex;
   CallFigures _figures;  // the counts; psnr is their sum until figures() makes the mean
   std::deque<SentPicture> _underWay;
-  std::vector<double> _latencies;  // milliseconds
+  CallTrace _trace;
   uint64_t _compared = 0;
 };
 

@@ -2,6 +2,7 @@
 
 #include <inttypes.h>
 
+#include <cmath>
 #include <nlohmann/json.hpp>
 
 #include <omxhost/device.h>
@@ -14,12 +15,39 @@ namespace tool {
 namespace {
 
 double reachedBitRate(const CallReport& report) {
-  const double seconds = static_cast<double>(report.figures.framesIn) / report.encoder.rate.perSecond();
-  return seconds > 0 ? static_cast<double>(report.figures.streamBytes) * 8 / seconds : 0;
+  return report.seconds > 0 ? static_cast<double>(report.figures.streamBytes) * 8 / report.seconds : 0;
 }
 
 nlohmann::ordered_json orNull(const char* name) {
   return name != nullptr ? nlohmann::ordered_json(name) : nullptr;
+}
+
+nlohmann::ordered_json keyFrames(const CallTrace& trace) {
+  auto list = nlohmann::ordered_json::array();
+  for (size_t i = 0; i < trace.pictures.size(); ++i) {
+    if (trace.pictures[i].isKey) list.push_back(i);
+  }
+  return list;
+}
+
+nlohmann::ordered_json changes(const CallTrace& trace) {
+  auto list = nlohmann::ordered_json::array();
+  for (const ChangeTrace& change : trace.changes) {
+    list.push_back({{"seconds", static_cast<double>(change.time) / 1e6}, {"change", change.text}});
+  }
+  return list;
+}
+
+nlohmann::ordered_json network(const CallReport& report) {
+  return {{"loss", report.impairments.loss},
+          {"reorder", report.impairments.reorder},
+          {"delay_ms", static_cast<double>(report.impairments.delay) / 1e3},
+          {"seed", report.impairments.seed},
+          {"packets", report.path.packets},
+          {"packets_lost", report.path.packetsLost},
+          {"packets_late", report.path.packetsReordered},
+          {"pictures_lost", report.path.picturesLost},
+          {"key_requests", report.path.keyRequests.size()}};
 }
 
 std::string row(const char* label, const std::string& value) {
@@ -44,8 +72,19 @@ std::string callSummary(const CallReport& report, const WrittenFiles& files) {
   text += row("Decoded", count(figures.framesDecoded));
   text += row("Dropped", count(figures.framesDropped()));
   if (figures.framesOutOfOrder > 0) text += row("Out of order", count(figures.framesOutOfOrder));
-  text += row("Bit rate", formatted("%.1f kbit/s asked, %.1f kbit/s reached",
-                                    bitRateTarget(report.encoder) / 1e3, reachedBitRate(report) / 1e3));
+  if (report.impairments.any()) {
+    const PathFigures& path = report.path;
+    text += row("On the way", formatted("%" PRIu64 " packets, %" PRIu64 " lost, %" PRIu64 " late; %" PRIu64
+                                        " pictures lost, %zu key frames asked for",
+                                        path.packets, path.packetsLost, path.packetsReordered,
+                                        path.picturesLost, path.keyRequests.size()));
+  }
+  for (const ChangeTrace& change : report.trace.changes) {
+    text += row("Changed",
+                formatted("at %.3f s: %s", static_cast<double>(change.time) / 1e6, change.text.c_str()));
+  }
+  text += row("Bit rate", formatted("%.1f kbit/s asked, %.1f kbit/s reached", report.meanBitRate / 1e3,
+                                    reachedBitRate(report) / 1e3));
   text += row("PSNR", formatted("%.2f dB (luma, mean)", figures.psnr));
   text += row("Latency", formatted("p50 %.1f ms, p95 %.1f ms, p99 %.1f ms", figures.latencies.p50,
                                    figures.latencies.p95, figures.latencies.p99));
@@ -73,12 +112,15 @@ std::string callJson(const CallReport& report, bool interrupted) {
   object["frames_decoded"] = figures.framesDecoded;
   object["frames_dropped"] = figures.framesDropped();
   object["frames_out_of_order"] = figures.framesOutOfOrder;
-  object["bitrate_target"] = bitRateTarget(report.encoder);
+  object["bitrate_target"] = std::llround(report.meanBitRate);
   object["bitrate_reached"] = rounded(reachedBitRate(report));
   object["psnr_y"] = rounded(figures.psnr);
   object["latency_ms"] = {{"p50", rounded(figures.latencies.p50)},
                           {"p95", rounded(figures.latencies.p95)},
                           {"p99", rounded(figures.latencies.p99)}};
+  object["key_frames"] = keyFrames(report.trace);
+  object["changes"] = changes(report.trace);
+  if (report.impairments.any()) object["network"] = network(report);
   object["cpu_seconds"] = rounded(report.cpuSeconds);
   object["wall_seconds"] = rounded(report.wallSeconds);
   object["interrupted"] = interrupted;

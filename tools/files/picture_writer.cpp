@@ -7,6 +7,7 @@
 
 #include "tools/base/text.h"
 #include "tools/files/output_file.h"
+#include "tools/video/rework.h"
 
 namespace tool {
 
@@ -21,7 +22,7 @@ std::span<const uint8_t> bytesOf(std::string_view text) {
 // Pictures one behind the other, of any size.
 class RawWriter : public PictureWriter {
  public:
-  RawWriter(File file, VideoTraits) : _file(std::move(file)) {}
+  RawWriter(File file, VideoTraits, OtherSizes) : _file(std::move(file)) {}
 
   Outcome write(const Picture& picture) override {
     _any = true;
@@ -36,7 +37,8 @@ class RawWriter : public PictureWriter {
 
 class Y4mWriter : public PictureWriter {
  public:
-  Y4mWriter(File file, VideoTraits traits) : _file(std::move(file)), _traits(std::move(traits)) {}
+  Y4mWriter(File file, VideoTraits traits, OtherSizes otherSizes)
+      : _file(std::move(file)), _traits(std::move(traits)), _otherSizes(otherSizes) {}
 
   Outcome write(const Picture& picture) override {
     if (_size == Size()) {
@@ -45,6 +47,10 @@ class Y4mWriter : public PictureWriter {
                                            _traits.rate.numerator, _traits.rate.denominator,
                                            _traits.pixelAspect.c_str(), _traits.chroma.c_str());
       if (auto failed = _file->write(bytesOf(header))) return failed;
+    }
+    if (picture.size != _size && _otherSizes == OtherSizes::Fit) {
+      fit(picture, _size, _fitted);
+      return write(_fitted);
     }
     if (picture.size != _size) {
       return _file->failure(
@@ -60,7 +66,9 @@ class Y4mWriter : public PictureWriter {
  private:
   const File _file;
   const VideoTraits _traits;
+  const OtherSizes _otherSizes;
   Size _size;  // of the first picture
+  Picture _fitted;
 };
 
 class NoWriter : public PictureWriter {
@@ -70,14 +78,14 @@ class NoWriter : public PictureWriter {
 };
 
 template <typename Writer>
-std::unique_ptr<PictureWriter> make(File file, const VideoTraits& traits) {
-  return std::make_unique<Writer>(std::move(file), traits);
+std::unique_ptr<PictureWriter> make(File file, const VideoTraits& traits, OtherSizes otherSizes) {
+  return std::make_unique<Writer>(std::move(file), traits, otherSizes);
 }
 
 struct OutputKind {
   std::string_view name;
   std::string_view extensions;  // each between blanks
-  std::unique_ptr<PictureWriter> (*make)(File file, const VideoTraits& traits);
+  std::unique_ptr<PictureWriter> (*make)(File file, const VideoTraits& traits, OtherSizes otherSizes);
 };
 
 constexpr std::array kOutputKinds{
@@ -104,11 +112,11 @@ std::vector<std::string> pictureFormats() {
 }
 
 Result<std::unique_ptr<PictureWriter>> createPictureWriter(const std::string& path, const std::string& format,
-                                                           const VideoTraits& traits) {
+                                                           const VideoTraits& traits, OtherSizes otherSizes) {
   if (path.empty()) return std::unique_ptr<PictureWriter>(std::make_unique<NoWriter>());
   auto file = OutputFile::create(path);
   if (!file.ok()) return file.failure();
-  return kindOf(path, format).make(std::move(file.value()), traits);
+  return kindOf(path, format).make(std::move(file.value()), traits, otherSizes);
 }
 
 }  // namespace tool

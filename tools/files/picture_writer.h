@@ -22,8 +22,11 @@ class PictureWriter {
 std::vector<std::string> pictureFormats();
 
 // `format` is one of the names; empty: as the path ends, and Y4M where that tells nothing. An empty path
-// gives a writer that drops the pictures.
+// gives a writer that drops the pictures. Y4M holds one size: pictures of another one than the first are a
+// failure, or are scaled to fit into it.
+enum class OtherSizes { Refuse, Fit };
 Result<std::unique_ptr<PictureWriter>> createPictureWriter(const std::string& path, const std::string& format,
-                                                           const VideoTraits& traits);
+                                                           const VideoTraits& traits,
+                                                           OtherSizes otherSizes = OtherSizes::Refuse);
 
 }  // namespace tool

@@ -48,6 +48,10 @@ bool holdsPicture(std::span<const uint8_t> bytes) {
   return !findNal(bytes, isSlice).empty();
 }
 
+bool holdsKeyPicture(std::span<const uint8_t> bytes) {
+  return !findNal(bytes, [](NalType type) { return type == kNalIdrSlice; }).empty();
+}
+
 std::optional<SequenceInfo> findSequenceInfo(std::span<const uint8_t> bytes) {
   const auto nal = findNal(bytes, [](NalType type) { return type == kNalSequenceParameters; });
   if (nal.size() < 4) return std::nullopt;

@@ -12,6 +12,8 @@ namespace tool {
 
 // Whether the bytes hold a slice of a picture, and not parameter sets and messages alone.
 bool holdsPicture(std::span<const uint8_t> bytes);
+// Whether a decoder can begin with them.
+bool holdsKeyPicture(std::span<const uint8_t> bytes);
 // From the first sequence parameters in the bytes, if there are any.
 std::optional<SequenceInfo> findSequenceInfo(std::span<const uint8_t> bytes);
 

@@ -3,6 +3,7 @@
 #include <inttypes.h>
 #include <stdio.h>
 
+#include <algorithm>
 #include <vector>
 
 #include "tools/base/text.h"
@@ -42,9 +43,6 @@ Outcome Demuxer::start() {
   const int best = av_find_best_stream(_format, AVMEDIA_TYPE_VIDEO, -1, -1, nullptr, 0);
   if (best < 0) return failure("has no video in it");
   _track = _format->streams[best];
-  for (unsigned int i = 0; i < _format->nb_streams; ++i) {
-    if (_format->streams[i] != _track) _format->streams[i]->discard = AVDISCARD_ALL;
-  }
   return {};
 }
 
@@ -79,18 +77,37 @@ Result<bool> Demuxer::next(AVPacket& packet) {
     if (stopped()) return false;
     if (_readFailure) return *_readFailure;
     const auto expected = static_cast<uint64_t>(std::max<int64_t>(_track->nb_frames, 0));
-    if (result == AVERROR_EOF) {
-      if (_packets >= expected) return false;
+    if (result == AVERROR_EOF && _packets < expected) {
       return failure(formatted("ends after %" PRIu64 " of %" PRIu64 " pictures", _packets, expected));
     }
+    if (result == AVERROR_EOF && expected == 0 && endsEarly()) {
+      return failure(formatted("ends after %.1f of %.1f seconds", static_cast<double>(_end) / AV_TIME_BASE,
+                               static_cast<double>(_format->duration) / AV_TIME_BASE));
+    }
+    if (result == AVERROR_EOF) return false;
     if (result < 0) {
       return failure(
           formatted("breaks off after %" PRIu64 " pictures (%s)", _packets, avText(result).c_str()));
     }
+    noteEnd(packet);
     if (packet.stream_index != _track->index || packet.size == 0) continue;
     ++_packets;
     return true;
   }
+}
+
+void Demuxer::noteEnd(const AVPacket& packet) {
+  if (packet.pts == AV_NOPTS_VALUE) return;
+  const AVRational unit = _format->streams[packet.stream_index]->time_base;
+  const int64_t begin = _format->start_time != AV_NOPTS_VALUE ? _format->start_time : 0;
+  _end = std::max(_end, av_rescale_q(packet.pts + packet.duration, unit, AV_TIME_BASE_Q) - begin);
+}
+
+// For files that state their duration but not how many pictures they have.
+bool Demuxer::endsEarly() const {
+  constexpr int64_t kTolerance = AV_TIME_BASE / 2;
+  return _format->duration_estimation_method == AVFMT_DURATION_FROM_STREAM &&
+         _end + kTolerance < _format->duration;
 }
 
 FrameRate Demuxer::frameRate() const {

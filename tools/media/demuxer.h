@@ -36,6 +36,8 @@ class Demuxer {
  private:
   explicit Demuxer(std::unique_ptr<ByteReader> bytes) : _bytes(std::move(bytes)) {}
   Outcome start();
+  void noteEnd(const AVPacket& packet);
+  bool endsEarly() const;
   Failure failureOf(const char* problem, int error) const;
 
   static int read(void* self, uint8_t* out, int size);
@@ -46,7 +48,8 @@ class Demuxer {
   AvIo _io;
   AVFormatContext* _format = nullptr;
   AVStream* _track = nullptr;
-  uint64_t _packets = 0;
+  uint64_t _packets = 0;  // of the track
+  int64_t _end = 0;       // of all tracks so far, in AV_TIME_BASE
 };
 
 // Whether a file that begins like this is surely of a kind that libavformat knows; then its name.

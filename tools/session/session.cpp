@@ -24,9 +24,8 @@ webrtc::VideoCodec codecRecord(const EncoderSettings& settings) {
   codec.codecType = webrtc::kVideoCodecH264;
   codec.width = static_cast<uint16_t>(settings.size.width);
   codec.height = static_cast<uint16_t>(settings.size.height);
-  codec.maxFramerate = static_cast<uint8_t>(std::clamp(settings.rate.perSecond() + 0.5, 1.0, 255.0));
-  // The encoder divides its bits among whole frames a second: it gets as many more as there are fewer.
-  const double kilobits = bitRateTarget(settings) / 1e3 * codec.maxFramerate / settings.rate.perSecond();
+  codec.maxFramerate = wholeFrameRate(settings.rate);
+  const double kilobits = bitRateTarget(settings) / 1e3 * bitRateFactor(settings.rate);
   codec.startBitrate = static_cast<uint32_t>(std::clamp(std::round(kilobits), 1.0, 4e6));
   codec.codecSpecific.H264.profile = settings.profile;
   codec.codecSpecific.H264.keyFrameInterval = settings.keyInterval;
@@ -47,6 +46,14 @@ std::string description(int code) {
 
 uint32_t bitRateTarget(const EncoderSettings& settings) {
   return std::max(1U, (settings.bitRate + 500) / 1000) * 1000;
+}
+
+uint8_t wholeFrameRate(FrameRate rate) {
+  return static_cast<uint8_t>(std::clamp(rate.perSecond() + 0.5, 1.0, 255.0));
+}
+
+double bitRateFactor(FrameRate rate) {
+  return wholeFrameRate(rate) / rate.perSecond();
 }
 
 Session::Session(Kind kind, OutputHandler handler) : _kind(kind), _handler(std::move(handler)) {}
@@ -177,6 +184,16 @@ Outcome Session::send(const InputBuffer& buffer, size_t length, uint32_t timesta
                                                      static_cast<int>(timestamp));
   if (result != 0) return failure(ExitCode::Failed, "refused a picture", result);
   ++_sent;
+  return {};
+}
+
+void Session::settle(const std::stop_token& stop) {
+  await(stop, Clock::now() + kStuck, [this] { return _returned >= _sent; });
+}
+
+Outcome Session::change(CONFIGTYPE item, uint32_t value) {
+  const int result = omx_interface_set_config(_handle, item, value);
+  if (result != OMXI_OK) return failure(ExitCode::Device, "refused a change", result);
   return {};
 }
 

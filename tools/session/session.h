@@ -34,6 +34,10 @@ struct EncoderSettings {
 
 // What the encoder is really asked for, in bits per second.
 uint32_t bitRateTarget(const EncoderSettings& settings);
+// Encoders are told whole frames a second, and divide their bits among these: with fewer frames than that
+// they have to be told more bits.
+uint8_t wholeFrameRate(FrameRate rate);
+double bitRateFactor(FrameRate rate);
 
 class Session {
  public:
@@ -61,6 +65,11 @@ class Session {
   Result<std::optional<InputBuffer>> reserve(const std::stop_token& stop,
                                              std::optional<Clock::time_point> deadline);
   Outcome send(const InputBuffer& buffer, size_t length, uint32_t timestamp);
+
+  // Waits until the component has given all input back: what is changed then holds from the next picture on.
+  void settle(const std::stop_token& stop);
+  // Changes an encoder while it runs.
+  Outcome change(CONFIGTYPE item, uint32_t value);
 
   // Waits for a free input buffer, copies the bytes into it and sends them. False once a stop has been
   // requested.

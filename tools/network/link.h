@@ -18,6 +18,8 @@ namespace tool {
 struct CodedPicture {
   std::vector<uint8_t> bytes;
   uint32_t timestamp = 0;
+  bool isKey = false;
+  int64_t networkDelay = 0;  // microseconds of the video that it was under way
 };
 
 class Link {
