@@ -98,9 +98,9 @@ TEST_F(LifecycleTest, TellsTheApplicationOfAFailure) {
 TEST_F(LifecycleTest, FollowsTheComponentsStateAndLogsItsErrors) {
   connect();
   int posts = 0;
-  for (const int state : {OMX_StateIdle, OMX_StateExecuting, OMX_StatePause, OMX_StateLoaded}) {
-    deliverEvent(OMX_EventCmdComplete, OMX_CommandStateSet, static_cast<OMX_U32>(state));
-    EXPECT_EQ(_session->_omxState, state);
+  for (const OMX_U32 state : {OMX_StateIdle, OMX_StateExecuting, OMX_StatePause, OMX_StateLoaded}) {
+    deliverEvent(OMX_EventCmdComplete, OMX_CommandStateSet, state);
+    EXPECT_EQ(static_cast<OMX_U32>(_session->_omxState), state);
     EXPECT_EQ(valueOf(_session->_semStateChanged), ++posts);
   }
   deliverEvent(OMX_EventCmdComplete, OMX_CommandPortDisable, 1);
