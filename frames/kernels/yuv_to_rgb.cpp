@@ -60,7 +60,7 @@ HWY_INLINE auto bytesInOrder(V even, V odd) {
 }
 
 template <class D, class V>
-HWY_INLINE void storePixels(Bgr24, D d16, const Components<V>& even, const Components<V>& odd,
+HWY_INLINE void storePixels(Bgr24, D /*d16*/, const Components<V>& even, const Components<V>& odd,
                             std::uint8_t* to) {
   const hn::Repartition<std::uint8_t, D> d8;
   hn::StoreInterleaved3(bytesInOrder(even.b, odd.b), bytesInOrder(even.g, odd.g), bytesInOrder(even.r, odd.r),
@@ -179,7 +179,7 @@ struct RowPair {
   template <class D, class V>
   static HWY_INLINE auto components(D d16, V luma, const Components<V>& chroma) {
     const hn::RebindToUnsigned<D> du16;
-    const auto doubled = [du16](V v) HWY_ATTR { return hn::BitCast(du16, hn::SaturatedAdd(v, v)); };
+    const auto doubled = [du16](V x) HWY_ATTR { return hn::BitCast(du16, hn::SaturatedAdd(x, x)); };
     const V sum = hn::Add(hn::Mul(luma, hn::Set(d16, 149)), hn::Set(d16, kLumaOffset));
     return Components<hn::Vec<decltype(du16)>>{
         doubled(hn::SaturatedAdd(sum, chroma.r)), doubled(hn::SaturatedAdd(sum, chroma.g)),
