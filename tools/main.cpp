@@ -11,11 +11,12 @@
 #include <omxhost/log.h>
 
 #include "tools/base/interrupt.h"
-#include "tools/command_line.h"
 #include "tools/commands/call_report.h"
+#include "tools/commands/compare.h"
 #include "tools/commands/devices.h"
-#include "tools/files/byte_reader.h"
 #include "tools/files/output_file.h"
+#include "tools/media/h264_track.h"
+#include "tools/options/options.h"
 
 namespace tool {
 
@@ -53,7 +54,8 @@ FILE* summaryFile(bool videoOnStandardOutput) {
 Outcome call(const Options& options, const Interrupt& interrupt, std::stop_source& enough) {
   const CallSettings& settings = options.call;
   FILE* const out =
-      summaryFile(isStandardOutput(settings.picturesPath) || isStandardOutput(settings.streamPath));
+      summaryFile(isStandardOutput(settings.picturesPath) || isStandardOutput(settings.streamPath) ||
+                  isStandardOutput(settings.reportPath));
   auto source = openFrameSource(options.source, enough.get_token());
   if (!source.ok()) return source.failure();
   if (!options.json) {
@@ -67,6 +69,8 @@ Outcome call(const Options& options, const Interrupt& interrupt, std::stop_sourc
   WrittenFiles files;
   if (!settings.streamPath.empty()) files.emplace_back("Stream in", settings.streamPath);
   if (!settings.picturesPath.empty()) files.emplace_back("Pictures in", settings.picturesPath);
+  for (const SnapshotRequest& snapshot : settings.snapshots) files.emplace_back("Snapshot in", snapshot.path);
+  if (!settings.reportPath.empty()) files.emplace_back("Report in", settings.reportPath);
   if (auto failure = print(out, options.json ? callJson(report.value(), interrupt.requested())
                                              : callSummary(report.value(), files))) {
     return failure;
@@ -75,15 +79,56 @@ Outcome call(const Options& options, const Interrupt& interrupt, std::stop_sourc
 }
 
 Outcome decode(const Options& options, const Interrupt& interrupt, std::stop_source& enough) {
-  auto bytes = ByteReader::open(options.decodeInput, enough.get_token());
-  if (!bytes.ok()) return bytes.failure();
-  AccessUnitReader stream(std::move(bytes.value()));
-  const auto report = runDecode(options.decode, stream, enough);
+  const auto stream = openAccessUnits(options.decodeInput, enough.get_token());
+  if (!stream.ok()) return stream.failure();
+  const auto report = runDecode(options.decode, *stream.value(), enough);
   if (!report.ok()) return report.failure();
   const std::string& path = options.decode.picturesPath;
   if (auto failure = print(summaryFile(isStandardOutput(path)),
                            options.json ? decodeJson(report.value(), interrupt.requested())
                                         : decodeSummary(report.value(), path))) {
+    return failure;
+  }
+  return report.value().inputFailure;
+}
+
+Outcome encode(const Options& options, const Interrupt& interrupt, std::stop_source& enough) {
+  const auto source = openFrameSource(options.source, enough.get_token());
+  if (!source.ok()) return source.failure();
+  const auto report = runEncode(options.encode, *source.value(), enough);
+  if (!report.ok()) return report.failure();
+  const std::string& path = options.encode.path;
+  if (auto failure = print(summaryFile(isStandardOutput(path)),
+                           options.json ? encodeJson(report.value(), interrupt.requested())
+                                        : encodeSummary(report.value(), path))) {
+    return failure;
+  }
+  return report.value().inputFailure;
+}
+
+Outcome convert(const Options& options, const Interrupt& interrupt, std::stop_source& enough) {
+  const auto source = openFrameSource(options.source, enough.get_token());
+  if (!source.ok()) return source.failure();
+  const auto report = runConvert(options.convert, *source.value(), enough);
+  if (!report.ok()) return report.failure();
+  const std::string& path = options.convert.path;
+  if (auto failure = print(summaryFile(isStandardOutput(path)),
+                           options.json ? convertJson(report.value(), interrupt.requested())
+                                        : convertSummary(report.value(), path))) {
+    return failure;
+  }
+  return report.value().inputFailure;
+}
+
+Outcome compare(const Options& options, const Interrupt& interrupt, std::stop_source& enough) {
+  const auto one = openFrameSource(options.source, enough.get_token());
+  if (!one.ok()) return one.failure();
+  const auto other = openFrameSource(options.secondSource, enough.get_token());
+  if (!other.ok()) return other.failure();
+  const auto report = runCompare(*one.value(), *other.value(), enough);
+  if (!report.ok()) return report.failure();
+  if (auto failure = print(stdout, options.json ? compareJson(report.value(), interrupt.requested())
+                                                : compareSummary(report.value(), options.perPicture))) {
     return failure;
   }
   return report.value().inputFailure;
@@ -96,8 +141,17 @@ Outcome run(const Options& options, const Interrupt& interrupt) {
   switch (options.command) {
     case Options::Command::Call:
       return call(options, interrupt, enough);
+    case Options::Command::Encode:
+      return encode(options, interrupt, enough);
+    case Options::Command::Convert:
+      return convert(options, interrupt, enough);
+    case Options::Command::Compare:
+      return compare(options, interrupt, enough);
     case Options::Command::Decode:
       return decode(options, interrupt, enough);
+    case Options::Command::Completion:
+    case Options::Command::Manual:
+      return print(stdout, options.text);
     case Options::Command::Devices:
       return print(stdout, listDevices(options.json));
     case Options::Command::Components: {

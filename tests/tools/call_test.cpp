@@ -126,6 +126,33 @@ TEST(Call, RecoversFromLossesTheSameWayEveryTime) {
   }
 }
 
+TEST(Call, ReportsOnOnePageThatNeedsNothingElse) {
+  const TemporaryDirectory directory;
+  const std::string page = directory.file("call.html");
+  const std::string snapshot = directory.file("second.png");
+  report({"call",      "-s",       "160x96", "-n",         "90",           "-b",    "300k",
+          "--loss",    "2%",       "--at",   "1s",         "bitrate=150k", "--at",  "2s",
+          "rotate=90", "--report", page,     "--snapshot", "1s",           snapshot});
+  const std::string html = contentOf(page);
+  for (const char* const part :
+       {"<h1>Call on msm8960</h1>", "<b>1</b> 1 s: bitrate=150k", "<b>2</b> 2 s: rotate=90", "packets lost",
+        "<tr><th>Input</th><td>built-in scene</td></tr>", "data:image/png;base64,iVBORw0KGgo",
+        "prefers-color-scheme"}) {
+    EXPECT_NE(html.find(part), std::string::npos) << part;
+  }
+  size_t plots = 0;
+  for (size_t at = html.find("<svg"); at != std::string::npos; at = html.find("<svg", at + 1)) ++plots;
+  EXPECT_EQ(plots, 4U);
+  EXPECT_EQ(html.find("http://"), std::string::npos) << "nothing comes from elsewhere";
+  EXPECT_EQ(html.substr(0, html.find("data:image")).find("nan"), std::string::npos);
+  EXPECT_TRUE(html.ends_with("</html>\n"));
+  EXPECT_TRUE(contentOf(snapshot).starts_with("\x89PNG"));
+  const Ended late =
+      runTool({"call", "-s", "64x48", "-n", "3", "--snapshot", "9s", directory.file("late.png")});
+  EXPECT_EQ(late.exitCode, kOutput);
+  EXPECT_NE(late.err.find("late.png: there was no picture at 9 s"), std::string::npos) << late.err;
+}
+
 TEST(Call, TakesItsOwnOutputBackInEveryForm) {
   const TemporaryDirectory directory;
   const std::string y4m = directory.file("a.y4m");

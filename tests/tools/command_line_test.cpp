@@ -1,6 +1,7 @@
 // The command line as a user meets it: what it refuses and how, help, lists, exit codes.
 #include <gtest/gtest.h>
 #include <signal.h>
+#include <stdlib.h>
 
 #include <nlohmann/json.hpp>
 #include <set>
@@ -20,6 +21,13 @@ constexpr int kInterrupted = 130;
 
 bool contains(const std::string& text, std::string_view part) {
   return text.find(part) != std::string::npos;
+}
+
+std::string replaced(std::string text, const std::string& what, const std::string& by) {
+  for (size_t at = text.find(what); at != std::string::npos; at = text.find(what, at + by.size())) {
+    text.replace(at, what.size(), by);
+  }
+  return text;
 }
 
 TEST(CommandLine, RefusesWhatItDoesNotUnderstandAndSaysWhatItTakes) {
@@ -76,6 +84,30 @@ TEST(CommandLine, HelpsWithExamplesAndExitCodes) {
   EXPECT_TRUE(contains(runTool({"call", "--help"}).out, "Examples:"));
   EXPECT_TRUE(contains(runTool({"decode", "--help"}).out, "  130  interrupted"));
   EXPECT_EQ(runTool({"--version"}).exitCode, 0);
+}
+
+TEST(CommandLine, TellsShellsAndManOfEveryOption) {
+  const std::string bash = runTool({"completion", "bash"}).out;
+  const std::string zsh = runTool({"completion", "zsh"}).out;
+  const std::string manual = runTool({"manual"}).out;
+  for (const char* const option :
+       {"--at", "--loss", "--report", "--per-picture", "--cut", "--json", "--format"}) {
+    EXPECT_TRUE(contains(bash, option)) << option;
+    EXPECT_TRUE(contains(zsh, option)) << option;
+    EXPECT_TRUE(contains(manual, "\\-\\-" + std::string(option).substr(2, 2))) << option;
+  }
+  EXPECT_TRUE(contains(manual, ".SH EXIT STATUS"));
+  // As a shell uses it.
+  const TemporaryDirectory directory;
+  const std::string script = directory.write("completion", bash);
+  const std::string ask =
+      "source " + script +
+      "; complete_it() { COMP_WORDS=(\"$@\"); COMP_CWORD=$(($# - 1)); _omxbridge; "
+      "printf '%s ' \"${COMPREPLY[@]}\"; }; complete_it omxbridge co; complete_it omxbridge "
+      "call --profile m; complete_it omxbridge call --key";
+  const std::string answer = directory.file("answer");
+  ASSERT_EQ(system(("bash -c '" + replaced(ask, "'", "'\\''") + "' > " + answer).c_str()), 0);
+  EXPECT_EQ(contentOf(answer), "convert compare components completion main --key-interval ");
 }
 
 TEST(CommandLine, ListsTheDevices) {

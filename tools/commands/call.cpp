@@ -10,6 +10,7 @@
 #include "tools/base/cpu_time.h"
 #include "tools/files/output_file.h"
 #include "tools/files/picture_writer.h"
+#include "tools/report/html_report.h"
 #include "tools/video/device_layout.h"
 #include "tools/video/psnr.h"
 #include "tools/video/rework.h"
@@ -31,6 +32,7 @@ class Call : private SenderOwner {
         _source(source),
         _enough(enough),
         _path(settings.impairments),
+        _snapshots(settings.snapshots, !settings.reportPath.empty()),
         _sender(settings.sender, source, _book, *this, enough.get_token()) {}
 
   Outcome open();
@@ -70,6 +72,8 @@ class Call : private SenderOwner {
   DecodedPictureReader _reader;
   Picture _decoded;
   Picture _turned;
+  SnapshotTaker _snapshots;
+  std::unique_ptr<OutputFile> _reportFile;  // null: no report
   std::unique_ptr<PictureWriter> _writer;
 
   CallBook _book;
@@ -88,6 +92,11 @@ Outcome Call::open() {
     auto file = OutputFile::create(_settings.streamPath);
     if (!file.ok()) return file.failure();
     _streamFile = std::move(file.value());
+  }
+  if (!_settings.reportPath.empty()) {
+    auto file = OutputFile::create(_settings.reportPath);
+    if (!file.ok()) return file.failure();
+    _reportFile = std::move(file.value());
   }
   auto writer = createPictureWriter(_settings.picturesPath, _settings.picturesFormat, _source.traits(),
                                     OtherSizes::Fit);
@@ -124,7 +133,14 @@ Outcome Call::run() {
   if (_streamFile != nullptr && _book.figures().framesEncoded > 0) {
     if (auto failure = _streamFile->commit()) return failure;
   }
-  return _writer->finish();
+  if (auto failure = _writer->finish()) return failure;
+  if (_reportFile != nullptr) {
+    const std::string page = htmlReport(report(), _snapshots.kept());
+    const auto* const bytes = reinterpret_cast<const uint8_t*>(page.data());
+    if (auto failure = _reportFile->write({bytes, page.size()})) return failure;
+    if (auto failure = _reportFile->commit()) return failure;
+  }
+  return _snapshots.finish();
 }
 
 // A way with impairments runs in the time of the video: what happens on it until a picture is taken depends
@@ -200,9 +216,10 @@ void Call::onDecoded(const DECODEDDATAINFO& info, std::span<const uint8_t> data,
       _networkDelays.erase(timestamp);
     }
     const Picture& before = turned(source->picture, source->rotation, _turned);
-    const bool comparable = _decoded.size == before.size;
-    _book.decoded(timestamp, now - source->captured + onTheWay,
-                  comparable ? std::optional(psnr(_decoded.luma(), before.luma())) : std::nullopt);
+    std::optional<double> quality;
+    if (_decoded.size == before.size) quality = psnr(_decoded.luma(), before.luma());
+    _book.decoded(timestamp, now - source->captured + onTheWay, quality);
+    _snapshots.offer(source->time, before, _decoded, quality.value_or(0));
   } else {
     _book.strayed();
   }
@@ -220,6 +237,7 @@ void Call::fail(Failure failure) {
 
 CallReport Call::report() const {
   CallReport report;
+  report.input = _settings.inputName;
   report.figures = _book.figures();
   report.trace = _book.trace();
   report.encoder = _sender.encoder();

@@ -22,6 +22,7 @@
 #include "tools/files/frame_source.h"
 #include "tools/h264/headers.h"
 #include "tools/network/lossy_path.h"
+#include "tools/report/snapshots.h"
 
 namespace tool {
 
@@ -31,9 +32,13 @@ struct CallSettings {
   std::string streamPath;      // the coded stream (Annex B); empty: not kept
   std::string picturesPath;    // the decoded pictures; empty: not kept
   std::string picturesFormat;  // see createPictureWriter()
+  std::string reportPath;      // an HTML file; empty: none
+  std::string inputName;       // for the report
+  std::vector<SnapshotRequest> snapshots;
 };
 
 struct CallReport {
+  std::string input;  // as the user named it; empty: the built-in scene
   CallFigures figures;
   CallTrace trace;
   EncoderSettings encoder;

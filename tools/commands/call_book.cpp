@@ -53,9 +53,9 @@ int64_t CallBook::timeOf(uint32_t timestamp) {
   return picture != nullptr ? picture->time : 0;
 }
 
-void CallBook::changed(int64_t time, std::string text) {
+void CallBook::changed(ChangeTrace change) {
   const std::lock_guard held(_mutex);
-  _trace.changes.push_back({time, std::move(text)});
+  _trace.changes.push_back(std::move(change));
 }
 
 std::optional<SentPicture> CallBook::arrived(uint32_t timestamp) {

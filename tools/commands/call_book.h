@@ -12,6 +12,7 @@
 #include <string>
 #include <vector>
 
+#include "omxbridge/codec_settings.h"
 #include "tools/base/clock.h"
 #include "tools/video/picture.h"
 
@@ -39,6 +40,8 @@ struct PictureTrace {
 // A change that was carried out.
 struct ChangeTrace {
   int64_t time;  // of the first picture that it holds for
+  CONFIGTYPE item;
+  uint32_t value;
   std::string text;
 };
 
@@ -77,7 +80,7 @@ class CallBook {
   void encoded(uint32_t timestamp, size_t bytes, bool isKey);
   // When a picture that was sent is due, in microseconds of the video.
   int64_t timeOf(uint32_t timestamp);
-  void changed(int64_t time, std::string text);
+  void changed(ChangeTrace change);
   // The picture that was sent with this time stamp, no longer under way; those sent before it count as
   // lost. Nothing where there is none.
   std::optional<SentPicture> arrived(uint32_t timestamp);

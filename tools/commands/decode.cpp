@@ -24,7 +24,7 @@ constexpr std::chrono::milliseconds kPatience{300};
 
 class Decoding {
  public:
-  Decoding(const DecodeSettings& settings, AccessUnitReader& stream, std::stop_source& enough)
+  Decoding(const DecodeSettings& settings, AccessUnitSource& stream, std::stop_source& enough)
       : _settings(settings), _stream(stream), _enough(enough) {}
 
   Outcome open();
@@ -37,7 +37,7 @@ class Decoding {
   void fail(Failure failure);
 
   const DecodeSettings _settings;
-  AccessUnitReader& _stream;
+  AccessUnitSource& _stream;
   std::stop_source& _enough;
   FrameRate _rate;
   std::vector<uint8_t> _unit;
@@ -79,7 +79,7 @@ Outcome Decoding::run() {
     if (_failure) return _failure;
   }
   if (_report.picturesOut == 0 && !_enough.stop_requested()) {
-    return _stream.input().failure("gave no picture: the decoder made nothing of it");
+    return _stream.failure("gave no picture: the decoder made nothing of it");
   }
   return _writer->finish();
 }
@@ -125,7 +125,7 @@ DecodeReport Decoding::report() const {
 
 }  // namespace
 
-Result<DecodeReport> runDecode(const DecodeSettings& settings, AccessUnitReader& stream,
+Result<DecodeReport> runDecode(const DecodeSettings& settings, AccessUnitSource& stream,
                                std::stop_source& enough) {
   Decoding decoding(settings, stream, enough);
   if (auto failure = decoding.open()) return *failure;

@@ -1,5 +1,5 @@
-// Decodes an H.264 byte stream with the device's decoder: the main thread cuts it into access units and
-// feeds them; the decoder's output thread writes the pictures.
+// Decodes an H.264 stream with the device's decoder: the main thread takes its access units and feeds them;
+// the decoder's output thread writes the pictures.
 #pragma once
 
 #include <stdint.h>
@@ -33,7 +33,7 @@ struct DecodeReport {
 };
 
 // `enough` ends it early, as in runCall().
-Result<DecodeReport> runDecode(const DecodeSettings& settings, AccessUnitReader& stream,
+Result<DecodeReport> runDecode(const DecodeSettings& settings, AccessUnitSource& stream,
                                std::stop_source& enough);
 
 std::string decodeSummary(const DecodeReport& report, const std::string& picturesPath);

@@ -97,7 +97,8 @@ Outcome Sender::applyChanges(int64_t time) {
       return failure;
     }
     const bool isIgnored = change.item == CONFIG_INTRA_PERIOD && _hardwareVersion == HW_VERSION_OMAP4;
-    _book.changed(time, change.text + (isIgnored ? " (ignored by this device)" : ""));
+    _book.changed(
+        {time, change.item, change.value, change.text + (isIgnored ? " (ignored by this device)" : "")});
   }
   return {};
 }

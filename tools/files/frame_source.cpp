@@ -47,7 +47,8 @@ constexpr std::array kInputKinds{
               [](std::unique_ptr<ByteReader> bytes, const SourceRequest& request) -> Source {
                 if (const auto kind = surelyIs(*bytes))
                   return hasSizeOfItsOwn(*bytes, "a file of format " + *kind);
-                return openRaw(std::move(bytes), *request.size, request.rate.value_or(FrameRate()));
+                return openRaw(std::move(bytes), *request.size, request.rate.value_or(FrameRate()),
+                               *findLayout(request.layout));
               }},
     InputKind{[](FirstBytes, const SourceRequest&) { return true; },
               [](std::unique_ptr<ByteReader> bytes, const SourceRequest& request) -> Source {

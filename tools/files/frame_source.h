@@ -31,8 +31,9 @@ class FrameSource {
 
 struct SourceRequest {
   std::string path;               // "-" standard input; empty: the built-in scene
-  std::optional<Size> size;       // needed for raw I420; of the scene
+  std::optional<Size> size;       // needed for raw pictures; of the scene
   std::optional<FrameRate> rate;  // instead of the input's own, or of the default
+  std::string layout = "i420";    // of raw pictures, see findLayout()
 };
 
 // Tells what the input is by its first bytes.

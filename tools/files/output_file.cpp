@@ -89,6 +89,10 @@ Outcome OutputFile::write(std::span<const uint8_t> bytes) {
   return {};
 }
 
+bool OutputFile::seek(uint64_t offset) {
+  return isSeekable() && lseek(_descriptor, static_cast<off_t>(offset), SEEK_SET) >= 0;
+}
+
 Outcome OutputFile::commit() {
   if (_descriptor > STDERR_FILENO) {
     const int closed = close(_descriptor);  // where some file systems report what did not fit

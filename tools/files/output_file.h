@@ -25,6 +25,9 @@ class OutputFile {
   const std::string& name() const { return _name; }
 
   Outcome write(std::span<const uint8_t> bytes);
+  // Goes on from this byte. Only files that get their name later can do so.
+  bool isSeekable() const { return !_temporaryPath.empty(); }
+  bool seek(uint64_t offset);
   // Once, at the end.
   Outcome commit();
 

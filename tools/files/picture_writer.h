@@ -1,4 +1,4 @@
-// Where decoded pictures go: Y4M, raw I420, or nowhere. One thread at a time.
+// Where pictures go: Y4M, raw, PNG, a sum for each, or nowhere. One thread at a time.
 #pragma once
 
 #include <memory>

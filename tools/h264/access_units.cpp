@@ -52,6 +52,11 @@ bool holdsKeyPicture(std::span<const uint8_t> bytes) {
   return !findNal(bytes, [](NalType type) { return type == kNalIdrSlice; }).empty();
 }
 
+std::span<const uint8_t> leadingParameters(std::span<const uint8_t> bytes) {
+  const auto slice = findNal(bytes, isSlice);
+  return slice.empty() ? bytes : bytes.first(bytes.size() - slice.size() - kStartCode);
+}
+
 std::optional<SequenceInfo> findSequenceInfo(std::span<const uint8_t> bytes) {
   const auto nal = findNal(bytes, [](NalType type) { return type == kNalSequenceParameters; });
   if (nal.size() < 4) return std::nullopt;

@@ -14,20 +14,31 @@ namespace tool {
 bool holdsPicture(std::span<const uint8_t> bytes);
 // Whether a decoder can begin with them.
 bool holdsKeyPicture(std::span<const uint8_t> bytes);
+// What precedes the first slice: parameter sets and messages.
+std::span<const uint8_t> leadingParameters(std::span<const uint8_t> bytes);
 // From the first sequence parameters in the bytes, if there are any.
 std::optional<SequenceInfo> findSequenceInfo(std::span<const uint8_t> bytes);
 
-class AccessUnitReader {
+// Where access units come from.
+class AccessUnitSource {
+ public:
+  virtual ~AccessUnitSource() = default;
+  // The next unit into `unit`. False at the end of the stream, or once a stop has been requested.
+  virtual Result<bool> next(std::vector<uint8_t>& unit) = 0;
+  // What the stream says so far.
+  virtual std::optional<FrameRate> frameRate() const = 0;
+  // A failure of this input, for messages.
+  virtual Failure failure(const std::string& problem) const = 0;
+};
+
+class AccessUnitReader : public AccessUnitSource {
  public:
   explicit AccessUnitReader(std::unique_ptr<ByteReader> bytes) : _bytes(std::move(bytes)) {}
 
-  // The next unit into `unit`. False at the end of the stream, or once a stop has been requested. What
-  // precedes the first start code is skipped. Fails where the input is no such stream.
-  Result<bool> next(std::vector<uint8_t>& unit);
-
-  // What the stream says so far.
-  std::optional<FrameRate> frameRate() const { return _parameters.frameRate(); }
-  const ByteReader& input() const { return *_bytes; }
+  // What precedes the first start code is skipped. Fails where the input is no such stream.
+  Result<bool> next(std::vector<uint8_t>& unit) override;
+  std::optional<FrameRate> frameRate() const override { return _parameters.frameRate(); }
+  Failure failure(const std::string& problem) const override { return _bytes->failure(problem); }
 
  private:
   Result<bool> nextNal();

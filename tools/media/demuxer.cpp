@@ -13,6 +13,7 @@ namespace tool {
 namespace {
 
 constexpr int kIoBuffer = 65536;
+constexpr AVRational kMicroseconds{1, AV_TIME_BASE};
 
 }  // namespace
 
@@ -100,7 +101,7 @@ void Demuxer::noteEnd(const AVPacket& packet) {
   if (packet.pts == AV_NOPTS_VALUE) return;
   const AVRational unit = _format->streams[packet.stream_index]->time_base;
   const int64_t begin = _format->start_time != AV_NOPTS_VALUE ? _format->start_time : 0;
-  _end = std::max(_end, av_rescale_q(packet.pts + packet.duration, unit, AV_TIME_BASE_Q) - begin);
+  _end = std::max(_end, av_rescale_q(packet.pts + packet.duration, unit, kMicroseconds) - begin);
 }
 
 // For files that state their duration but not how many pictures they have.

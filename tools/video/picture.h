@@ -40,6 +40,7 @@ struct VideoTraits {
   // As Y4M puts them: where chroma samples lie, and the shape of a pixel ("0:0" unknown).
   std::string chroma = "420mpeg2";
   std::string pixelAspect = "0:0";
+  std::string layout = "i420";  // of raw files, see findLayout()
 };
 
 }  // namespace tool

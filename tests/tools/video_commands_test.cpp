@@ -1,0 +1,140 @@
+// encode, decode, convert and compare as a user runs them, one feeding the other.
+#include <gtest/gtest.h>
+
+#include <nlohmann/json.hpp>
+
+#include "tests/tools/process.h"
+
+namespace {
+
+using namespace tooltest;
+using nlohmann::json;
+
+constexpr int kUsage = 2;
+constexpr int kInput = 3;
+constexpr int kOutput = 4;
+
+json report(std::vector<std::string> arguments) {
+  arguments.emplace_back("--json");
+  const Ended run = runTool(arguments);
+  EXPECT_EQ(run.exitCode, 0) << run.err;
+  return json::parse(run.out, nullptr, false);
+}
+
+// What is encoded into each kind of file decodes to the same pictures, on every road into the decoder.
+TEST(VideoCommands, EncodeIntoFilesThatDecodeAlike) {
+  const TemporaryDirectory directory;
+  const std::string stream = directory.file("a.264");
+  const std::string mp4 = directory.file("a.mp4");
+  const std::vector<std::string> scene{"encode", "-s",   "96x80", "-n", "25",
+                                       "--fps",  "12.5", "-k",    "10", "-o"};
+  const auto encoded = [&scene](std::string path) {
+    std::vector<std::string> arguments = scene;
+    arguments.push_back(std::move(path));
+    return report(arguments);
+  };
+  const json figures = encoded(stream);
+  EXPECT_EQ(figures["frames_encoded"], 25);
+  EXPECT_EQ(figures["key_frames"], 3);
+  EXPECT_EQ(figures["bytes"], contentOf(stream).size());
+  EXPECT_EQ(encoded(mp4)["frames_encoded"], 25);
+  std::vector<std::string> toPipe = scene;
+  toPipe.insert(toPipe.end(), {"-", "--format", "mp4"});
+  const std::string fragments = directory.write("fragments.mp4", runTool(toPipe).out);
+
+  const Ended sums = runTool({"decode", stream, "-o", "-", "--format", "hash"});
+  EXPECT_EQ(std::count(sums.out.begin(), sums.out.end(), '\n'), 25);
+  EXPECT_TRUE(sums.out.starts_with("0 96x80 ")) << sums.out;
+  for (const std::string& file : {mp4, fragments}) {
+    EXPECT_EQ(runTool({"decode", file, "-o", "-", "--format", "hash"}).out, sums.out) << file;
+  }
+  EXPECT_EQ(runTool({"decode", "-", "-o", "-", "--format", "hash"}, {.in = stream}).out, sums.out);
+  EXPECT_EQ(report({"decode", mp4})["fps"], 12.5);
+  // The way through the media libraries gives the same pictures as the device's decoder.
+  const std::string decoded = directory.file("decoded.y4m");
+  report({"decode", mp4, "-o", decoded});
+  const json same = report({"compare", mp4, decoded});
+  EXPECT_EQ(same["frames_compared"], 25);
+  EXPECT_EQ(same["psnr_y"], 100);
+  EXPECT_EQ(same["ssim_y"], 1);
+
+  const std::string content = contentOf(mp4);
+  const std::string cut = directory.write("cut.mp4", content.substr(0, content.size() / 2));
+  for (const char* const command : {"call", "decode", "encode"}) {
+    const Ended run = runTool({command, cut});
+    EXPECT_EQ(run.exitCode, kInput) << command;
+    EXPECT_NE(run.err.find("cut.mp4"), std::string::npos) << run.err;
+  }
+}
+
+TEST(VideoCommands, WritePngPicturesByNumber) {
+  const TemporaryDirectory directory;
+  report({"convert", "-s", "64x48", "-n", "3", "-o", directory.file("p-%03d.png")});
+  EXPECT_EQ(directory.names().size(), 3U);
+  // What comes back from RGB differs by its rounding.
+  const std::string original = directory.file("original.y4m");
+  report({"convert", "-s", "64x48", "-n", "3", "-o", original});
+  const json difference = report({"compare", directory.file("p-000.png"), original});
+  EXPECT_EQ(difference["frames_only_in_second"], 2);
+  EXPECT_GT(difference["psnr_y"], 35);
+  const Ended run = runTool({"convert", "-n", "2", "-o", directory.file("one.png")});
+  EXPECT_EQ(run.exitCode, kOutput);
+  EXPECT_NE(run.err.find("frame-%04d.png"), std::string::npos) << run.err;
+}
+
+TEST(VideoCommands, ConvertThereAndBack) {
+  const TemporaryDirectory directory;
+  const std::string original = directory.file("a.y4m");
+  report({"convert", "-s", "96x64", "-n", "2", "-o", original});
+  const std::string raw = directory.file("a.raw");
+  for (const char* const layout : {"yv12", "nv12", "nv21", "yuy2", "uyvy"}) {
+    report({"convert", original, "--to", layout, "-o", raw});
+    const std::string back = directory.file("back.y4m");
+    report({"convert", raw, "-s", "96x64", "--from", layout, "-o", back});
+    EXPECT_EQ(report({"compare", original, back})["psnr_y"], 100) << layout;
+    EXPECT_GT(report({"compare", original, back})["psnr_u"], 30) << layout;
+  }
+  const std::string turned = directory.file("turned.y4m");
+  const json sizes = report({"convert", original, "--rotate", "90", "--pad", "96x128", "-o", turned});
+  EXPECT_EQ(sizes["width"], 96);
+  EXPECT_EQ(sizes["height"], 128);
+  const std::string back = directory.file("back.y4m");
+  report({"convert", turned, "--cut", "64x96", "--rotate", "270", "-o", back});
+  EXPECT_TRUE(contentOf(back) == contentOf(original));
+  report({"convert", original, "--scale", "192x128", "-o", turned});
+  report({"convert", turned, "--scale", "96x64", "-o", back});
+  EXPECT_GT(report({"compare", original, back})["ssim_y"], 0.75);
+}
+
+TEST(VideoCommands, RefuseWhatDoesNotGoTogether) {
+  const TemporaryDirectory directory;
+  const std::string small = directory.file("small.y4m");
+  const std::string large = directory.file("large.y4m");
+  report({"convert", "-s", "64x48", "-n", "1", "-o", small});
+  report({"convert", "-s", "96x64", "-n", "3", "-o", large});
+  const struct {
+    std::vector<std::string> arguments;
+    int exitCode;
+    const char* complaint;
+  } cases[] = {
+      {{"convert", small, "--cut", "96x96"},
+       kUsage,
+       "--cut 96x96 is larger than the picture, which is 64x48"},
+      {{"convert", small, "--pad", "32x96"}, kUsage, "--pad 32x96 is smaller"},
+      {{"convert", small, "--scale", "33x32"}, kUsage, "\"33x32\" is not an even size"},
+      {{"convert", small, "--rotate", "45"}, kUsage, "\"45\" is not 0, 90, 180 or 270"},
+      {{"compare", small, large}, kInput, "the pictures differ in size, 64x48 and 96x64"},
+      {{"compare", "-", "-"}, kUsage, "only one of the two"},
+      {{"call", large, "-s", "96x64"}, kInput, "leave --size out"},
+      {{"encode", large, "-o", "/dev/full"}, kOutput, "/dev/full: no space left"},
+      {{"encode", large, "-o", "/dev/full", "--format", "mp4"}, kOutput, "/dev/full: no space left"},
+  };
+  for (const auto& each : cases) {
+    const Ended run = runTool(each.arguments);
+    EXPECT_EQ(run.exitCode, each.exitCode) << run.err;
+    EXPECT_NE(run.err.find(each.complaint), std::string::npos) << run.err;
+  }
+  EXPECT_EQ(report({"compare", large, large})["frames_compared"], 3);
+}
+
+}  // namespace
