@@ -28,7 +28,7 @@ Interrupt::Interrupt() {
 
 Interrupt::~Interrupt() {
   const uint64_t one = 1;
-  static_cast<void>(write(_ended, &one, sizeof(one)));
+  [[maybe_unused]] const ssize_t written = write(_ended, &one, sizeof(one));
   _watcher.join();
   close(_signals);
   close(_ended);

@@ -25,7 +25,7 @@ class ByteReader::StopSignal {
   explicit StopSignal(const std::stop_token& stop)
       : _callback(stop, [this] {
           const uint64_t one = 1;
-          static_cast<void>(::write(_event.descriptor, &one, sizeof(one)));
+          [[maybe_unused]] const ssize_t written = ::write(_event.descriptor, &one, sizeof(one));
         }) {}
 
   int descriptor() const { return _event.descriptor; }
