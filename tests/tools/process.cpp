@@ -58,7 +58,9 @@ Process::Process(const std::vector<std::string>& arguments, const Streams& strea
     _terminal = posix_openpt(O_RDWR | O_NOCTTY | O_CLOEXEC);
     EXPECT_EQ(grantpt(_terminal), 0);
     EXPECT_EQ(unlockpt(_terminal), 0);
-    err = ptsname(_terminal);
+    const char* const name = ptsname(_terminal);
+    EXPECT_NE(name, nullptr) << "no pseudo terminal: is /dev/pts mounted?";
+    err = name != nullptr ? name : "/dev/null";
   }
 
   posix_spawn_file_actions_t actions;
