@@ -36,18 +36,18 @@ TEST_F(Buffers, WithABackupAreCopiedInTheRangeThatIsUsedOnly) {
   const auto node = client();
   for (const OMX_U32 port : {kInputPort, kOutputPort}) node->setGiving(port, Giving::Backup);
   node->toExecuting();
-  decoder.onInput([](const Packet&) {
-    Packet output("out");
-    output.offset = 5;
-    return std::vector<Packet>{output};
-  });
+  Packet made("out");
+  made.offset = 5;
+  decoder.onInput([made](const Packet&) { return std::vector<Packet>{made}; });
   const OmxClient::Buffer in = node->buffers(kInputPort)[0];
   const OmxClient::Buffer out = node->buffers(kOutputPort)[0];
   std::fill_n(in.data, in.size, uint8_t{'i'});
   std::fill_n(out.data, out.size, uint8_t{'.'});
-  node->fill(0);
+  decoder.holdInput();
   ASSERT_EQ(server->emptyBuffer(node->node(), in.id, 60, 4, 0, 9), android::OK);
   std::fill_n(in.data, in.size, uint8_t{'x'});  // the component has its copy
+  decoder.passInput();
+  node->fill(0);
   node->expect(fillBufferDone());
   EXPECT_EQ(decoder.inputs().front().text(), "iiii");
   EXPECT_EQ(std::string(out.data, out.data + 10), ".....out..");
@@ -59,8 +59,7 @@ TEST_F(Buffers, OutsideTheirRangeOrTwiceOrOnTheWrongPortOrTooEarlyAreRefused) {
   node->toIdle();
   EXPECT_EQ(node->fill(0), kUnknownError);
   EXPECT_EQ(node->empty(0, ""), kUnknownError);
-  node->command(OMX_CommandStateSet, OMX_StateExecuting);
-  node->expectComplete(OMX_CommandStateSet, OMX_StateExecuting);
+  node->complete(OMX_CommandStateSet, OMX_StateExecuting);
   const auto input = node->buffers(kInputPort)[0].id;
   const auto output = node->buffers(kOutputPort)[0].id;
   const auto empty = [&](auto id, OMX_U32 offset, OMX_U32 length) {

@@ -1,4 +1,4 @@
-// Commands and states: what is legal, when it completes, and what is heard.
+// Commands: which states and ports they lead to, when they complete, and what is heard.
 
 #include "tests/mediaserver/node_fixture.h"
 
@@ -8,52 +8,40 @@ namespace {
 using Commands = NodeTest;
 
 TEST_F(Commands, EveryPairOfStatesIsLegalOrRefused) {
-  constexpr OMX_STATETYPE kStates[] = {OMX_StateLoaded, OMX_StateIdle, OMX_StateExecuting, OMX_StatePause,
-                                       OMX_StateWaitForResources};
+  constexpr OMX_STATETYPE kStates[] = {OMX_StateLoaded,           OMX_StateIdle,
+                                       OMX_StateExecuting,        OMX_StatePause,
+                                       OMX_StateWaitForResources, OMX_StateInvalid};
   // Rows: from; columns: to. 's' the same state, 'y' legal at once, 'c' legal when the client has given or
-  // freed the buffers, '-' refused.
-  constexpr const char* kTable[] = {"sc--y", "csyy-", "-ysy-", "-yys-", "y---s"};
-  for (size_t from = 0; from < std::size(kStates); ++from) {
+  // freed the buffers, '-' refused, 'i' the end of the node.
+  constexpr const char* kTable[] = {"sc--yi", "csyy-i", "-ysy-i", "-yys-i", "y---si"};
+  for (size_t from = 0; from < std::size(kTable); ++from) {
     for (size_t to = 0; to < std::size(kStates); ++to) {
       SCOPED_TRACE(::testing::Message() << kStates[from] << " to " << kStates[to]);
       const auto node = client();
       reach(node.get(), kStates[from]);
       EXPECT_EQ(node->command(OMX_CommandStateSet, kStates[to]), android::OK);
       const char expected = kTable[from][to];
-      if (expected == 's' || expected == '-') {
-        node->expect(errorIs(expected == 's' ? OMX_ErrorSameState : OMX_ErrorIncorrectStateTransition));
-        EXPECT_EQ(node->state(), kStates[from]);
-        continue;
-      }
-      for (OMX_U32 port = 0; expected == 'c' && port < kPortCount; ++port) {
-        EXPECT_EQ(node->messages().count(anyEvent()), 0u);
-        EXPECT_EQ(node->state(), kStates[from]);
-        if (kStates[to] == OMX_StateIdle) {
-          node->populate(port);
-        } else {
-          node->freeBuffers(port);
+      if (expected == 'y' || expected == 'c') {
+        for (OMX_U32 port = 0; expected == 'c' && port < kPortCount; ++port) {
+          EXPECT_EQ(node->messages().count(anyEvent()), 0u);
+          EXPECT_EQ(node->state(), kStates[from]);
+          kStates[to] == OMX_StateIdle ? node->populate(port) : node->freeBuffers(port);
         }
+        node->expectComplete(OMX_CommandStateSet, kStates[to]);
+        EXPECT_EQ(node->messages().count(anyMessage()), 1u);
+      } else {
+        node->expect(errorIs(expected == 's'   ? OMX_ErrorSameState
+                             : expected == '-' ? OMX_ErrorIncorrectStateTransition
+                                               : OMX_ErrorInvalidState));
       }
-      node->expectComplete(OMX_CommandStateSet, kStates[to]);
-      EXPECT_EQ(node->state(), kStates[to]);
-      EXPECT_EQ(node->messages().count(anyMessage()), 1u);
+      EXPECT_EQ(node->state(), expected == 's' || expected == '-' ? kStates[from] : kStates[to]);
+      if (expected != 'i') continue;
+      PortDefinition record{};
+      const auto index = OMX_IndexParamPortDefinition;
+      EXPECT_EQ(node->command(OMX_CommandStateSet, OMX_StateLoaded), kUnknownError);
+      EXPECT_EQ(server->getParameter(node->node(), index, &record, sizeof(record)), kUnknownError);
+      node->freeBuffers(kInputPort);
     }
-  }
-}
-
-TEST_F(Commands, InvalidEndsTheNodeFromEveryStateExceptForFreeing) {
-  for (const OMX_STATETYPE from : {OMX_StateLoaded, OMX_StateIdle, OMX_StateExecuting, OMX_StatePause}) {
-    const auto node = client();
-    reach(node.get(), from);
-    EXPECT_EQ(node->command(OMX_CommandStateSet, OMX_StateInvalid), android::OK);
-    node->expect(errorIs(OMX_ErrorInvalidState));
-    EXPECT_EQ(node->state(), OMX_StateInvalid);
-    EXPECT_EQ(node->command(OMX_CommandStateSet, OMX_StateLoaded), kUnknownError);
-    PortDefinition record{};
-    EXPECT_EQ(server->getParameter(node->node(), OMX_IndexParamPortDefinition, &record, sizeof(record)),
-              kUnknownError);
-    node->freeBuffers(kInputPort);
-    EXPECT_EQ(node->free(), android::OK);
   }
   EXPECT_EQ(decoder.starts(), decoder.stops());
 }
@@ -68,15 +56,16 @@ TEST_F(Commands, StatesCommandedInARowAreReachedInThatOrderAndAWayToIdleCanBeGiv
   EXPECT_EQ(node->messages().count(commandComplete(OMX_CommandStateSet)), 0u);
   node->freeBuffers(kInputPort);
   node->expectComplete(OMX_CommandStateSet, OMX_StateLoaded);
-  EXPECT_EQ(node->messages().count(errorIs(OMX_ErrorPortUnpopulated)), 0u);
 
   node->messages().clear();
-  node->command(OMX_CommandStateSet, OMX_StateIdle);
-  node->command(OMX_CommandStateSet, OMX_StateExecuting);
+  for (const OMX_STATETYPE state : {OMX_StateIdle, OMX_StateExecuting}) {
+    node->command(OMX_CommandStateSet, state);
+  }
   for (OMX_U32 port = 0; port < kPortCount; ++port) node->populate(port);
   node->expectComplete(OMX_CommandStateSet, OMX_StateExecuting);
-  node->command(OMX_CommandStateSet, OMX_StateIdle);
-  node->command(OMX_CommandStateSet, OMX_StateLoaded);
+  for (const OMX_STATETYPE state : {OMX_StateIdle, OMX_StateLoaded}) {
+    node->command(OMX_CommandStateSet, state);
+  }
   for (OMX_U32 port = 0; port < kPortCount; ++port) node->freeBuffers(port);
   node->expectComplete(OMX_CommandStateSet, OMX_StateLoaded);
   EXPECT_EQ(node->heard(),
@@ -92,17 +81,14 @@ TEST_F(Commands, ACodecThatDoesNotStartKeepsTheNodeInIdle) {
   node->expect(errorIs(OMX_ErrorInsufficientResources), 2);
   EXPECT_EQ(node->state(), OMX_StateIdle);
   decoder.failStart(OMX_ErrorNone);
-  node->command(OMX_CommandStateSet, OMX_StateExecuting);
-  node->expectComplete(OMX_CommandStateSet, OMX_StateExecuting);
+  node->complete(OMX_CommandStateSet, OMX_StateExecuting);
 }
 
-TEST_F(Commands, MistakesInCommandsAreErrorsAsEventsOrAtOnce) {
+TEST_F(Commands, MistakesAreErrorsAsEventsOrAtOnce) {
   const auto node = client();
-  for (const OMX_COMMANDTYPE command :
-       {OMX_CommandFlush, OMX_CommandPortDisable, OMX_CommandPortEnable, OMX_CommandMarkBuffer}) {
-    node->messages().clear();
-    EXPECT_EQ(node->command(command, 2), android::OK);
-    node->expect(errorIs(OMX_ErrorBadPortIndex));
+  for (OMX_U32 command = OMX_CommandFlush; command <= OMX_CommandMarkBuffer; ++command) {
+    EXPECT_EQ(node->command(static_cast<OMX_COMMANDTYPE>(command), 2), android::OK);
+    node->expect(errorIs(OMX_ErrorBadPortIndex), command);
   }
   EXPECT_EQ(node->command(OMX_CommandStateSet, 77), android::OK);
   node->expect(errorIs(OMX_ErrorIncorrectStateTransition));
@@ -110,47 +96,143 @@ TEST_F(Commands, MistakesInCommandsAreErrorsAsEventsOrAtOnce) {
   EXPECT_EQ(node->state(), OMX_StateLoaded);
 }
 
-TEST_F(Commands, FlushReturnsWhatThePortHoldsBeforeItCompletes) {
+TEST_F(Commands, FlushAndIdleReturnWhatThePortsHoldBeforeTheyComplete) {
   const struct {
-    OMX_U32 port;
+    OMX_COMMANDTYPE command;
+    OMX_U32 param;
+    bool paused;
     Words heard;
   } cases[] = {
-      {kInputPort, {"emptied", "emptied", "complete flush 0"}},
-      {kOutputPort, {"filled", "filled", "complete flush 1"}},
-      {OMX_ALL, {"emptied", "emptied", "complete flush 0", "filled", "filled", "complete flush 1"}},
+      {OMX_CommandFlush, kInputPort, false, {"emptied", "emptied", "complete flush 0"}},
+      {OMX_CommandFlush, kOutputPort, false, {"filled", "filled", "complete flush 1"}},
+      {OMX_CommandFlush,
+       OMX_ALL,
+       false,
+       {"emptied", "emptied", "complete flush 0", "filled", "filled", "complete flush 1"}},
+      {OMX_CommandStateSet,
+       OMX_StateIdle,
+       true,
+       {"emptied", "emptied", "filled", "filled", "complete state 2"}},
   };
   for (const auto& test : cases) {
-    SCOPED_TRACE(test.port);
+    SCOPED_TRACE(test.heard.back());
     decoder.holdInput();
     const auto node = running();
+    if (test.paused) node->complete(OMX_CommandStateSet, OMX_StatePause);
+    node->messages().clear();
     node->empty(0, "a");
     node->empty(1, "b");
-    EXPECT_EQ(node->command(OMX_CommandFlush, test.port), android::OK);
-    node->expect(commandComplete(OMX_CommandFlush), test.port == OMX_ALL ? 2 : 1);
+    EXPECT_EQ(node->command(test.command, test.param), android::OK);
+    node->expect(commandComplete(test.command), test.param == OMX_ALL ? 2 : 1);
     EXPECT_EQ(node->heard(), test.heard);
     for (const Packet& output : node->outputs()) EXPECT_TRUE(output.bytes.empty());
     // What came back can be sent again.
-    EXPECT_EQ(node->empty(0, "c"), okIf(test.port != kOutputPort));
-    EXPECT_EQ(node->fill(0), okIf(test.port != kInputPort));
-    decoder.passInput();
+    if (test.paused) node->complete(OMX_CommandStateSet, OMX_StateExecuting);
+    EXPECT_EQ(node->empty(0, "c"), okIf(test.paused || test.param != kOutputPort));
+    EXPECT_EQ(node->fill(0), okIf(test.paused || test.param != kInputPort));
+    EXPECT_EQ(decoder.inputCount(), 0u);
   }
 }
 
-TEST_F(Commands, LeavingExecutingReturnsEveryBufferBeforeIdleIsReported) {
-  for (const bool paused : {false, true}) {
-    decoder.holdInput();
-    const auto node = running();
-    if (paused) {
-      node->command(OMX_CommandStateSet, OMX_StatePause);
-      node->expectComplete(OMX_CommandStateSet, OMX_StatePause);
+TEST_F(Commands, PortsAreClosedAndOpenedInEveryStateWhenTheirBuffersAreGoneAndThere) {
+  for (const OMX_STATETYPE state :
+       {OMX_StateLoaded, OMX_StateIdle, OMX_StateExecuting, OMX_StatePause, OMX_StateWaitForResources}) {
+    for (const OMX_U32 port : {kOutputPort, kInputPort}) {
+      SCOPED_TRACE(::testing::Message() << "state " << state << " port " << port);
+      const auto node = client();
+      reach(node.get(), state);
+      const bool unloaded = node->buffers(port).empty();
+      const bool held = state == OMX_StateExecuting || state == OMX_StatePause;
+      if (held) node->fillAll();
+      const auto expectWaiting = [&](OMX_COMMANDTYPE command) {
+        settle(node.get());
+        EXPECT_EQ(node->messages().count(commandComplete(command)), 0u);
+      };
+      EXPECT_EQ(node->command(OMX_CommandPortDisable, port), android::OK);
+      EXPECT_EQ(node->definition(port).bEnabled, OMX_FALSE);
+      if (held && port == kOutputPort) node->expect(fillBufferDone(), 2);
+      if (!unloaded) {
+        EXPECT_EQ(node->give(port), kUnknownError);
+        node->freeBuffer(port);
+        expectWaiting(OMX_CommandPortDisable);
+        node->freeBuffers(port);
+      }
+      node->expectComplete(OMX_CommandPortDisable, port);
+      EXPECT_EQ(node->give(port), okIf(!unloaded)) << "in advance, on a disabled port";
+      EXPECT_EQ(node->command(OMX_CommandPortEnable, port), android::OK);
+      EXPECT_EQ(node->definition(port).bEnabled, OMX_TRUE);
+      if (!unloaded) {
+        expectWaiting(OMX_CommandPortEnable);
+        EXPECT_EQ(port == kInputPort ? node->empty(0, "") : node->fill(0), kUnknownError);
+        EXPECT_EQ(node->give(port), android::OK);
+      }
+      node->expectComplete(OMX_CommandPortEnable, port);
+      EXPECT_EQ(node->messages().count(errorIs(OMX_ErrorPortUnpopulated)), 0u);
+      if (state != OMX_StateExecuting) continue;
+      if (port == kOutputPort) node->fillAll();
       node->messages().clear();
+      node->empty(0, "on it goes");
+      node->expect(fillBufferDone());
+      EXPECT_EQ(node->outputs().back().text(), "on it goes");
     }
-    node->empty(0, "a");
-    node->executingToIdle();
-    EXPECT_EQ(node->heard(), (Words{"emptied", "filled", "filled", "complete state 2"}));
-    EXPECT_EQ(decoder.inputCount(), 0u);
-    decoder.passInput();
   }
+}
+
+TEST_F(Commands, DisabledPortsDoNotCountAndChangesOfAPortComeOneAfterTheOther) {
+  const auto node = client();
+  node->complete(OMX_CommandPortDisable, kOutputPort);
+  node->command(OMX_CommandStateSet, OMX_StateIdle);
+  node->populate(kInputPort);
+  node->expectComplete(OMX_CommandStateSet, OMX_StateIdle);
+  node->idleToLoaded();
+  node->complete(OMX_CommandPortEnable, kOutputPort);
+
+  node->toExecuting();
+  node->fillAll();
+  node->command(OMX_CommandPortDisable, kOutputPort);
+  node->command(OMX_CommandPortEnable, kOutputPort);
+  node->command(OMX_CommandPortDisable, OMX_ALL);
+  node->expect(fillBufferDone(), 2);
+  node->freeBuffers(kOutputPort);
+  node->expectComplete(OMX_CommandPortDisable, kOutputPort);
+  settle(node.get());
+  node->populate(kOutputPort);
+  node->expectComplete(OMX_CommandPortEnable, kOutputPort);
+  for (OMX_U32 port = 0; port < kPortCount; ++port) node->freeBuffers(port);
+  node->expectComplete(OMX_CommandPortDisable, kInputPort);
+  node->expect(commandComplete(OMX_CommandPortDisable, kOutputPort), 2);
+  EXPECT_EQ(node->messages().count(errorIs(OMX_ErrorPortUnpopulated)), 0u);
+}
+
+TEST_F(Commands, BuffersAreTakenWhereTheyAreDueAndAnUnexpectedFreeIsReported) {
+  const auto node = client();
+  EXPECT_EQ(node->give(kInputPort), kUnknownError) << "in Loaded";
+  node->command(OMX_CommandStateSet, OMX_StateIdle);
+  EXPECT_EQ(node->give(kInputPort, 63), kUnknownError) << "too small";
+  EXPECT_EQ(node->give(kInputPort, 65), android::OK);
+  EXPECT_EQ(node->definition(kInputPort).bPopulated, OMX_FALSE);
+  EXPECT_EQ(node->give(kInputPort), android::OK);
+  EXPECT_EQ(node->definition(kInputPort).bPopulated, OMX_TRUE);
+  EXPECT_EQ(node->give(kInputPort), kUnknownError) << "more than the port has";
+  node->populate(kOutputPort);
+  node->expectComplete(OMX_CommandStateSet, OMX_StateIdle);
+  node->complete(OMX_CommandStateSet, OMX_StateExecuting);
+
+  node->fillAll();
+  decoder.holdOutput();
+  ASSERT_EQ(node->freeBuffer(kOutputPort, 0), android::OK);  // while the node holds it
+  node->expect(errorIs(OMX_ErrorPortUnpopulated));
+  EXPECT_EQ(node->messages().count(fillBufferDone()), 0u);
+  EXPECT_EQ(node->definition(kOutputPort).bPopulated, OMX_FALSE);
+  node->empty(0, "still there");
+  decoder.passOutput();
+  node->expect(fillBufferDone());
+  EXPECT_EQ(node->outputs().front().text(), "still there");
+  // On the way to Loaded, and in it, frees are due.
+  node->messages().clear();
+  node->executingToIdle();
+  node->idleToLoaded();
+  EXPECT_EQ(node->messages().count(anyEvent()), 2u);
 }
 
 }  // namespace

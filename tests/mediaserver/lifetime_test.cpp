@@ -1,6 +1,9 @@
-// Nodes come and go: freed from any state, by anybody and at any moment; ids that are wrong harm nobody.
+// Nodes come and go: freed from any state, by anybody and at any moment; ids that are wrong harm nobody, nor
+// do calls that make no sense.
 
 #include <atomic>
+#include <map>
+#include <random>
 #include <thread>
 
 #include <omxhost/log.h>
@@ -12,82 +15,78 @@ namespace omxtest {
 namespace {
 
 using android::omx_message;
+using NodeId = android::IOMX::node_id;
+using BufferId = android::IOMX::buffer_id;
 constexpr auto kAllPorts = static_cast<OMX_S32>(OMX_ALL);
 
-// Counts what arrives, and can stop a delivery.
+// Counts what arrives, can stop a delivery, and can free its node from inside one.
 class SlowObserver : public android::BnOMXObserver {
  public:
-  void onMessage(const omx_message&) override {
+  void onMessage(const omx_message& message) override {
     ++begun;
     EXPECT_TRUE(eventually([this] { return goOn.load(); }));
+    EXPECT_TRUE(freeing == nullptr || freeing->freeNode(message.node) == android::OK);
     ++ended;
   }
   std::atomic<int> begun{0};
   std::atomic<int> ended{0};
   std::atomic<bool> goOn{false};
+  android::sp<android::IOMX> freeing;
 };
 
 class Lifetime : public NodeTest {
  protected:
-  using NodeId = android::IOMX::node_id;
-  using BufferId = android::IOMX::buffer_id;
-
   // Every call with these ids and otherwise sound arguments: none may succeed.
   void expectAllRefused(NodeId node, BufferId buffer) {
     std::vector<uint8_t> record(sizeof(PortDefinition));
     OMX_STATETYPE state{};
     OMX_INDEXTYPE index{};
     OMX_U32 usage = 0;
-    BufferId given = &given;
+    BufferId given[3] = {&given, &given, &given};
     void* data = &data;
-    const android::sp<android::MemoryDealer> dealer = new android::MemoryDealer(4096, "test");
-    const android::sp<android::IMemory> block = dealer->allocate(4096);
+    const android::sp<android::IMemory> block = (new android::MemoryDealer(4096, "test"))->allocate(4096);
     const auto port = OMX_IndexParamPortDefinition;
     const auto crop = OMX_IndexConfigCommonOutputCrop;
-    EXPECT_NE(server->sendCommand(node, OMX_CommandFlush, 0), android::OK);
-    EXPECT_NE(server->getParameter(node, port, record.data(), record.size()), android::OK);
-    EXPECT_NE(server->setParameter(node, port, record.data(), record.size()), android::OK);
-    EXPECT_NE(server->getConfig(node, crop, record.data(), record.size()), android::OK);
-    EXPECT_NE(server->setConfig(node, crop, record.data(), record.size()), android::OK);
-    EXPECT_NE(server->getState(node, &state), android::OK);
-    EXPECT_NE(server->storeMetaDataInBuffers(node, 0, OMX_FALSE), android::OK);
-    EXPECT_NE(server->enableGraphicBuffers(node, 0, OMX_FALSE), android::OK);
-    EXPECT_NE(server->getGraphicBufferUsage(node, 0, &usage), android::OK);
-    EXPECT_NE(server->useBuffer(node, 0, block, &given), android::OK);
-    EXPECT_EQ(given, nullptr);
-    EXPECT_NE(server->allocateBuffer(node, 0, 4096, &given, &data), android::OK);
+    const android::status_t results[] = {server->sendCommand(node, OMX_CommandFlush, 0),
+                                         server->getParameter(node, port, record.data(), record.size()),
+                                         server->setParameter(node, port, record.data(), record.size()),
+                                         server->getConfig(node, crop, record.data(), record.size()),
+                                         server->setConfig(node, crop, record.data(), record.size()),
+                                         server->getState(node, &state),
+                                         server->storeMetaDataInBuffers(node, 0, OMX_FALSE),
+                                         server->enableGraphicBuffers(node, 0, OMX_FALSE),
+                                         server->getGraphicBufferUsage(node, 0, &usage),
+                                         server->useBuffer(node, 0, block, &given[0]),
+                                         server->allocateBuffer(node, 0, 4096, &given[1], &data),
+                                         server->allocateBufferWithBackup(node, 0, block, &given[2]),
+                                         server->freeBuffer(node, 0, buffer),
+                                         server->fillBuffer(node, buffer),
+                                         server->emptyBuffer(node, buffer, 0, 0, 0, 0),
+                                         server->getExtensionIndex(node, "x", &index),
+                                         server->freeNode(node)};
+    for (const android::status_t& result : results) EXPECT_EQ(result, kUnknownError) << &result - results;
+    for (const BufferId each : given) EXPECT_EQ(each, nullptr);
     EXPECT_EQ(data, nullptr);
-    EXPECT_NE(server->allocateBufferWithBackup(node, 0, block, &given), android::OK);
-    EXPECT_NE(server->freeBuffer(node, 0, buffer), android::OK);
-    EXPECT_NE(server->fillBuffer(node, buffer), android::OK);
-    EXPECT_NE(server->emptyBuffer(node, buffer, 0, 0, 0, 0), android::OK);
-    EXPECT_NE(server->getExtensionIndex(node, "x", &index), android::OK);
-    EXPECT_NE(server->freeNode(node), android::OK);
   }
 };
 
-TEST_F(Lifetime, ComponentsAreListedAndAllocatedByTheirExactNames) {
+TEST_F(Lifetime, WrongNamesIdsAndArgumentsAreRefusedByEveryCall) {
   android::List<android::IOMX::ComponentInfo> list;
   list.push_back({});
   ASSERT_EQ(server->listNodes(&list), android::OK);
   ASSERT_EQ(list.size(), 2u);
   EXPECT_STREQ(list.begin()->mName.string(), kDecoder);
   EXPECT_EQ(server->listNodes(nullptr), kUnknownError);
-
   const android::sp<CollectingObserver> observer = new CollectingObserver;
-  for (const char* name : {"Decoder", "decode", "decoder ", "", static_cast<const char*>(nullptr)}) {
-    NodeId node = this;
-    EXPECT_EQ(server->allocateNode(name, observer, &node), kUnknownError);
-    EXPECT_EQ(node, nullptr);
+  for (const char* name :
+       {"Decoder", "decode", "decoder ", "", static_cast<const char*>(nullptr), kDecoder}) {
+    NodeId none = this;
+    EXPECT_EQ(server->allocateNode(name, name != kDecoder ? observer : nullptr, &none), kUnknownError);
+    EXPECT_EQ(none, nullptr);
   }
-  NodeId node = this;
-  EXPECT_EQ(server->allocateNode(kDecoder, nullptr, &node), kUnknownError);
-  EXPECT_EQ(node, nullptr);
   EXPECT_EQ(server->allocateNode(kDecoder, observer, nullptr), kUnknownError);
   EXPECT_EQ(decoder.liveCodecs(), 0u);
-}
 
-TEST_F(Lifetime, WrongIdsAreRefusedByEveryCall) {
   const auto node = running();
   const auto other = running(kEncoder);
   const BufferId buffer = node->buffers(kOutputPort)[0].id;
@@ -109,37 +108,38 @@ TEST_F(Lifetime, WrongIdsAreRefusedByEveryCall) {
   BufferId given = nullptr;
   void* data = nullptr;
   const android::sp<android::IMemory> block = (new android::MemoryDealer(64, "test"))->allocate(64);
-  EXPECT_EQ(server->getState(id, nullptr), kUnknownError);
-  EXPECT_EQ(server->getExtensionIndex(id, nullptr, nullptr), kUnknownError);
   server->sendCommand(id, OMX_CommandPortDisable, kInputPort);
   other->freeBuffers(kInputPort);
-  EXPECT_EQ(server->useBuffer(id, kInputPort, nullptr, &given), kUnknownError);
-  EXPECT_EQ(server->useBuffer(id, kInputPort, block, nullptr), kUnknownError);
-  EXPECT_EQ(server->useBuffer(id, kPortCount, block, &given), kUnknownError);
-  EXPECT_EQ(server->allocateBufferWithBackup(id, kInputPort, nullptr, &given), kUnknownError);
-  EXPECT_EQ(server->allocateBuffer(id, kInputPort, 64, nullptr, &data), kUnknownError);
-  EXPECT_EQ(server->allocateBuffer(id, kInputPort, 64, &given, nullptr), kUnknownError);
-  EXPECT_EQ(server->allocateBuffer(id, kInputPort, SIZE_MAX, &given, &data), kUnknownError);
+  for (const android::status_t result :
+       {server->getState(id, nullptr), server->getExtensionIndex(id, nullptr, nullptr),
+        server->useBuffer(id, kInputPort, nullptr, &given), server->useBuffer(id, kInputPort, block, nullptr),
+        server->useBuffer(id, kPortCount, block, &given),
+        server->allocateBufferWithBackup(id, kInputPort, nullptr, &given),
+        server->allocateBuffer(id, kInputPort, 64, nullptr, &data),
+        server->allocateBuffer(id, kInputPort, 64, &given, nullptr),
+        server->allocateBuffer(id, kInputPort, SIZE_MAX, &given, &data)}) {
+    EXPECT_EQ(result, kUnknownError);
+  }
 }
 
 TEST_F(Lifetime, FreeingWorksFromEveryStateWithBuffersOnEitherSide) {
+  decoder.holdInput();
   for (const OMX_STATETYPE state :
        {OMX_StateLoaded, OMX_StateIdle, OMX_StateExecuting, OMX_StatePause, OMX_StateWaitForResources}) {
     const auto node = client();
     reach(node.get(), state);
-    decoder.holdInput();
     if (state == OMX_StateExecuting || state == OMX_StatePause) {
       node->fillAll();
       node->empty(0, "never seen");
     }
+    if (state == OMX_StateLoaded) {
+      node->command(OMX_CommandStateSet, OMX_StateIdle);
+      node->give(kInputPort);  // and not all
+    }
     EXPECT_EQ(node->free(), android::OK);
     EXPECT_EQ(decoder.liveCodecs(), 0u);
     EXPECT_EQ(decoder.starts(), decoder.stops());
-    decoder.passInput();
   }
-  const auto halfWay = client();
-  halfWay->command(OMX_CommandStateSet, OMX_StateIdle);
-  halfWay->give(kInputPort);
 }
 
 // A client that ends without a word: its nodes go, whatever they were doing, and nobody else's.
@@ -196,26 +196,126 @@ TEST_F(Lifetime, NothingIsDeliveredOnceFreeNodeHasReturnedAndSlownessIsNobodyEls
   freeing.join();
   EXPECT_EQ(observer->begun, observer->ended);
   EXPECT_EQ(observer->getStrongCount(), 1) << "nobody is left who could call";
+
+  // A node that is freed from inside its own delivery.
+  observer->freeing = server;
+  ASSERT_EQ(server->allocateNode(kDecoder, observer, &node), android::OK);
+  const int ended = observer->ended;
+  server->sendCommand(node, OMX_CommandFlush, kAllPorts);
+  EXPECT_TRUE(eventually([&] { return observer->ended > ended && observer->getStrongCount() == 1; }));
+  EXPECT_EQ(server->nodeCount(), 1u);
+  observer->freeing = nullptr;
 }
 
-TEST_F(Lifetime, ANodeCanBeFreedFromInsideItsOwnDelivery) {
-  class FreeingObserver : public android::BnOMXObserver {
-   public:
-    void onMessage(const omx_message& message) override {
-      EXPECT_EQ(server->freeNode(message.node), android::OK);
-      done = true;
+// Keeps account of one node's buffers: what the node was given must balance with what it gives back.
+class AccountingObserver : public android::BnOMXObserver {
+ public:
+  void onMessage(const omx_message& message) override {
+    if (emptyBufferDone()(message)) sent(message.u.buffer_data.buffer, -1);
+    if (fillBufferDone()(message)) sent(message.u.extended_buffer_data.buffer, -1);
+    if (errorIs(OMX_ErrorNotImplemented)(message)) ++marks;
+  }
+
+  // Before the call, as the answer may overtake it; taken back when the call fails.
+  void sent(BufferId buffer, int times) {
+    std::lock_guard<std::mutex> lock(_mutex);
+    EXPECT_GE(_out[buffer] += times, 0) << "came back more often than it was sent";
+  }
+
+  std::atomic<int> marks{0};  // commands to mark that were answered
+
+ private:
+  std::mutex _mutex;
+  std::map<BufferId, int> _out;
+};
+
+// Random calls, sound ones and nonsense, from several threads. Every buffer comes back at most once for each
+// time it was sent, nothing is left over, and the node still does its work or goes.
+TEST_F(Lifetime, RandomCallsFromSeveralThreadsKeepTheBooksInOrder) {
+  constexpr int kRounds = 30;
+  constexpr int kThreads = 3;
+  constexpr int kCalls = 400;
+  for (int round = 0; round < kRounds; ++round) {
+    SCOPED_TRACE(round);
+    const android::sp<AccountingObserver> account = new AccountingObserver;
+    NodeId node = nullptr;
+    ASSERT_EQ(server->allocateNode(kDecoder, account, &node), android::OK);
+    std::mutex mutex;
+    std::vector<BufferId> ids = execute(node);  // that any thread may use, in any way
+
+    const auto call = [&](std::minstd_rand& random) {
+      const auto pick = [&](unsigned limit) { return static_cast<unsigned>(random() >> 4) % limit; };
+      const OMX_U32 port = pick(20) == 0 ? pick(1000) : pick(kPortCount);
+      const auto any = [&, choice = pick(1000)] {
+        std::lock_guard<std::mutex> lock(mutex);
+        return choice % 16 == 0 ? reinterpret_cast<BufferId>(uintptr_t{choice}) : ids[choice % ids.size()];
+      };
+      const auto send = [&](OMX_COMMANDTYPE command, unsigned param) {
+        server->sendCommand(node, command, static_cast<OMX_S32>(param));
+      };
+      const unsigned kind = pick(40);
+      if (kind == 0) {
+        // Not Invalid, which would end the node's life; and not often far away from Executing.
+        send(OMX_CommandStateSet, pick(8) == 0 ? 1 + pick(5) : 2 + pick(2));
+      } else if (kind == 1) {
+        if (pick(3) == 0) send(static_cast<OMX_COMMANDTYPE>(1 + pick(5)), port);
+      } else if (kind == 2) {
+        if (pick(4) == 0) decoder.announce(8 + pick(8), 4);
+      } else if (kind == 3) {
+        send(OMX_CommandPortEnable, OMX_ALL);
+      } else if (kind <= 5) {
+        BufferId id = nullptr;
+        void* data = nullptr;
+        if (server->allocateBuffer(node, port, 40 + pick(100), &id, &data) != android::OK) return;
+        std::lock_guard<std::mutex> lock(mutex);
+        ids.push_back(id);
+      } else if (kind == 6) {
+        server->freeBuffer(node, port, any());
+      } else if (kind == 7) {
+        PortDefinition definition{};
+        definition.nPortIndex = port;
+        server->getParameter(node, OMX_IndexParamPortDefinition, &definition, sizeof(definition));
+        definition.nBufferCountActual = 1 + pick(3);
+        server->setParameter(node, OMX_IndexParamPortDefinition, &definition, sizeof(definition) - pick(2));
+      } else {
+        const BufferId id = any();
+        account->sent(id, 1);
+        const OMX_U32 flags = pick(10) == 0 ? OMX_BUFFERFLAG_EOS : 0;
+        const android::status_t status = pick(2) == 0
+                                             ? server->fillBuffer(node, id)
+                                             : server->emptyBuffer(node, id, pick(8), pick(64), flags, 0);
+        if (status != android::OK) account->sent(id, -1);
+      }
+    };
+    // Callers that never wait would keep the component from its turn.
+    const auto letItWork = [&] {
+      const int before = account->marks;
+      OMX_STATETYPE state{};
+      if (server->sendCommand(node, OMX_CommandMarkBuffer, 0) != android::OK) return;
+      EXPECT_TRUE(eventually(
+          [&] { return account->marks > before || server->getState(node, &state) != android::OK; }));
+    };
+
+    std::atomic<int> made{0};
+    std::vector<std::thread> threads;
+    for (int thread = 0; thread < kThreads; ++thread) {
+      threads.emplace_back([&, seed = static_cast<unsigned>(round * kThreads + thread + 1)] {
+        std::minstd_rand random(seed);
+        for (int i = 0; i < kCalls; ++i, ++made) {
+          call(random);
+          if (i % 10 == 0) letItWork();
+        }
+      });
     }
-    android::sp<mediaserver::OmxServer> server;
-    std::atomic<bool> done{false};
-  };
-  const android::sp<FreeingObserver> observer = new FreeingObserver;
-  observer->server = server;
-  NodeId node = nullptr;
-  ASSERT_EQ(server->allocateNode(kDecoder, observer, &node), android::OK);
-  server->sendCommand(node, OMX_CommandFlush, kAllPorts);
-  EXPECT_TRUE(eventually([&] { return observer->done.load(); }));
-  EXPECT_EQ(server->nodeCount(), 0u);
-  EXPECT_TRUE(eventually([&] { return observer->getStrongCount() == 1; }));
+    // Half of the nodes are freed under the callers' feet.
+    const int enough = kThreads * kCalls * (round % 2 == 0 ? round : kRounds) / kRounds;
+    EXPECT_TRUE(eventually([&] { return made >= enough; }));
+    EXPECT_EQ(server->freeNode(node), android::OK);
+    for (std::thread& thread : threads) thread.join();
+    EXPECT_EQ(decoder.liveCodecs(), 0u);
+    EXPECT_EQ(decoder.starts(), decoder.stops());
+  }
+  EXPECT_GT(decoder.inputCount(), 0u) << "chance led to refusals only";
 }
 
 }  // namespace

@@ -153,6 +153,11 @@ void OmxClient::freeBuffers(OMX_U32 port) {
   while (!_buffers[port].empty()) EXPECT_EQ(freeBuffer(port), android::OK);
 }
 
+void OmxClient::complete(OMX_COMMANDTYPE kind, OMX_U32 param) {
+  EXPECT_EQ(command(kind, param), android::OK);
+  expectComplete(kind, param);
+}
+
 void OmxClient::toIdle() {
   EXPECT_EQ(command(OMX_CommandStateSet, OMX_StateIdle), android::OK);
   for (OMX_U32 port = 0; port < kPortCount; ++port) populate(port);
@@ -161,14 +166,8 @@ void OmxClient::toIdle() {
 
 void OmxClient::toExecuting() {
   toIdle();
-  EXPECT_EQ(command(OMX_CommandStateSet, OMX_StateExecuting), android::OK);
-  expectComplete(OMX_CommandStateSet, OMX_StateExecuting);
+  complete(OMX_CommandStateSet, OMX_StateExecuting);
   messages().clear();
-}
-
-void OmxClient::executingToIdle() {
-  EXPECT_EQ(command(OMX_CommandStateSet, OMX_StateIdle), android::OK);
-  expectComplete(OMX_CommandStateSet, OMX_StateIdle);
 }
 
 void OmxClient::idleToLoaded() {

@@ -86,7 +86,7 @@ class OmxClient {
   // The whole way to a state through the states between, with buffers given and freed where that is due.
   void toIdle();
   void toExecuting();
-  void executingToIdle();
+  void executingToIdle() { complete(OMX_CommandStateSet, OMX_StateIdle); }
   void idleToLoaded();
 
   android::status_t fill(size_t which);
@@ -96,6 +96,8 @@ class OmxClient {
   // Waits for `count` messages that match, counted from the last clear.
   void expect(const Match& match, size_t count = 1);
   void expectComplete(OMX_COMMANDTYPE command, OMX_U32 data) { expect(commandComplete(command, data)); }
+  // Sends a command and waits until it is complete.
+  void complete(OMX_COMMANDTYPE command, OMX_U32 param);
   // The outputs so far, as the client reads them.
   std::vector<Packet> outputs() const;
   // All messages in a few words.

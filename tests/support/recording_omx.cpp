@@ -171,10 +171,25 @@ void RecordingOmx::keepBooks(const Call& call) {
 
 // --- Each operation: written down, and forwarded.
 
-static Call recordCall(Method method, android::IOMX::node_id node, OMX_INDEXTYPE index, const void* params,
-                       size_t size) {
+status_t RecordingOmx::runRecord(Method method, node_id node, OMX_INDEXTYPE index, const void* params,
+                                 size_t size, const std::function<status_t()>& forward) {
   const auto* const bytes = static_cast<const uint8_t*>(params);
-  return {.method = method, .node = node, .index = index, .record = {bytes, bytes + size}, .size = size};
+  return run({.method = method, .node = node, .index = index, .record = {bytes, bytes + size}, .size = size},
+             [&](Call& call) {
+               const status_t status = forward();
+               call.record.assign(bytes, bytes + size);  // of a get: as answered
+               return status;
+             });
+}
+
+status_t RecordingOmx::runBuffer(Method method, node_id node, OMX_U32 port, size_t size, buffer_id* buffer,
+                                 const std::function<status_t()>& forward) {
+  *buffer = nullptr;
+  return run({.method = method, .node = node, .size = size, .port = port}, [&](Call& call) {
+    const status_t status = forward();
+    call.buffer = *buffer;
+    return status;
+  });
 }
 
 status_t RecordingOmx::listNodes(android::List<ComponentInfo>* list) {
@@ -208,29 +223,23 @@ status_t RecordingOmx::sendCommand(node_id node, OMX_COMMANDTYPE cmd, OMX_S32 pa
 }
 
 status_t RecordingOmx::getParameter(node_id node, OMX_INDEXTYPE index, void* params, size_t size) {
-  return run(recordCall(Method::GetParameter, node, index, params, size), [&](Call& call) {
-    const status_t status = _omx->getParameter(node, index, params, size);
-    memcpy(call.record.data(), params, size);
-    return status;
-  });
+  return runRecord(Method::GetParameter, node, index, params, size,
+                   [&] { return _omx->getParameter(node, index, params, size); });
 }
 
 status_t RecordingOmx::getConfig(node_id node, OMX_INDEXTYPE index, void* params, size_t size) {
-  return run(recordCall(Method::GetConfig, node, index, params, size), [&](Call& call) {
-    const status_t status = _omx->getConfig(node, index, params, size);
-    memcpy(call.record.data(), params, size);
-    return status;
-  });
+  return runRecord(Method::GetConfig, node, index, params, size,
+                   [&] { return _omx->getConfig(node, index, params, size); });
 }
 
 status_t RecordingOmx::setParameter(node_id node, OMX_INDEXTYPE index, const void* params, size_t size) {
-  return run(recordCall(Method::SetParameter, node, index, params, size),
-             [&](Call&) { return _omx->setParameter(node, index, params, size); });
+  return runRecord(Method::SetParameter, node, index, params, size,
+                   [&] { return _omx->setParameter(node, index, params, size); });
 }
 
 status_t RecordingOmx::setConfig(node_id node, OMX_INDEXTYPE index, const void* params, size_t size) {
-  return run(recordCall(Method::SetConfig, node, index, params, size),
-             [&](Call&) { return _omx->setConfig(node, index, params, size); });
+  return runRecord(Method::SetConfig, node, index, params, size,
+                   [&] { return _omx->setConfig(node, index, params, size); });
 }
 
 status_t RecordingOmx::storeMetaDataInBuffers(node_id node, OMX_U32 port, OMX_BOOL enable) {
@@ -240,35 +249,21 @@ status_t RecordingOmx::storeMetaDataInBuffers(node_id node, OMX_U32 port, OMX_BO
 
 status_t RecordingOmx::useBuffer(node_id node, OMX_U32 port, const sp<android::IMemory>& params,
                                  buffer_id* buffer) {
-  *buffer = nullptr;
-  return run({.method = Method::UseBuffer, .node = node, .size = params->size(), .port = port},
-             [&](Call& call) {
-               const status_t status = _omx->useBuffer(node, port, params, buffer);
-               call.buffer = *buffer;
-               return status;
-             });
+  return runBuffer(Method::UseBuffer, node, port, params->size(), buffer,
+                   [&] { return _omx->useBuffer(node, port, params, buffer); });
 }
 
 status_t RecordingOmx::allocateBufferWithBackup(node_id node, OMX_U32 port,
                                                 const sp<android::IMemory>& params, buffer_id* buffer) {
-  *buffer = nullptr;
-  return run({.method = Method::AllocateBufferWithBackup, .node = node, .size = params->size(), .port = port},
-             [&](Call& call) {
-               const status_t status = _omx->allocateBufferWithBackup(node, port, params, buffer);
-               call.buffer = *buffer;
-               return status;
-             });
+  return runBuffer(Method::AllocateBufferWithBackup, node, port, params->size(), buffer,
+                   [&] { return _omx->allocateBufferWithBackup(node, port, params, buffer); });
 }
 
 status_t RecordingOmx::allocateBuffer(node_id node, OMX_U32 port, size_t size, buffer_id* buffer,
                                       void** data) {
-  *buffer = nullptr;
   *data = nullptr;
-  return run({.method = Method::AllocateBuffer, .node = node, .size = size, .port = port}, [&](Call& call) {
-    const status_t status = _omx->allocateBuffer(node, port, size, buffer, data);
-    call.buffer = *buffer;
-    return status;
-  });
+  return runBuffer(Method::AllocateBuffer, node, port, size, buffer,
+                   [&] { return _omx->allocateBuffer(node, port, size, buffer, data); });
 }
 
 status_t RecordingOmx::freeBuffer(node_id node, OMX_U32 port, buffer_id buffer) {

@@ -120,6 +120,11 @@ class RecordingOmx : public android::BnOMX {
 
   // Runs one call: failures, hooks, `forward`, books.
   android::status_t run(Call call, const Forward& forward);
+  // The same for calls with a record, and for those that make a buffer.
+  android::status_t runRecord(Method method, node_id node, OMX_INDEXTYPE index, const void* params,
+                              size_t size, const std::function<android::status_t()>& forward);
+  android::status_t runBuffer(Method method, node_id node, OMX_U32 port, size_t size, buffer_id* buffer,
+                              const std::function<android::status_t()>& forward);
   std::optional<android::status_t> begin(Call* call);
   void keepBooks(const Call& call);
   Hook hook(const std::map<Method, Hook>& hooks, Method method) const;

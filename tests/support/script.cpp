@@ -16,7 +16,6 @@ constexpr OMX_U32 kWidth = 176;
 constexpr OMX_U32 kHeight = 144;
 constexpr OMX_U32 kCompressedBytes = 65536;
 constexpr auto kTiPackedSemiPlanar = static_cast<OMX_COLOR_FORMATTYPE>(0x7F000100);
-constexpr auto kMetaDataIndex = static_cast<OMX_INDEXTYPE>(0x7F000F01);
 
 OMX_U32 pictureBytes(OMX_U32 width, OMX_U32 height) {
   return width * height * 3 / 2;
@@ -51,7 +50,6 @@ Script::Script(Kind kind) : _kind(kind) {
   }
   _formats[decoder ? kOutputPort : kInputPort] = {{OMX_VIDEO_CodingUnused, OMX_COLOR_FormatYUV420SemiPlanar},
                                                   {OMX_VIDEO_CodingUnused, kTiPackedSemiPlanar}};
-  _extensions = {{"OMX.google.android.index.storeMetaDataInBuffers", kMetaDataIndex}};
 }
 
 mediaserver::Component Script::component(const std::string& name) {
@@ -69,11 +67,6 @@ void Script::editPort(OMX_U32 port, const PortEdit& edit) {
 void Script::setFormats(OMX_U32 port, std::vector<mediaserver::VideoFormat> formats) {
   const Lock lock(_mutex);
   _formats.at(port) = std::move(formats);
-}
-
-void Script::setExtensions(std::vector<mediaserver::Extension> extensions) {
-  const Lock lock(_mutex);
-  _extensions = std::move(extensions);
 }
 
 void Script::refuse(Access access, OMX_INDEXTYPE index, OMX_ERRORTYPE error) {
@@ -112,12 +105,6 @@ void Script::onInput(Transform transform) {
 void Script::produce(const Packet& output) {
   const Lock lock(_mutex);
   for (ScriptedCodec* codec : _codecs) codec->_line.emplace_back(output);
-  wakeAll();
-}
-
-void Script::setDepth(size_t outputs) {
-  const Lock lock(_mutex);
-  _depth = outputs;
   wakeAll();
 }
 

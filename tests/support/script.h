@@ -56,8 +56,6 @@ class Script {
   void editPort(OMX_U32 port, const PortEdit& edit);
   // Defaults: AVC, MPEG-4, H.263, WMV (an encoder: AVC); 21 and TI's 0x7F000100.
   void setFormats(OMX_U32 port, std::vector<mediaserver::VideoFormat> formats);
-  // Default: the extension that storeMetaDataInBuffers needs, which takes false and refuses true.
-  void setExtensions(std::vector<mediaserver::Extension> extensions);
 
   // Accesses to `index` fail, also to the records that the node answers by itself. Otherwise readable and
   // writable are those that our wrappers send.
@@ -90,8 +88,6 @@ class Script {
   void onInput(Transform transform);
   // An output out of nothing, behind those that wait.
   void produce(const Packet& output);
-  // How many outputs the component keeps before it takes no more inputs; default 16.
-  void setDepth(size_t outputs);
   // Time that each input and each output takes; default none.
   void setDelay(std::chrono::milliseconds delay);
 
@@ -134,7 +130,6 @@ class Script {
   mutable std::condition_variable _changed;
   mediaserver::PortPair _ports{};
   std::array<std::vector<mediaserver::VideoFormat>, mediaserver::kPortCount> _formats;
-  std::vector<mediaserver::Extension> _extensions;
   std::map<std::pair<Access, OMX_INDEXTYPE>, OMX_ERRORTYPE> _refused;
   std::map<OMX_INDEXTYPE, std::vector<uint8_t>> _answers;
   std::map<OMX_INDEXTYPE, std::vector<uint8_t>> _records;  // as last written
@@ -142,7 +137,6 @@ class Script {
   std::optional<size_t> _inputBudget;  // how many may pass; no number: all
   bool _outputHeld = false;
   Transform _transform;
-  size_t _depth = 16;
   std::chrono::milliseconds _delay{0};
   std::set<ScriptedCodec*> _codecs;
   std::vector<Packet> _inputs;

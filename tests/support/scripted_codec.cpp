@@ -19,6 +19,7 @@ using mediaserver::Sent;
 namespace {
 
 constexpr size_t kHeaderBytes = 2 * sizeof(OMX_U32);
+constexpr size_t kDepth = 16;  // outputs that it keeps before it takes no more inputs
 
 // What a component understands whose clients are our wrappers, and the sizes of the records; port records
 // are the node's.
@@ -28,6 +29,7 @@ const std::map<uint32_t, size_t> kParameters = {
     {OMX_IndexParamVideoProfileLevelCurrent, sizeof(OMX_VIDEO_PARAM_PROFILELEVELTYPE)},
     {0x7F000002, 24},  // input packing
     {0x7F000010, 16},  // picture order
+    {kMetaData, 16},
 };
 const std::map<uint32_t, size_t> kConfigs = {
     {OMX_IndexConfigVideoBitrate, sizeof(OMX_VIDEO_CONFIG_BITRATETYPE)},
@@ -88,11 +90,6 @@ std::vector<mediaserver::VideoFormat> ScriptedCodec::formats(OMX_U32 port) const
   return _script._formats.at(port);
 }
 
-std::vector<mediaserver::Extension> ScriptedCodec::extensions() const {
-  const Lock lock(_script._mutex);
-  return _script._extensions;
-}
-
 OMX_ERRORTYPE ScriptedCodec::definePort(OMX_U32 port, const PortDefinition& wanted, PortPair& ports) {
   const auto& before = ports[port].format.video;
   const auto& after = wanted.format.video;
@@ -140,11 +137,9 @@ mediaserver::Codec::Answer ScriptedCodec::set(Access access, OMX_INDEXTYPE index
   const auto refused = _script._refused.find({access, index});
   if (refused != _script._refused.end()) return refused->second;
   const size_t known = knownSize(access, index);
-  const bool extension = std::any_of(_script._extensions.begin(), _script._extensions.end(),
-                                     [&](const mediaserver::Extension& each) { return each.index == index; });
   if (size < known) return OMX_ErrorBadParameter;
-  if (extension && wordAt(record, size, 1) != OMX_FALSE) return OMX_ErrorUnsupportedSetting;
-  if (known == 0 && !extension) return {};
+  if (index == kMetaData && wordAt(record, size, 1) != OMX_FALSE) return OMX_ErrorUnsupportedSetting;
+  if (known == 0) return {};
   const auto* const bytes = static_cast<const uint8_t*>(record);
   _script._records[index].assign(bytes, bytes + size);
   return OMX_ErrorNone;
@@ -186,7 +181,7 @@ void ScriptedCodec::takeTime(Lock& lock) {
 Sent ScriptedCodec::send(const InputView& input) {
   Lock lock(_script._mutex);
   takeTime(lock);
-  if (_script._inputBudget == std::optional<size_t>(0) || _line.size() >= _script._depth) return Sent::Busy;
+  if (_script._inputBudget == std::optional<size_t>(0) || _line.size() >= kDepth) return Sent::Busy;
   if (_script._inputBudget.has_value()) --*_script._inputBudget;
   Packet packet;
   packet.bytes.assign(input.data, input.data + input.length);

@@ -8,6 +8,8 @@
 
 namespace omxtest {
 
+inline constexpr auto kMetaData = static_cast<OMX_INDEXTYPE>(0x7F000F01);
+
 struct Announcement {
   Script::PortEdit edit;
   OMX_U32 index;
@@ -22,7 +24,10 @@ class ScriptedCodec final : public mediaserver::Codec {
 
   mediaserver::PortPair ports() const override;
   std::vector<mediaserver::VideoFormat> formats(OMX_U32 port) const override;
-  std::vector<mediaserver::Extension> extensions() const override;
+  // What storeMetaDataInBuffers needs; it takes false and refuses true.
+  std::vector<mediaserver::Extension> extensions() const override {
+    return {{"OMX.google.android.index.storeMetaDataInBuffers", kMetaData}};
+  }
   OMX_ERRORTYPE definePort(OMX_U32 port, const mediaserver::PortDefinition& wanted,
                            mediaserver::PortPair& ports) override;
   Answer getParameter(OMX_INDEXTYPE index, void* record, size_t size) override {

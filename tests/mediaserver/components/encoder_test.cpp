@@ -1,7 +1,7 @@
 // Encoding: streams that decode to the pictures that went in, on every device, and what may change while the
 // encoder runs.
 
-#include "tests/mediaserver/components/runs.h"
+#include "tests/mediaserver/components/component_run.h"
 
 namespace componenttest {
 namespace {
@@ -28,8 +28,7 @@ TEST(Encoder, EncodesOnePictureToOneUnitOnEveryDevice) {
   for (const char* device : kDevices) {
     for (const auto& [width, height] : {std::pair{96U, 80U}, {98U, 54U}, {16U, 16U}}) {
       SCOPED_TRACE(device);
-      EncoderRun run(device);
-      run.setSize(width, height);
+      EncoderRun run(device, width, height);
       run.setBitRate(800000);
       run.start();
       const std::vector<Picture> pictures = scenes(width, height, 6);
@@ -41,7 +40,7 @@ TEST(Encoder, EncodesOnePictureToOneUnitOnEveryDevice) {
       }
       expectLike(run.units(), pictures, 33);
       run.finish();
-      EXPECT_EQ(run.errors(), Errors{});
+      EXPECT_EQ(run.errors, Errors{});
     }
   }
 }
@@ -57,7 +56,7 @@ TEST(Encoder, TellsTiRowsWithAGapFromRowsWithout) {
     input.format.video.nStride = 96;
     input.format.video.nSliceHeight = 0;
     input.nBufferSize = 90 * 48 * 3 / 2;
-    ASSERT_EQ(run.node().define(kInputPort, input), android::OK);
+    ASSERT_EQ(run.node().define(kInputPort, input), kOk);
     EXPECT_GE(run.node().definition(kInputPort).nBufferSize, 96U * 48 * 3 / 2);
     run.setBitRate(500000);
     run.start();
@@ -91,22 +90,24 @@ TEST(Encoder, TakesSizesThatItCanEncode) {
   for (const auto& each : cases) {
     EncoderRun run(each.device);
     for (const OMX_U32 port : {kInputPort, kOutputPort}) {
-      auto wanted = run.node().definition(port);
-      const uint32_t width = each.bytes != 0 ? each.width : wanted.format.video.nFrameWidth;
-      const uint32_t bytes = each.bytes != 0 ? each.bytes : run.node().definition(kInputPort).nBufferSize;
-      wanted.format.video.nFrameWidth = each.width;
-      wanted.format.video.nFrameHeight = each.height;
-      EXPECT_EQ(run.node().define(port, wanted), each.bytes != 0 ? android::status_t{0} : kUnsupported)
+      const auto before = run.node().definition(kInputPort);
+      EXPECT_EQ(run.define(port,
+                           [&](auto& video) {
+                             video.nFrameWidth = each.width;
+                             video.nFrameHeight = each.height;
+                           }),
+                each.bytes != 0 ? kOk : kUnsupported)
           << each.width << "x" << each.height;
-      EXPECT_EQ(run.node().definition(port).format.video.nFrameWidth, width);
-      EXPECT_EQ(run.node().definition(kInputPort).nBufferSize, bytes);
+      const auto after = run.node().definition(kInputPort);
+      EXPECT_EQ(after.format.video.nFrameWidth,
+                each.bytes != 0 ? each.width : before.format.video.nFrameWidth);
+      EXPECT_EQ(after.nBufferSize, each.bytes != 0 ? each.bytes : before.nBufferSize);
     }
   }
 }
 
 TEST(Encoder, SkipsAPictureThatIsNotWhole) {
-  EncoderRun run("msm8960");
-  run.setSize(96, 80);
+  EncoderRun run("msm8960", 96, 80);
   run.start();
   const std::vector<Picture> pictures = scenes(96, 80, 2);
   run.encode(pictures[0]);
@@ -114,7 +115,7 @@ TEST(Encoder, SkipsAPictureThatIsNotWhole) {
   cut.pop_back();
   run.send(cut, 0);
   run.encode(pictures[1]);
-  EXPECT_EQ(run.errors(), Errors{"error 0x8000100b"});
+  EXPECT_EQ(run.errors, Errors{"error 0x8000100b"});
   expectLike(run.units(), pictures, 25);
 }
 
@@ -129,52 +130,48 @@ TEST(Encoder, PutsKeyFramesExactlyWhereTheyAreDue) {
       {"omap4", 0, {0}},
   };
   for (const auto& each : cases) {
-    EncoderRun run(each.device);
-    run.setSize(64, 48);
-    ASSERT_EQ(run.setAvc([&](auto& avc) { avc.nPFrames = each.pFrames; }), android::OK);
+    EncoderRun run(each.device, 64, 48);
+    run.setPFrames(each.pFrames);
     EXPECT_EQ(run.avc().nPFrames, each.pFrames);
     run.start();
     run.encodeScene(64, 48, 12);
     EXPECT_EQ(run.keyFrames(), each.keys) << each.device << " " << each.pFrames;
-    for (const size_t key : each.keys) EXPECT_EQ(nalTypes(run.outputs()[key].bytes), kKeyUnit);
+    for (const size_t key : each.keys) EXPECT_EQ(nalTypes(run.outputs[key].bytes), kKeyUnit);
   }
 }
 
 TEST(Encoder, MakesTheNextPictureAKeyFrameEachTimeOneIsRequested) {
   for (const char* device : {"msm7x30", "omap4"}) {
-    EncoderRun run(device);
-    run.setSize(64, 48);
-    ASSERT_EQ(run.setAvc([](auto& avc) { avc.nPFrames = 0xFFFF; }), android::OK);
+    EncoderRun run(device, 64, 48);
+    run.setPFrames(0xFFFF);
     run.start();
-    run.encodeScene(64, 48, 1);
-    std::vector<size_t> wanted = {0};
-    for (uint32_t i = 0; i < 100; ++i) {
-      run.encodeScene(64, 48, i % 3);
-      EXPECT_EQ(run.requestKey(), android::OK);
-      wanted.push_back(run.outputs().size());
+    std::vector<size_t> wanted;
+    for (uint32_t i = 0; i < 50; ++i) {
+      wanted.push_back(run.outputs.size());
       run.encodeScene(64, 48, 1);
-      EXPECT_EQ(nalTypes(run.outputs().back().bytes), kKeyUnit);
+      EXPECT_EQ(nalTypes(run.outputs.back().bytes), kKeyUnit);
+      run.encodeScene(64, 48, i % 3);
+      EXPECT_EQ(run.requestKey(), kOk);
     }
     EXPECT_EQ(run.keyFrames(), wanted) << device;
   }
 }
 
 TEST(Encoder, CountsKeyFramesFromTheLastOne) {
-  EncoderRun run("msm8960");
-  run.setSize(64, 48);
-  ASSERT_EQ(run.setAvc([](auto& avc) { avc.nPFrames = 5; }), android::OK);
+  EncoderRun run("msm8960", 64, 48);
+  run.setPFrames(5);
   run.start();
   run.encodeScene(64, 48, 3);
-  EXPECT_EQ(run.requestKey(), android::OK);
+  EXPECT_EQ(run.requestKey(), kOk);
   run.encodeScene(64, 48, 8);  // 3 is requested, 9 is due
   auto period = makeRecord<mediaserver::QcomIntraPeriod>(kOutputPort);
   period.nIDRPeriod = 1;
   period.nPFrames = 2;
-  EXPECT_EQ(run.setConfig(mediaserver::kQcomIntraPeriodIndex, period), android::OK);
+  EXPECT_EQ(run.setConfig(mediaserver::kQcomIntraPeriodIndex, period), kOk);
   run.encodeScene(64, 48, 6);  // 12, 15
   auto standard = makeRecord<OMX_VIDEO_CONFIG_AVCINTRAPERIOD>(kOutputPort);
   standard.nPFrames = 0xFFFFFFFF;
-  EXPECT_EQ(run.setConfig(OMX_IndexConfigVideoAVCIntraPeriod, standard), android::OK);
+  EXPECT_EQ(run.setConfig(OMX_IndexConfigVideoAVCIntraPeriod, standard), kOk);
   run.encodeScene(64, 48, 6);
   EXPECT_EQ(run.keyFrames(), (std::vector<size_t>{0, 3, 9, 12, 15}));
   period.nBFrames = 1;
@@ -184,14 +181,13 @@ TEST(Encoder, CountsKeyFramesFromTheLastOne) {
 
 TEST(Encoder, TurnsPicturesWhileRunningAsNewSettings) {
   for (const char* device : {"msm8960", "msm8x60", "omap4"}) {
-    EncoderRun run(device);
-    run.setSize(96, 64);
+    EncoderRun run(device, 96, 64);
     run.setBitRate(1000000);
-    ASSERT_EQ(run.rotate(270), android::OK);
+    ASSERT_EQ(run.rotate(270), kOk);
     run.start();
     std::vector<Picture> wanted;
     for (const int quarters : {3, 1, 2, 0}) {
-      EXPECT_EQ(run.rotate(quarters * 90), android::OK);
+      EXPECT_EQ(run.rotate(quarters * 90), kOk);
       for (uint32_t i = 0; i < 2; ++i) {
         wanted.push_back(turned(scene(96, 64, i), quarters));
         const auto& video = run.encode(scene(96, 64, i)).definition.format.video;
@@ -202,54 +198,52 @@ TEST(Encoder, TurnsPicturesWhileRunningAsNewSettings) {
     expectLike(run.units(), wanted, 33);
     EXPECT_EQ(run.keyFrames(), (std::vector<size_t>{0, 4})) << "a new size takes a new stream";
     for (const int32_t refused : {45, -90, 360, 1}) EXPECT_EQ(run.rotate(refused), kUnsupported) << refused;
-    EXPECT_EQ(run.errors(), Errors{});
+    EXPECT_EQ(run.errors, Errors{});
   }
 }
 
 // The same for a size that the client changes by way of the input port.
 TEST(Encoder, MakesRoomForLargerPicturesWhileRunning) {
-  EncoderRun run("msm8960");
-  run.setSize(64, 48);
+  EncoderRun run("msm8960", 64, 48);
   run.setBitRate(4000000);
   run.start();
   const std::vector<Picture> pictures = {scene(64, 48, 0), scene(640, 480, 1)};
   run.encode(pictures[0]);
   run.reopenInput([&] {
-    auto input = run.node().definition(kInputPort);
-    input.format.video.nFrameWidth = 640;
-    input.format.video.nFrameHeight = 480;
-    EXPECT_EQ(run.node().define(kInputPort, input), android::OK);
+    EXPECT_EQ(run.define(kInputPort,
+                         [](auto& video) {
+                           video.nFrameWidth = 640;
+                           video.nFrameHeight = 480;
+                         }),
+              kOk);
   });
   EXPECT_EQ(run.encode(pictures[1]).definition.format.video.nFrameWidth, 640U);
-  EXPECT_EQ(run.reconfigurations(), 1U);
+  EXPECT_EQ(run.reconfigurations, 1U);
   expectLike(run.units(), pictures, 30);
 }
 
 TEST(Encoder, EndsAStreamAndBeginsAnotherAlsoAfterAFlush) {
-  EncoderRun run("msm8960");
-  run.setSize(64, 48);
+  EncoderRun run("msm8960", 64, 48);
   run.start();
   run.encodeScene(64, 48, 2);
   // The mark on a picture's own buffer comes out on that picture's unit.
   run.send(packInput(scene(64, 48, 2), omxhost::PictureLayout::SemiPlanar), 7, OMX_BUFFERFLAG_EOS);
-  run.await([&] { return run.ended(); });
-  ASSERT_EQ(run.outputs().size(), 3U);
-  EXPECT_EQ(run.outputs()[2].flags, OMX_BUFFERFLAG_EOS | OMX_BUFFERFLAG_ENDOFFRAME);
+  run.awaitEnd();
+  ASSERT_EQ(run.outputs.size(), 3U);
+  EXPECT_EQ(run.outputs[2].flags, OMX_BUFFERFLAG_EOS | OMX_BUFFERFLAG_ENDOFFRAME);
   run.encodeScene(64, 48, 2);
   EXPECT_EQ(run.keyFrames(), (std::vector<size_t>{0, 3}));
   run.finish();
-  EXPECT_EQ(run.outputs().size(), 5U);
+  EXPECT_EQ(run.outputs.size(), 5U);
 
   // What the client never got cannot be referred to.
-  EncoderRun flushed("msm8960");
-  flushed.setSize(64, 48);
+  EncoderRun flushed("msm8960", 64, 48);
   flushed.node().toExecuting();  // and no output buffer given
   const std::vector<uint8_t> bytes = packInput(scene(64, 48, 0), omxhost::PictureLayout::SemiPlanar);
   const std::string_view text(reinterpret_cast<const char*>(bytes.data()), bytes.size());
   flushed.node().empty(0, text);
   flushed.node().expect(omxtest::emptyBufferDone());
-  EXPECT_EQ(flushed.node().command(OMX_CommandFlush, kOutputPort), android::OK);
-  flushed.node().expectComplete(OMX_CommandFlush, kOutputPort);
+  flushed.node().complete(OMX_CommandFlush, kOutputPort);
   flushed.node().empty(0, text);
   flushed.node().fillAll();
   flushed.node().expect(omxtest::fillBufferDone());

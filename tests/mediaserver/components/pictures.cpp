@@ -2,7 +2,6 @@
 
 #include <algorithm>
 #include <cmath>
-#include <utility>
 
 namespace componenttest {
 
@@ -46,14 +45,10 @@ Picture::Picture(uint32_t columns, uint32_t rows) : width(columns), height(rows)
   bytes.resize(size_t{width} * height + 2 * size_t{chromaWidth()} * chromaHeight());
 }
 
-const uint8_t* Picture::plane(int index) const {
+uint8_t* Picture::plane(int index) {
   const size_t luma = size_t{width} * height;
   const size_t chroma = size_t{chromaWidth()} * chromaHeight();
   return bytes.data() + (index == 0 ? 0 : index == 1 ? luma : luma + chroma);
-}
-
-uint8_t* Picture::plane(int index) {
-  return const_cast<uint8_t*>(std::as_const(*this).plane(index));
 }
 
 Picture scene(uint32_t width, uint32_t height, uint32_t number) {
@@ -90,23 +85,6 @@ double psnr(const Picture& a, const Picture& b) {
   return error == 0 ? 100 : 10 * std::log10(255.0 * 255.0 * static_cast<double>(count) / error);
 }
 
-std::vector<uint16_t> rgb565(const Picture& picture) {
-  std::vector<uint16_t> pixels;
-  for (uint32_t y = 0; y < picture.height; ++y) {
-    for (uint32_t x = 0; x < picture.width; ++x) {
-      const size_t chroma = size_t{y / 2} * picture.chromaWidth() + x / 2;
-      const int luma = 298 * (picture.plane(0)[size_t{y} * picture.width + x] - 16);
-      const int u = picture.plane(1)[chroma] - 128;
-      const int v = picture.plane(2)[chroma] - 128;
-      const int red = std::clamp((luma + 409 * v) / 256, 0, 255) >> 3;
-      const int green = std::clamp((luma - 208 * v - 100 * u) / 256, 0, 255) >> 2;
-      const int blue = std::clamp((luma + 517 * u) / 256, 0, 255) >> 3;
-      pixels.push_back(static_cast<uint16_t>(red << 11 | green << 5 | blue));
-    }
-  }
-  return pixels;
-}
-
 Picture turned(const Picture& picture, int quarters) {
   if (quarters == 0) return picture;
   Picture out(picture.height, picture.width);
@@ -125,44 +103,47 @@ Picture turned(const Picture& picture, int quarters) {
 std::vector<uint8_t> packInput(const Picture& picture, PictureLayout layout, uint32_t pitch) {
   if (pitch == 0) pitch = picture.width;
   const bool aligned = layout == PictureLayout::SemiPlanarAligned;
-  const size_t chroma = roundUp(size_t{pitch} * picture.height, aligned ? 2048 : 1);
-  std::vector<uint8_t> bytes(chroma + size_t{pitch} * picture.height / 2);
-  for (uint32_t y = 0; y < picture.height; ++y) {
-    std::copy_n(picture.plane(0) + size_t{y} * picture.width, picture.width, &bytes[size_t{y} * pitch]);
+  const size_t luma = size_t{pitch} * picture.height;
+  std::vector<uint8_t> bytes(roundUp(luma, aligned ? 2048 : 1) + luma / 2);
+  uint8_t* const chroma = bytes.data() + bytes.size() - luma / 2;
+  for (size_t y = 0; y < picture.height; ++y) {
+    std::copy_n(picture.plane(0) + y * picture.width, picture.width, &bytes[y * pitch]);
   }
-  for (uint32_t y = 0; y < picture.chromaHeight(); ++y) {
-    for (uint32_t x = 0; x < picture.chromaWidth(); ++x) {
-      const size_t from = size_t{y} * picture.chromaWidth() + x;
-      bytes[chroma + size_t{y} * pitch + 2 * x] = picture.plane(1)[from];
-      bytes[chroma + size_t{y} * pitch + 2 * x + 1] = picture.plane(2)[from];
+  for (const int plane : {1, 2}) {
+    const uint8_t* from = picture.plane(plane);
+    for (size_t y = 0; y < picture.chromaHeight(); ++y) {
+      for (size_t x = 0; x < picture.chromaWidth(); ++x) {
+        chroma[y * pitch + 2 * x + (plane == 2 ? 1 : 0)] = *from++;
+      }
     }
   }
   return bytes;
 }
 
 Picture unpackOutput(const std::vector<uint8_t>& bytes, PictureLayout layout, uint32_t frameWidth,
-                     uint32_t frameHeight, const Rectangle& visible) {
-  Picture picture(visible.width, visible.height);
+                     uint32_t frameHeight, const OMX_CONFIG_RECTTYPE& crop) {
+  Picture picture(crop.nWidth, crop.nHeight);
   const size_t tilesPerRow = roundUp(frameWidth, 128) / 64;
   const size_t lumaRows = roundUp(frameHeight, 32) / 32;
   const size_t chromaRows = roundUp(frameHeight, 64) / 64;
   const size_t tiledChroma = roundUp(tilesPerRow * lumaRows * 2048, 8192);
-  const bool tiles = layout == PictureLayout::Tiled;
-  const auto luma = [&](size_t x, size_t y) {
-    return bytes.at(tiles ? tiled(0, x, y, tilesPerRow, lumaRows)
-                          : (visible.top + y) * frameWidth + visible.left + x);
+  const auto left = static_cast<size_t>(crop.nLeft);
+  const auto top = static_cast<size_t>(crop.nTop);
+  // Chroma rows follow those of luma.
+  const auto at = [&](size_t x, size_t y, bool isLuma) {
+    if (layout != PictureLayout::Tiled) {
+      return bytes.at((isLuma ? top + y : frameHeight + top / 2 + y) * frameWidth + left + x);
+    }
+    return bytes.at(isLuma ? tiled(0, x, y, tilesPerRow, lumaRows)
+                           : tiled(tiledChroma, x, y, tilesPerRow, chromaRows));
   };
-  const auto chroma = [&](size_t x, size_t y) {
-    return bytes.at(tiles ? tiled(tiledChroma, x, y, tilesPerRow, chromaRows)
-                          : (frameHeight + visible.top / 2 + y) * frameWidth + visible.left + x);
-  };
-  for (uint32_t y = 0; y < visible.height; ++y) {
-    for (uint32_t x = 0; x < visible.width; ++x) picture.plane(0)[size_t{y} * visible.width + x] = luma(x, y);
+  uint8_t* to = picture.plane(0);
+  for (uint32_t y = 0; y < picture.height; ++y) {
+    for (uint32_t x = 0; x < picture.width; ++x) *to++ = at(x, y, true);
   }
-  for (uint32_t y = 0; y < picture.chromaHeight(); ++y) {
-    for (uint32_t x = 0; x < picture.chromaWidth(); ++x) {
-      picture.plane(1)[size_t{y} * picture.chromaWidth() + x] = chroma(2 * x, y);
-      picture.plane(2)[size_t{y} * picture.chromaWidth() + x] = chroma(2 * x + 1, y);
+  for (const uint32_t plane : {0U, 1U}) {
+    for (uint32_t y = 0; y < picture.chromaHeight(); ++y) {
+      for (uint32_t x = 0; x < picture.chromaWidth(); ++x) *to++ = at(2 * x + plane, y, false);
     }
   }
   return picture;

@@ -5,6 +5,7 @@
 #include <cstdint>
 #include <vector>
 
+#include <OMX_IVCommon.h>
 #include <omxhost/device.h>
 
 namespace componenttest {
@@ -20,7 +21,7 @@ struct Picture {
   uint32_t chromaWidth() const { return (width + 1) / 2; }
   uint32_t chromaHeight() const { return (height + 1) / 2; }
   uint8_t* plane(int index);
-  const uint8_t* plane(int index) const;
+  const uint8_t* plane(int index) const { return const_cast<Picture*>(this)->plane(index); }
   bool operator==(const Picture&) const = default;
 };
 
@@ -30,23 +31,14 @@ Picture scene(uint32_t width, uint32_t height, uint32_t number);
 // In decibels; 100 for equal pictures. Compares luma.
 double psnr(const Picture& a, const Picture& b);
 
-// As a converter makes it: full range from limited, each step rounded down.
-std::vector<uint16_t> rgb565(const Picture& picture);
-
 // Turned clockwise by quarter turns.
 Picture turned(const Picture& picture, int quarters);
 
 // As an encoder's client sends it. `pitch` counts for the TI layout alone.
 std::vector<uint8_t> packInput(const Picture& picture, omxhost::PictureLayout layout, uint32_t pitch = 0);
 
-// The visible picture in a decoder's output. Frame and visible size are the same but for the padded layout.
-struct Rectangle {
-  uint32_t left;
-  uint32_t top;
-  uint32_t width;
-  uint32_t height;
-};
+// The visible picture in a decoder's output.
 Picture unpackOutput(const std::vector<uint8_t>& bytes, omxhost::PictureLayout layout, uint32_t frameWidth,
-                     uint32_t frameHeight, const Rectangle& visible);
+                     uint32_t frameHeight, const OMX_CONFIG_RECTTYPE& crop);
 
 }  // namespace componenttest

@@ -1,7 +1,7 @@
 // WMV: the three ways in which a stream can tell what it is. No encoder is at hand, so headers are written
 // here and the pictures' payload is arbitrary bits, which decode to arbitrary pictures.
 
-#include "tests/mediaserver/components/runs.h"
+#include "tests/mediaserver/components/component_run.h"
 
 namespace componenttest {
 namespace {
@@ -54,11 +54,9 @@ TEST(Wmv, TellsByItsHeadersHowItIsDecodedAndSurvivesThemCut) {
   const auto expectDecoded = [](const std::vector<Unit>& stream, const std::vector<Decoded>& pictures) {
     DecoderRun run("omap4");
     run.setInput(OMX_VIDEO_CodingWMV);
-    run.start();
-    run.sendAll(stream);
-    run.finish();
+    run.run(stream);
     expectSame(run.pictures(), pictures);
-    EXPECT_EQ(run.errors(), Errors{});
+    EXPECT_EQ(run.errors, Errors{});
   };
   expectDecoded(file, wanted);
   const std::vector<Decoded> two = decode("vc1", advanced, kAdvancedHeaders, kWidth, kHeight);
