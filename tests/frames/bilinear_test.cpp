@@ -1,9 +1,11 @@
 #include <gtest/gtest.h>
 
 #include <memory>
+#include <vector>
 
 #include "omxbridge/frames/scale.h"
 #include "tests/frames/harness.h"
+#include "tests/frames/reference_scale.h"
 
 namespace frames_test {
 namespace {
@@ -68,48 +70,38 @@ TEST(ScaleBilinearArithmetic, EqualsReferenceForNotedRatios) {
   }
 }
 
-TEST(ScaleBilinearMemory, ReplacesADestinationThatIsTooSmall) {
+TEST(ScaleBilinearMemory, ReplacesADestinationThatIsTooSmallAndTakesTheSourceForOne) {
   Content content(43);
-  const Size from{48, 20}, to{31, 33};
+  const Size from{48, 20};
   const Bytes src = content.bytes(reference::i420Bytes(from));
-  const std::size_t needed = reference::i420Bytes(to);
-  for (const bool null : {true, false}) {
-    unsigned char* destination = null ? nullptr : new unsigned char[needed - 1];
-    unsigned size = null ? 1u << 20 : static_cast<unsigned>(needed) - 1;
-    EXPECT_EQ(ScaleBilinear(src.data(), destination, from.width, from.height, to.width, to.height, size), 33);
-    EXPECT_EQ(size, needed);
-    const std::unique_ptr<unsigned char[]> owner(destination);
-    // 31 x 33 and two planes of 15 x 16 leave bytes at the end.
-    for (std::size_t i = to.area() + 2 * 15 * 16; i < needed; ++i) EXPECT_EQ(destination[i], 0);
+  for (const Size to : {Size{31, 33}, Size{24, 10}, Size{48, 20}, Size{72, 33}}) {
+    const std::size_t needed = reference::i420Bytes(to);
+    std::vector<Bytes> results;
+    // None, one that is a byte too small, and the source itself.
+    for (const std::size_t has : {std::size_t{0}, needed - 1, src.size()}) {
+      const bool isSource = has == src.size();
+      unsigned char* destination = has == 0 ? nullptr : new unsigned char[has];
+      if (isSource) std::copy_n(src.data(), has, destination);
+      auto size = has == 0 ? 1u << 20 : static_cast<unsigned>(has);
+      EXPECT_EQ(ScaleBilinear(isSource ? destination : src.data(), destination, from.width, from.height,
+                              to.width, to.height, size),
+                static_cast<int>(to.height));
+      const std::unique_ptr<unsigned char[]> owner(destination);
+      EXPECT_EQ(size, isSource && has >= needed ? has : needed);
+      Bytes result(to.area() + std::size_t{to.width / 2} * (to.height / 2) * 2);
+      std::copy_n(destination, result.size(), result.data());
+      results.push_back(result);
+      EXPECT_EQ(result, results.front());
+      for (std::size_t i = result.size(); !isSource && i < needed; ++i) EXPECT_EQ(destination[i], 0);
+    }
   }
-}
-
-TEST(ScaleBilinearMemory, TakesTheSourceAsDestination) {
-  Content content(44);
-  const Size from{64, 32};
-  for (const Size to : {Size{32, 16}, Size{64, 32}, Size{96, 64}}) {
-    const Bytes src = content.bytes(reference::i420Bytes(from));
-    unsigned char* separate = nullptr;
-    unsigned separateSize = 0;
-    ScaleBilinear(src.data(), separate, from.width, from.height, to.width, to.height, separateSize);
-    const std::unique_ptr<unsigned char[]> expected(separate);
-
-    auto* memory = new unsigned char[src.size()];
-    std::copy_n(src.data(), src.size(), memory);
-    auto size = static_cast<unsigned>(src.size());
-    ScaleBilinear(memory, memory, from.width, from.height, to.width, to.height, size);
-    const std::unique_ptr<unsigned char[]> owner(memory);
-    EXPECT_TRUE(std::equal(separate, separate + separateSize, memory)) << text(to);
-  }
-}
-
-TEST(ScaleBilinearMemory, RefusesSizesWithoutTouchingAnything) {
-  std::uint8_t src[6] = {};
   unsigned char* destination = nullptr;
   unsigned size = 3;
   const unsigned refused[][4] = {{0, 2, 2, 2},     {2, 0, 2, 2},     {2, 2, 0, 2},        {2, 2, 2, 0},
                                  {65536, 2, 2, 2}, {2, 2, 65536, 1}, {2, 2, 65535, 65535}};
-  for (const auto& s : refused) EXPECT_EQ(ScaleBilinear(src, destination, s[0], s[1], s[2], s[3], size), -1);
+  for (const auto& s : refused) {
+    EXPECT_EQ(ScaleBilinear(src.data(), destination, s[0], s[1], s[2], s[3], size), -1);
+  }
   EXPECT_EQ(destination, nullptr);
   EXPECT_EQ(size, 3u);
 }

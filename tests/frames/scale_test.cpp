@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include "tests/frames/harness.h"
+#include "tests/frames/reference_scale.h"
 
 namespace frames_test {
 namespace {
@@ -79,7 +80,6 @@ struct Owned {
   }
   ~Owned() { delete[] memory; }
   Owned(const Owned&) = delete;
-  Owned& operator=(const Owned&) = delete;
   unsigned char* memory;
 };
 

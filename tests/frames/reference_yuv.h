@@ -1,52 +1,64 @@
+// Layouts of YUV and rotation, stated sample by sample.
+#pragma once
+
+#include <algorithm>
+
 #include "tests/frames/reference.h"
 
 namespace reference {
-namespace {
+
+struct Order {
+  unsigned luma, chroma;  // of each pair of bytes
+};
+inline constexpr Order kYuy2{0, 1}, kUyvy{1, 0};
+
+enum class Turn { kClockwise, kAntiClockwise, kHalf, kUpDown, kLeftRight };
+enum class Chroma { kUThenV, kVThenU, kUvPairs, kVuPairs };
 
 // rows x columns bytes between places that lie srcPitch and dstPitch bytes apart per row.
-void copy(const Bytes& src, std::size_t from, std::size_t srcPitch, Bytes& dst, std::size_t to,
-          std::size_t dstPitch, std::size_t columns, std::size_t rows) {
+inline void copy(const Bytes& src, std::size_t from, std::size_t srcPitch, Bytes& dst, std::size_t to,
+                 std::size_t dstPitch, std::size_t columns, std::size_t rows) {
   for (std::size_t r = 0; r < rows; ++r) {
     for (std::size_t c = 0; c < columns; ++c) dst[to + r * dstPitch + c] = src[from + r * srcPitch + c];
   }
 }
 
-void fill(Bytes& dst, std::size_t from, std::size_t n, std::uint8_t value) {
+inline void fill(Bytes& dst, std::size_t from, std::size_t n, std::uint8_t value) {
   for (std::size_t i = 0; i < n; ++i) dst[from + i] = value;
 }
 
-std::size_t vByArea(Size s) {
+inline std::size_t vByArea(Size s) {
   return s.area() + s.area() / 4;
 }
-std::size_t vByRows(Size s) {
+inline std::size_t vByRows(Size s) {
   return std::size_t{s.width} * (s.height + s.height / 4);
 }
-std::size_t vBySamples(Size s) {
+inline std::size_t vBySamples(Size s) {
   return s.area() + std::size_t{s.width / 2} * (s.height / 2);
 }
 
-}  // namespace
+inline void exchangeChroma(const Bytes& src, Bytes& dst, Size s) {
+  copy(src, 0, 0, dst, 0, 0, s.area(), 1);
+  copy(src, s.area(), 0, dst, vByArea(s), 0, s.area() / 4, 1);
+  copy(src, vByArea(s), 0, dst, s.area(), 0, s.area() / 4, 1);
+}
 
-void i420ToYv12(const Bytes& src, Bytes& dst, Size s, unsigned stride) {
+inline void i420ToYv12(const Bytes& src, Bytes& dst, Size s, unsigned stride) {
   copy(src, 0, s.width, dst, 0, stride, s.width, s.height);
-  if (s.height < 2) return;
   const std::size_t v = std::size_t{stride} * s.height, u = v + std::size_t{s.height} * (stride / 2) / 2;
   copy(src, s.area(), s.width / 2, dst, u, stride / 2, s.width / 2, s.height / 2);
   copy(src, vByArea(s), s.width / 2, dst, v, stride / 2, s.width / 2, s.height / 2);
 }
 
-void i420ToI420(const Bytes& src, Bytes& dst, Size s, unsigned stride) {
-  if (stride == s.width) {
-    copy(src, 0, 0, dst, 0, 0, std::size_t{s.height / 2} * s.width * 3, 1);
-    return;
-  }
+inline void i420ToI420(const Bytes& src, Bytes& dst, Size s, unsigned stride) {
+  if (stride == s.width) return copy(src, 0, 0, dst, 0, 0, std::size_t{s.height / 2} * s.width * 3, 1);
   copy(src, 0, s.width, dst, 0, stride, s.width, s.height);
   const std::size_t u = std::size_t{stride} * s.height, v = u + std::size_t{s.height / 2} * (stride / 2);
   copy(src, s.area(), s.width / 2, dst, u, stride / 2, s.width / 2, s.height / 2);
   copy(src, vByArea(s), s.width / 2, dst, v, stride / 2, s.width / 2, s.height / 2);
 }
 
-void i420Centred(const Bytes& src, Size from, Bytes& dst, Size to) {
+inline void i420Centred(const Bytes& src, Size from, Bytes& dst, Size to) {
   if (from.width == to.width && from.height == to.height) return i420ToI420(src, dst, from, from.width);
   const Axis x(from.width, to.width), y(from.height, to.height);
   fill(dst, 0, to.area(), 0);
@@ -62,7 +74,7 @@ void i420Centred(const Bytes& src, Size from, Bytes& dst, Size to) {
   }
 }
 
-void interleave(bool vFirst, const Bytes& src, Bytes& dst, Size s) {
+inline void interleave(bool vFirst, const Bytes& src, Bytes& dst, Size s) {
   copy(src, 0, 0, dst, 0, 0, s.area(), 1);
   for (std::size_t i = 0; i < s.area() / 4; ++i) {
     dst[s.area() + 2 * i + (vFirst ? 1 : 0)] = src[s.area() + i];
@@ -70,7 +82,7 @@ void interleave(bool vFirst, const Bytes& src, Bytes& dst, Size s) {
   }
 }
 
-void split(bool vFirst, const Bytes& src, Bytes& dst, Size s) {
+inline void split(bool vFirst, const Bytes& src, Bytes& dst, Size s) {
   copy(src, 0, 0, dst, 0, 0, s.area(), 1);
   for (std::size_t i = 0; i < s.area() / 4; ++i) {
     dst[s.area() + i] = src[s.area() + 2 * i + (vFirst ? 1 : 0)];
@@ -78,21 +90,21 @@ void split(bool vFirst, const Bytes& src, Bytes& dst, Size s) {
   }
 }
 
-void cropNv12(const Bytes& src, unsigned stride, unsigned height, std::array<unsigned, 4> ltrb, Bytes& dst) {
+inline void cropNv12(const Bytes& src, Size s, std::array<int, 4> ltrb, Bytes& dst) {
   const auto [left, top, right, bottom] = ltrb;
+  const int width = static_cast<int>(s.width), height = static_cast<int>(s.height);
   std::size_t to = 0;
-  for (std::size_t row = top; row <= bottom; ++row) {
-    for (std::size_t x = left; x <= right; ++x) dst[to++] = src[row * stride + x];
+  const auto take = [&](int row) {
+    for (int x = left; x <= right; ++x) dst[to++] = src[static_cast<std::size_t>(row * width + x)];
+  };
+  for (int row = top; row <= bottom; ++row) take(row);
+  for (int row = top / 2; row <= bottom / 2; ++row) {
+    if (height > 1) take(height + (row < height / 2 ? row : row - 1));
   }
-  for (std::size_t row = top / 2; row <= bottom / 2; ++row) {
-    for (std::size_t x = left; x <= right; ++x) {
-      const std::size_t present = row < height / 2 ? row : row - 1;
-      dst[to++] = height == 1 ? 128 : src[std::size_t{stride} * (height + present) + x];
-    }
-  }
+  while (height == 1 && to < dst.size()) dst[to++] = 128;
 }
 
-void pack(Order order, const Bytes& src, Bytes& dst, Size s, unsigned stride) {
+inline void pack(Order order, const Bytes& src, Bytes& dst, Size s, unsigned stride) {
   for (std::size_t row = 0; row < s.height / 2 * 2; ++row) {
     for (std::size_t x = 0; x < s.width / 2 * 2; ++x) {
       const std::size_t sample = row / 2 * (s.width / 2) + x / 2, to = (row * stride + x) * 2;
@@ -102,7 +114,7 @@ void pack(Order order, const Bytes& src, Bytes& dst, Size s, unsigned stride) {
   }
 }
 
-void unpack(Order order, bool average, const Bytes& src, Bytes& dst, Size s) {
+inline void unpack(Order order, bool average, const Bytes& src, Bytes& dst, Size s) {
   for (std::size_t row = 0; row < s.height / 2 * 2; ++row) {
     for (std::size_t x = 0; x < s.width / 2 * 2; ++x) {
       const std::size_t from = (row * s.width + x) * 2;
@@ -115,7 +127,7 @@ void unpack(Order order, bool average, const Bytes& src, Bytes& dst, Size s) {
   }
 }
 
-void unpackCentred(Order order, bool interlaced, const Bytes& src, Size from, Bytes& dst, Size to) {
+inline void unpackCentred(Order order, bool interlaced, const Bytes& src, Size from, Bytes& dst, Size to) {
   const Axis x(from.width, to.width), y(from.height, to.height);
   const std::size_t u = to.area(), v = interlaced ? vByRows(to) : vByArea(to);
   const std::size_t width = to.width / 2, height = to.height / 2;
@@ -156,7 +168,7 @@ void unpackCentred(Order order, bool interlaced, const Bytes& src, Size from, By
   }
 }
 
-void turn(Turn turn, Chroma chroma, const Bytes& src, Bytes& dst, Size s) {
+inline void turn(Turn turn, Chroma chroma, const Bytes& src, Bytes& dst, Size s) {
   // One plane of w x h samples: offset and distance in the source, place in the result.
   const auto plane = [&](std::size_t from, std::size_t step, std::size_t to, std::size_t w, std::size_t h) {
     const bool quarter = turn == Turn::kClockwise || turn == Turn::kAntiClockwise;

@@ -1,18 +1,20 @@
+// Scaling, padding and cutting, stated sample by sample.
+#pragma once
+
+#include <algorithm>
+
 #include "tests/frames/reference.h"
 
 namespace reference {
-namespace {
 
-std::uint8_t average(int a, int b) {
+inline std::uint8_t average(int a, int b) {
   return static_cast<std::uint8_t>((a + b) / 2);
 }
-std::uint8_t average(int a, int b, int c, int d) {
+inline std::uint8_t average(int a, int b, int c, int d) {
   return static_cast<std::uint8_t>((a + b + c + d) / 4);
 }
 
-}  // namespace
-
-void upHalf(Bytes& buffer, Size s) {
+inline void upHalf(Bytes& buffer, Size s) {
   const Bytes in = buffer;
   const std::size_t n = s.area() / 4 * 3;
   for (std::size_t i = 0; i < n; ++i) {
@@ -21,7 +23,7 @@ void upHalf(Bytes& buffer, Size s) {
   }
 }
 
-void downHalf(Bytes& buffer, Size s) {
+inline void downHalf(Bytes& buffer, Size s) {
   const Bytes in = buffer;
   std::size_t to = 0;
   for (std::size_t row = 0; row < s.height; ++row) {
@@ -36,7 +38,7 @@ void downHalf(Bytes& buffer, Size s) {
   }
 }
 
-void quarter(Bytes& buffer, Size s) {
+inline void quarter(Bytes& buffer, Size s) {
   const Bytes in = buffer;
   std::size_t to = 0;
   for (const bool chroma : {false, true}) {
@@ -50,7 +52,7 @@ void quarter(Bytes& buffer, Size s) {
   }
 }
 
-Bytes third(const Bytes& src, Size s, Size& out) {
+inline Bytes third(const Bytes& src, Size s, Size& out) {
   out = {s.width / 3 + s.width / 3 % 2, s.height / 3};
   Bytes result(i420Bytes(out));
   std::size_t to = 0;
@@ -68,7 +70,7 @@ Bytes third(const Bytes& src, Size s, Size& out) {
   return result;
 }
 
-Bytes enlarge(unsigned group, const Bytes& src, Size s) {
+inline Bytes enlarge(unsigned group, const Bytes& src, Size s) {
   const Size out{s.width / group * (group + 1), s.height / group * (group + 1)};
   Bytes result(i420Bytes(out));
   std::size_t to = 0;
@@ -90,7 +92,8 @@ Bytes enlarge(unsigned group, const Bytes& src, Size s) {
   return result;
 }
 
-std::vector<int> bilinear(const Bytes& src, Size from, Size to) {
+// -1 where a value depends on bytes that nobody has written.
+inline std::vector<int> bilinear(const Bytes& src, Size from, Size to) {
   // The memory that the scaler walks over: the frame itself, or for most widths a padded copy. -1: not
   // written.
   const bool inPlace = from.width % 32 == 0;
@@ -154,8 +157,8 @@ std::vector<int> bilinear(const Bytes& src, Size from, Size to) {
   return out;
 }
 
-void padPlane(const Bytes& src, std::size_t from, Size s, unsigned padW, unsigned left, unsigned padH,
-              unsigned top, std::uint8_t fill, Bytes& dst, std::size_t& to) {
+inline void padPlane(const Bytes& src, std::size_t from, Size s, unsigned padW, unsigned left, unsigned padH,
+                     unsigned top, std::uint8_t fill, Bytes& dst, std::size_t& to) {
   for (std::size_t row = 0; row < s.height + padH; ++row) {
     for (std::size_t x = 0; x < s.width + padW; ++x) {
       const bool inside = row >= top && row - top < s.height && x >= left && x - left < s.width;
@@ -164,7 +167,7 @@ void padPlane(const Bytes& src, std::size_t from, Size s, unsigned padW, unsigne
   }
 }
 
-void pad(const Bytes& src, Size from, Bytes& dst, Size to) {
+inline void pad(const Bytes& src, Size from, Bytes& dst, Size to) {
   const auto margin = [](unsigned excess) { return excess % 16 == 0 ? excess / 2 / 16 * 16 : excess / 2; };
   const unsigned padW = to.width - from.width, padH = to.height - from.height;
   const unsigned left = margin(padW), top = margin(padH);
@@ -176,7 +179,7 @@ void pad(const Bytes& src, Size from, Bytes& dst, Size to) {
   }
 }
 
-void cut(Bytes& frame, Size from, Size to) {
+inline void cut(Bytes& frame, Size from, Size to) {
   const Bytes in = frame;
   const std::size_t x = from.width - to.width, y = (from.height - to.height) / 2;
   const std::size_t half = from.width / 2, samples = half * (from.height / 2);

@@ -1,16 +1,36 @@
+// Conversions to and from RGB, stated sample by sample.
+#pragma once
+
+#include <algorithm>
+
 #include "tests/frames/reference.h"
 
 namespace reference {
-namespace {
 
-unsigned clamped(int v) {
+struct Sums {
+  int r, g, b;  // before clamping
+};
+
+using Pixel = void (*)(const Sums& sums, std::uint8_t* to);
+
+enum class Rows { kTopDown, kBottomUp, kHalfStride };
+struct RgbLayout {
+  Pixel pixel;
+  unsigned bytes;
+  Rows rows;
+  bool strideMovesRows = true, exchangedChroma = false, semiPlanar = false;
+};
+
+enum class Rgb { k24, kMac, k565 };
+
+inline unsigned clamped(int v) {
   return v < 0 ? 0u : v > 255 ? 255u : static_cast<unsigned>(v);
 }
-std::uint8_t low(int v) {
+inline std::uint8_t low(int v) {
   return static_cast<std::uint8_t>(v);
 }
 
-void word(unsigned value, std::uint8_t* to) {
+inline void word(unsigned value, std::uint8_t* to) {
   to[0] = static_cast<std::uint8_t>(value);
   to[1] = static_cast<std::uint8_t>(value >> 8);
 }
@@ -19,7 +39,7 @@ struct Components {
   int r, g, b;
 };
 
-Components load(Rgb layout, const Bytes& src, std::size_t at) {
+inline Components load(Rgb layout, const Bytes& src, std::size_t at) {
   switch (layout) {
     case Rgb::k24:
       return {src[at + 2], src[at + 1], src[at]};
@@ -33,57 +53,51 @@ Components load(Rgb layout, const Bytes& src, std::size_t at) {
   return {};
 }
 
-std::uint8_t yOf(Components c) {
+inline unsigned bytesOf(Rgb layout) {
+  return layout == Rgb::k24 ? 3 : layout == Rgb::kMac ? 4 : 2;
+}
+
+inline std::uint8_t yOf(Components c) {
   return low(((66 * c.r + 129 * c.g + 25 * c.b + 128) >> 8) + 16);
 }
-std::uint8_t uOf(Components c) {
+inline std::uint8_t uOf(Components c) {
   return low(((-38 * c.r - 74 * c.g + 112 * c.b + 128) >> 8) + 128);
 }
-std::uint8_t vOf(Components c) {
+inline std::uint8_t vOf(Components c) {
   return low(((112 * c.r - 94 * c.g - 18 * c.b + 128) >> 8) + 128);
 }
 
-}  // namespace
-
-Sums sumsOf(int y, int u, int v) {
+inline Sums sumsOf(int y, int u, int v) {
   const int luma = 298 * (y - 16);
   return {(luma + 409 * (v - 128) + 128) >> 8, (luma - 100 * (u - 128) + 128 - 208 * (v - 128)) >> 8,
           (luma + 516 * (u - 128) + 128) >> 8};
 }
 
-void pixelBgr(const Sums& s, std::uint8_t* to) {
-  to[0] = low(static_cast<int>(clamped(s.b)));
-  to[1] = low(static_cast<int>(clamped(s.g)));
-  to[2] = low(static_cast<int>(clamped(s.r)));
+inline void pixelBgra(const Sums& s, std::uint8_t* to) {
+  const unsigned bgra[] = {clamped(s.b), clamped(s.g), clamped(s.r), 255};
+  std::copy_n(bgra, 4, to);
+}
+inline void pixelBgr(const Sums& s, std::uint8_t* to) {
+  pixelBgra(s, to);
+}
+inline void pixelArgb(const Sums& s, std::uint8_t* to) {
+  pixelBgra(s, to);
+  std::reverse(to, to + 4);
+}
+inline void pixelRgba(const Sums& s, std::uint8_t* to) {
+  pixelBgra(s, to);
+  std::swap(to[0], to[2]);
 }
 
-void pixelBgra(const Sums& s, std::uint8_t* to) {
-  pixelBgr(s, to);
-  to[3] = 255;
-}
-
-void pixelArgb(const Sums& s, std::uint8_t* to) {
-  std::uint8_t bgr[3];
-  pixelBgr(s, bgr);
-  to[0] = 255;
-  for (int k = 0; k < 3; ++k) to[1 + k] = bgr[2 - k];
-}
-
-void pixelRgba(const Sums& s, std::uint8_t* to) {
-  std::uint8_t argb[4];
-  pixelArgb(s, argb);
-  for (int k = 0; k < 4; ++k) to[k] = argb[(k + 1) % 4];
-}
-
-void pixel565(const Sums& s, std::uint8_t* to) {
+inline void pixel565(const Sums& s, std::uint8_t* to) {
   word((clamped(s.r) & 0xF8) << 8 | (clamped(s.g) & 0xFC) << 3 | clamped(s.b) >> 3, to);
 }
 
-void pixel4444(const Sums& s, std::uint8_t* to) {
+inline void pixel4444(const Sums& s, std::uint8_t* to) {
   word(0xF000 | (clamped(s.r) >> 4) << 8 | (clamped(s.g) >> 4) << 4 | clamped(s.b) >> 4, to);
 }
 
-void pixel1555(const Sums& s, std::uint8_t* to) {
+inline void pixel1555(const Sums& s, std::uint8_t* to) {
   const unsigned red = s.r < 0     ? 0x8000
                        : s.r > 255 ? 0x6000
                                    : (((static_cast<unsigned>(s.r) & 0xF8) << 10) - 0x8000) & 0xFFFF;
@@ -92,7 +106,7 @@ void pixel1555(const Sums& s, std::uint8_t* to) {
   word(red + green + blue, to);
 }
 
-void toRgb(const RgbLayout& layout, const Bytes& src, Bytes& dst, Size s, unsigned stride) {
+inline void toRgb(const RgbLayout& layout, const Bytes& src, Bytes& dst, Size s, unsigned stride) {
   const std::size_t pitch = layout.strideMovesRows ? stride : s.width;
   for (std::size_t row = 0; row < s.height / 2 * 2; ++row) {
     const std::size_t pair = row / 2;
@@ -115,7 +129,7 @@ void toRgb(const RgbLayout& layout, const Bytes& src, Bytes& dst, Size s, unsign
   }
 }
 
-void rgb24ToArgb(const Bytes& src, Bytes& dst, Size s, unsigned stride) {
+inline void rgb24ToArgb(const Bytes& src, Bytes& dst, Size s, unsigned stride) {
   for (std::size_t i = 0; i < s.height; ++i) {
     for (std::size_t x = 0; x < s.width; ++x) {
       const std::size_t to = ((s.height - 1) * std::size_t{stride} - i * (stride - s.width) + x) * 4;
@@ -125,11 +139,7 @@ void rgb24ToArgb(const Bytes& src, Bytes& dst, Size s, unsigned stride) {
   }
 }
 
-unsigned bytesOf(Rgb layout) {
-  return layout == Rgb::k24 ? 3 : layout == Rgb::kMac ? 4 : 2;
-}
-
-void fromRgb(Rgb layout, const Bytes& src, Bytes& dst, Size s) {
+inline void fromRgb(Rgb layout, const Bytes& src, Bytes& dst, Size s) {
   for (std::size_t row = 0; row < s.height / 2 * 2; ++row) {
     for (std::size_t x = 0; x < s.width / 2 * 2; ++x) {
       const Components c = load(layout, src, (row * s.width + x) * bytesOf(layout));
@@ -143,7 +153,7 @@ void fromRgb(Rgb layout, const Bytes& src, Bytes& dst, Size s) {
   }
 }
 
-void fromRgbCentred(const Bytes& src, Size from, Bytes& dst, Size to) {
+inline void fromRgbCentred(const Bytes& src, Size from, Bytes& dst, Size to) {
   const Axis x(from.width, to.width), y(from.height, to.height);
   const std::size_t columns = x.count / 2 * 2, rows = y.count / 2 * 2;
   const std::size_t samples = std::size_t{to.width / 2} * (to.height / 2);
