@@ -15,10 +15,6 @@ constexpr auto kTiled = static_cast<OMX_COLOR_FORMATTYPE>(0x7FA30C03);
 constexpr uint16_t kUntouched = 0x5A3C;
 constexpr size_t kChroma = 8192;  // where it begins in tiles for up to 128x64 pixels
 
-struct Crop {
-  size_t left, top, right, bottom;
-};
-
 TEST(ColorConverter, KeepsExtremeSamplesWithinTheRangeAndToTheirPlace) {
   std::vector<uint8_t> tiles(2 * kChroma);
   const int extremes[] = {0, 15, 16, 17, 81, 90, 128, 129, 235, 240, 255};
@@ -52,29 +48,25 @@ TEST(ColorConverter, RefusesOtherFormatsAndCropsThatDoNotFit) {
   EXPECT_FALSE(ColorConverter(kTiled, OMX_COLOR_Format16bitBGR565).isValid());
   EXPECT_FALSE(ColorConverter(OMX_COLOR_FormatYUV420SemiPlanar, OMX_COLOR_Format16bitRGB565).isValid());
   constexpr size_t kMost = SIZE_MAX;
-  const struct {
-    const char* what;
-    size_t width, height;  // of the source
-    Crop src;
-    Crop dst;
-  } cases[] = {
-      {"odd left edge", 64, 32, {1, 0, 8, 7}, {0, 0, 7, 7}},
-      {"widths differ", 64, 32, {0, 0, 7, 7}, {0, 0, 8, 7}},
-      {"beyond the source", 64, 32, {58, 0, 65, 7}, {0, 0, 7, 7}},
-      {"beyond the destination", 64, 32, {0, 0, 7, 7}, {57, 0, 64, 7}},
-      {"right before left", 64, 32, {8, 0, 6, 7}, {8, 0, 6, 7}},
-      {"no source", 0, 0, {0, 0, kMost, kMost}, {0, 0, kMost, kMost}},
-      {"sizes without end", kMost, kMost, {0, 0, 7, 7}, {0, 0, 7, 7}},
-      {"far away", kMost, kMost, {kMost - 9, kMost - 9, kMost - 2, kMost - 2}, {0, 0, 7, 7}},
+  // Width and height of the source; left, top, right and bottom of its crop, and of the destination's.
+  const size_t cases[][10] = {
+      {64, 32, 1, 0, 8, 7, 0, 0, 7, 7},    // an odd left edge
+      {64, 32, 0, 0, 7, 7, 0, 0, 8, 7},    // widths that differ
+      {64, 32, 58, 0, 65, 7, 0, 0, 7, 7},  // beyond the source
+      {64, 32, 0, 0, 7, 7, 57, 0, 64, 7},  // beyond the destination
+      {64, 32, 8, 0, 6, 7, 8, 0, 6, 7},    // right before left
+      {0, 0, 0, 0, kMost, kMost, 0, 0, kMost, kMost},
+      {kMost, kMost, 0, 0, 7, 7, 0, 0, 7, 7},
+      {kMost, kMost, kMost - 9, kMost - 9, kMost - 2, kMost - 2, 0, 0, 7, 7},
   };
   const std::vector<uint8_t> tiles(2 * kChroma);
   std::vector<uint16_t> pixels(64 * 32, kUntouched);
-  for (const auto& [what, width, height, src, dst] : cases) {
+  for (const auto& c : cases) {
     EXPECT_EQ(ColorConverter(kTiled, OMX_COLOR_Format16bitRGB565)
-                  .convert(tiles.data(), width, height, src.left, src.top, src.right, src.bottom,
-                           pixels.data(), 64, 32, dst.left, dst.top, dst.right, dst.bottom),
+                  .convert(tiles.data(), c[0], c[1], c[2], c[3], c[4], c[5], pixels.data(), 64, 32, c[6],
+                           c[7], c[8], c[9]),
               android::ERROR_UNSUPPORTED)
-        << what;
+        << &c - cases;
   }
   EXPECT_EQ(std::count(pixels.begin(), pixels.end(), kUntouched), 64 * 32);
 }

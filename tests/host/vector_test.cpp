@@ -60,49 +60,33 @@ TEST(Vector, FollowsAPlainModelThroughRandomOperations) {
       const size_t at = below(model.size() + 1);
       const auto where = model.begin() + static_cast<ptrdiff_t>(at);
       const size_t count = below(5);
-      switch (below(8)) {
-        case 0:
-        case 1:
-          EXPECT_EQ(vector.add(Tracked(step)), static_cast<ssize_t>(model.size()));
-          model.push_back(step);
-          break;
-        case 2:
-          EXPECT_EQ(vector.insertAt(Tracked(step), at, count), static_cast<ssize_t>(at));
-          model.insert(where, count, step);
-          if (model.empty()) break;
-          // An element of its own, which may move away while it is being copied.
-          vector.insertAt(vector[at / 2], at, count);
-          model.insert(model.begin() + static_cast<ptrdiff_t>(at), count, int{model[at / 2]});
-          break;
-        case 3:
-          if (at + count > model.size()) {
-            EXPECT_EQ(vector.removeItemsAt(at, count), android::BAD_VALUE);
-          } else {
-            EXPECT_EQ(vector.removeItemsAt(at, count), static_cast<ssize_t>(at));
-            model.erase(where, where + static_cast<ptrdiff_t>(count));
-          }
-          break;
-        case 4:
-          if (at == model.size()) break;
-          vector.editItemAt(at) = Tracked(-step);
-          model[at] = -step;
-          break;
-        case 5:
-          vector = Vector<Tracked>(vector);
-          break;
-        case 6:
-          if (model.size() < 100) {
-            vector.appendVector(vector);
-            const std::vector<int> copy(model);
-            model.insert(model.end(), copy.begin(), copy.end());
-          }
-          break;
-        default:
-          if (below(50) == 0) {
-            vector.clear();
-            model.clear();
-          }
-          break;
+      const size_t operation = below(7);
+      if (operation <= 1) {
+        EXPECT_EQ(vector.add(Tracked(step)), static_cast<ssize_t>(model.size()));
+        model.push_back(step);
+      } else if (operation == 2 && model.empty()) {
+        EXPECT_EQ(vector.insertAt(Tracked(step), at, count), 0);
+        model.assign(count, step);
+      } else if (operation == 2) {
+        // An element of its own, which may move away while it is being copied.
+        EXPECT_EQ(vector.insertAt(vector[at / 2], at, count), static_cast<ssize_t>(at));
+        model.insert(where, count, int{model[at / 2]});
+      } else if (operation == 3) {
+        const bool fits = at + count <= model.size();
+        EXPECT_EQ(vector.removeItemsAt(at, count), fits ? static_cast<ssize_t>(at) : android::BAD_VALUE);
+        if (fits) model.erase(where, where + static_cast<ptrdiff_t>(count));
+      } else if (operation == 4 && at < model.size()) {
+        vector.editItemAt(at) = Tracked(-step);
+        model[at] = -step;
+      } else if (operation == 5) {
+        vector = Vector<Tracked>(vector);
+      } else if (operation == 6 && model.size() < 100) {
+        vector.appendVector(vector);
+        const std::vector<int> copy(model);
+        model.insert(model.end(), copy.begin(), copy.end());
+      } else if (below(20) == 0) {
+        vector.clear();
+        model.clear();
       }
       EXPECT_EQ(vector.insertAt(Tracked(9), model.size() + 1), android::BAD_INDEX);
       EXPECT_EQ(vector.insertAt(Tracked(9), 0, SIZE_MAX / sizeof(Tracked) - below(9)), android::NO_MEMORY);
