@@ -14,7 +14,6 @@
 #include "platform/board_platform_wrapper.h"
 #include "platform/qcom_board_platform_wrapper.h"
 #include "platform/ti_board_platform_wrapper.h"
-#include "tests/capi/c_program.h"
 
 namespace {
 
@@ -124,21 +123,15 @@ TEST(VirtualSlots, AreWhereBinariesCallThem) {
   for (const auto& [found, expected] : slots) EXPECT_EQ(found, expected) << &found - &slots[0].first;
 }
 
-TEST(Records, AreLaidOutAlikeInCAndCPlusPlus) {
-  using webrtc::VideoCodec;
-  using webrtc::VideoCodecH264;
-  const size_t layout[] = RECORD_LAYOUT;
-  ASSERT_EQ(std::size(layout), cRecordLayoutCount);
-  for (size_t i = 0; i < cRecordLayoutCount; ++i) EXPECT_EQ(layout[i], cRecordLayout[i]) << "number " << i;
-  // Places that the records' readers go by.
-  static_assert(offsetof(VideoCodecH264, profile) == 8 && offsetof(VideoCodecH264, keyFrameInterval) == 12);
-  static_assert(offsetof(VideoCodecH264, referenceFrames) == 32);
-  static_assert(offsetof(VideoCodecH264, entropyCoding) == 36);
-  static_assert(offsetof(VideoCodecH264, transform8x8) == 37);
-  static_assert(offsetof(VideoCodec, payloadName) == 4 && offsetof(VideoCodec, payloadType) == 36);
-  static_assert(offsetof(VideoCodec, width) == 38 && offsetof(VideoCodec, height) == 40);
-  static_assert(offsetof(VideoCodec, startBitrate) == 44 && offsetof(VideoCodec, maxFramerate) == 56);
-  static_assert(offsetof(VideoCodec, codecSpecific) == 60 && sizeof(DECODEDDATAINFO) == 7 * 4);
-}
+// Records: places that C and C++ and their readers go by.
+using webrtc::VideoCodec;
+using webrtc::VideoCodecH264;
+static_assert(offsetof(VideoCodecH264, profile) == 8 && offsetof(VideoCodecH264, keyFrameInterval) == 12);
+static_assert(offsetof(VideoCodecH264, referenceFrames) == 32);
+static_assert(offsetof(VideoCodecH264, entropyCoding) == 36 && offsetof(VideoCodecH264, transform8x8) == 37);
+static_assert(offsetof(VideoCodec, payloadName) == 4 && offsetof(VideoCodec, payloadType) == 36);
+static_assert(offsetof(VideoCodec, width) == 38 && offsetof(VideoCodec, height) == 40);
+static_assert(offsetof(VideoCodec, startBitrate) == 44 && offsetof(VideoCodec, maxFramerate) == 56);
+static_assert(offsetof(VideoCodec, codecSpecific) == 60 && sizeof(DECODEDDATAINFO) == 7 * 4);
 
 }  // namespace

@@ -9,9 +9,6 @@ enum { kFrames = 20, kWidth = 176, kHeight = 144, kFrameBytes = kWidth * kHeight
 
 typedef struct VideoCodec VideoCodec;
 typedef struct VideoCodecH264 VideoCodecH264;
-const size_t cRecordLayout[] = RECORD_LAYOUT;
-const size_t cRecordLayoutCount = sizeof(cRecordLayout) / sizeof(cRecordLayout[0]);
-
 // What the callbacks saw; counted atomically.
 struct Seen {
   int inputs;

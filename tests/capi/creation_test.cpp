@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <cstring>
+#include <functional>
 
 #include "core/omx_interface.h"
 #include "omxbridge/omxbridge.h"
@@ -31,10 +32,6 @@ struct Generation {
   unsigned int frameBytes;  // of an encoder's input
   bool native;              // delivers pictures as the component made them
 };
-
-void PrintTo(const Generation& generation, std::ostream* stream) {
-  *stream << generation.device;
-}
 
 class GenerationTest : public ::testing::TestWithParam<Generation> {};
 
@@ -71,68 +68,39 @@ INSTANTIATE_TEST_SUITE_P(Devices, GenerationTest,
                                            Generation{"msm-unknown", 1920, 1088, 38016, true},
                                            Generation{"omap4", 1920, 1088, 38016, false}));
 
-// What is missing or refused.
-enum class Missing {
-  Nothing,
-  Server,
-  Omx,
-  Component,
-  Node,
-  Definition,
-  Size,
-  Rates,
-  Avc,
-  MetaData,
-  Settings
-};
-
-void arrange(ScriptedMediaServer& server, Missing what) {
-  RecordingOmx& omx = server.omx();
-  if (what == Missing::Server) server.unregister();
-  if (what == Missing::Omx) server.serveWithoutOmx();
-  if (what == Missing::Component) omx.fail(Method::ListNodes);
-  if (what == Missing::Node) omx.fail(Method::AllocateNode);
-  if (what == Missing::Rates) omx.fail(Method::GetParameter, 5);
-  if (what == Missing::Avc) omx.fail(Method::GetParameter, 3);
-  if (what == Missing::MetaData) omx.fail(Method::StoreMetaDataInBuffers);
-  if (what == Missing::Definition) omx.fail(Method::GetParameter);
-  if (what == Missing::Size) omx.fail(Method::SetParameter, 2);  // the first one is the picture order
-}
-
+// What is missing or refused, and what is said of it in front of the last line.
 struct Failure {
-  const char* device;
   bool encoder;
-  Missing missing;
+  std::function<void(RecordingOmx& omx, ScriptedMediaServer& server)> arrange;
   int code;
-  std::string line;  // in front of the last ones; empty: none
+  LogLines lines;
+  bool noSettings = false;
 };
 
-class FailureTest : public ::testing::TestWithParam<Failure> {};
-
-TEST_P(FailureTest, IsReportedAndLeavesNothing) {
-  const Failure& failure = GetParam();
-  omxhost::LogCapture log;
-  ScriptedMediaServer server(failure.device);
-  arrange(server, failure.missing);
-  int result = -77;
-  webrtc::VideoCodec codec = settings();
-  webrtc::VideoCodec* const given = failure.missing != Missing::Settings ? &codec : nullptr;
-  EXPECT_EQ(failure.encoder ? encoder_create(&result, given) : decoder_create(&result, nullptr), nullptr);
-  EXPECT_EQ(result, failure.code);
-  LogLines lines;
-  if (failure.encoder) {
-    lines.push_back(std::string("4/zol-video enter hardCodec encoder_create: build time:") +
-                    g_strPrgCreatTime + " ");
+void expectReportedAndNothingLeft(const char* device, const std::vector<Failure>& failures) {
+  for (const Failure& failure : failures) {
+    SCOPED_TRACE(failure.code);
+    const omxhost::LogCapture log;
+    ScriptedMediaServer server(device);
+    failure.arrange(server.omx(), server);
+    int result = -77;
+    webrtc::VideoCodec codec = settings();
+    void* const session = failure.encoder ? encoder_create(&result, failure.noSettings ? nullptr : &codec)
+                                          : decoder_create(&result, nullptr);
+    EXPECT_EQ(session, nullptr);
+    EXPECT_EQ(result, failure.code);
+    LogLines lines;
+    if (failure.encoder) {
+      lines.push_back(std::string("4/zol-video enter hardCodec encoder_create: build time:") +
+                      g_strPrgCreatTime + " ");
+    }
+    for (const std::string& line : failure.lines) lines.push_back("E " + line);
+    lines.push_back(std::string("E OMXINTERFACE - ERROR creating ") +
+                    (failure.encoder ? "encoder: " : "decoder: ") + std::to_string(failure.code) + " (" +
+                    resultDescription(failure.code) + ")");
+    EXPECT_EQ(logLines(log), lines);
+    EXPECT_EQ(server.leaks(), "");
   }
-  if (!failure.line.empty()) lines.push_back("E " + failure.line);
-  if (failure.missing >= Missing::Rates && failure.missing <= Missing::MetaData) {
-    lines.emplace_back("E OMXINTERFACE - [ENC] Init: failed to setup params!");
-  }
-  lines.push_back(std::string("E OMXINTERFACE - ERROR creating ") +
-                  (failure.encoder ? "encoder: " : "decoder: ") + std::to_string(failure.code) + " (" +
-                  resultDescription(failure.code) + ")");
-  EXPECT_EQ(logLines(log), lines);
-  EXPECT_EQ(server.leaks(), "");
 }
 
 const std::string kNoServer = "OMXINTERFACE: CANNOT ACQUIRE MEDIA PLAYER SERVICE";
@@ -142,28 +110,39 @@ const std::string kNoNode = "OMXINTERFACE - Could not allocate node: OMX.qcom.vi
 const std::string kNotSet = "OMXINTERFACE - SETUP PORT PARAMETERS: Set Port Definition Failed: -2147483648\n";
 const std::string kNoRates = "OMXINTERFACE - RATE CONTROL: ERROR getting bitrate parameters: -2147483648";
 const std::string kNoAvc = "OMXINTERFACE - RATE CONTROL: ERROR getting avc parameters: -2147483648";
+const std::string kNoMetaData = "Storing meta data in video buffers is not supported";
+const std::string kNoSetup = "OMXINTERFACE - [ENC] Init: failed to setup params!";
 
-INSTANTIATE_TEST_SUITE_P(Decoder, FailureTest,
-                         ::testing::Values(Failure{"msm8960", false, Missing::Server, 3, kNoServer},
-                                           Failure{"msm8960", false, Missing::Omx, 3, kNoOmx},
-                                           Failure{"msm8960", false, Missing::Component, 6, kNotFound},
-                                           Failure{"msm8960", false, Missing::Node, 4,
-                                                   kNoNode + "decoder.avc -- error -2147483648"},
-                                           Failure{"msm8960", false, Missing::Definition, 13, ""},
-                                           Failure{"msm8960", false, Missing::Size, 14, kNotSet},
-                                           Failure{"exynos4", false, Missing::Nothing, 36, ""}));
+TEST(Creation, ReportsWhatFailsAndLeavesNothing) {
+  const auto noServer = [](auto&, auto& server) { server.unregister(); };
+  const auto noNode = [](auto& omx, auto&) { omx.fail(Method::AllocateNode); };
+  expectReportedAndNothingLeft(
+      "msm8960",
+      {{false, noServer, 3, {kNoServer}},
+       {false, [](auto&, auto& server) { server.serveWithoutOmx(); }, 3, {kNoOmx}},
+       {false, [](auto& omx, auto&) { omx.fail(Method::ListNodes); }, 6, {kNotFound}},
+       {false, noNode, 4, {kNoNode + "decoder.avc -- error -2147483648"}},
+       {false, [](auto& omx, auto&) { omx.fail(Method::GetParameter); }, 13, {}},
+       // The first one is the picture order.
+       {false, [](auto& omx, auto&) { omx.fail(Method::SetParameter, 2); }, 14, {kNotSet}},
+       {true, noServer, 3, {kNoServer}},
+       {true, noNode, 4, {kNoNode + "encoder.avc -- error -2147483648"}},
+       {true, [](auto& omx, auto&) { omx.fail(Method::GetParameter, 5); }, 17, {kNoRates, kNoSetup}},
+       {true, [](auto& omx, auto&) { omx.fail(Method::GetParameter, 3); }, 34, {kNoAvc, kNoSetup}},
+       {true, [](auto&, auto&) {}, 28, {}, true}});
+}
 
-INSTANTIATE_TEST_SUITE_P(Encoder, FailureTest,
-                         ::testing::Values(Failure{"msm8960", true, Missing::Server, 3, kNoServer},
-                                           Failure{"msm8960", true, Missing::Node, 4,
-                                                   kNoNode + "encoder.avc -- error -2147483648"},
-                                           Failure{"msm8960", true, Missing::Rates, 17, kNoRates},
-                                           Failure{"msm8960", true, Missing::Avc, 34, kNoAvc},
-                                           Failure{"omap4", true, Missing::MetaData, -1,
-                                                   "Storing meta data in video buffers is not supported"},
-                                           Failure{"msm8960", true, Missing::Settings, 28, ""}));
+// Each of these devices in a process of its own.
+TEST(Creation, FailsWithoutComponents) {
+  expectReportedAndNothingLeft("exynos4", {{false, [](auto&, auto&) {}, 36, {}}});
+}
 
-TEST(Create, WorksWithoutAPlaceForTheResult) {
+TEST(Creation, FailsWhereMetaDataIsRefused) {
+  const auto refuse = [](auto& omx, auto&) { omx.fail(Method::StoreMetaDataInBuffers); };
+  expectReportedAndNothingLeft("omap4", {{true, refuse, -1, {kNoMetaData, kNoSetup}}});
+}
+
+TEST(Creation, WorksWithoutAPlaceForTheResult) {
   ScriptedMediaServer server("msm8960");
   webrtc::VideoCodec codec = settings();
   for (void* session : {encoder_create(nullptr, &codec), decoder_create(nullptr, nullptr)}) {
