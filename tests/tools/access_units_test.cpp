@@ -5,6 +5,7 @@
 
 #include <string>
 
+#include "host/mediaserver/components/annex_b.h"
 #include "tests/tools/temporary_directory.h"
 
 namespace {
@@ -12,52 +13,37 @@ namespace {
 using namespace tool;
 using tooltest::TemporaryDirectory;
 
-// Writes the payload of a NAL unit.
-class BitWriter {
+// A NAL unit, field by field.
+class Fields {
  public:
-  BitWriter& u(unsigned int count, uint32_t value) {
-    for (unsigned int i = count; i-- > 0;) {
-      if (_used % 8 == 0) _bytes.push_back(0);
-      _bytes.back() =
-          static_cast<char>(_bytes.back() | static_cast<char>((value >> i & 1) << (7 - _used % 8)));
-      ++_used;
-    }
+  Fields& u(unsigned int count, uint32_t value) {
+    _bits.bits(value, count);
     return *this;
   }
-  BitWriter& ue(uint32_t value) {
-    unsigned int length = 0;
-    while ((value + 1) >> (length + 1) != 0) ++length;
-    return u(length, 0).u(length + 1, value + 1);
+  Fields& ue(uint32_t value) {
+    _bits.ue(value);
+    return *this;
   }
-  BitWriter& se(int32_t value) {
+  Fields& se(int32_t value) {
     return ue(value > 0 ? static_cast<uint32_t>(value) * 2 - 1 : static_cast<uint32_t>(-value) * 2);
   }
-  // With the stop bit and the bytes that keep start codes out.
-  std::string nal(int header) {
-    u(1, 1);
-    std::string result(1, static_cast<char>(header));
-    int zeros = 0;
-    for (const char byte : _bytes) {
-      if (zeros >= 2 && (byte & ~3) == 0) {
-        result += '\3';
-        zeros = 0;
-      }
-      zeros = byte == 0 ? zeros + 1 : 0;
-      result += byte;
-    }
-    return result;
+  // With the stop bit and the bytes that keep start codes out, and no start code.
+  std::string nal(uint8_t header) {
+    _bits.finish();
+    std::vector<uint8_t> stream;
+    mediaserver::appendNal(header, _bits.bytes(), &stream);
+    return {stream.begin() + 4, stream.end()};
   }
 
  private:
-  std::string _bytes;
-  unsigned int _used = 0;
+  mediaserver::BitWriter _bits;
 };
 
 constexpr int kHigh = 100;
 
 // 6 bits of frame number, order type 0 with 8 bits; `interlaced` allows fields; 25 frames a second.
 std::string sps(bool interlaced = false, uint32_t profile = 66) {
-  BitWriter bits;
+  Fields bits;
   bits.u(8, profile).u(8, 0).u(8, 31).ue(0);
   if (profile == kHigh)
     bits.ue(1).ue(0).ue(0).u(1, 0).u(1, 1).u(1, 1).se(2).se(-10).u(7, 0);  // a scaling list
@@ -69,7 +55,7 @@ std::string sps(bool interlaced = false, uint32_t profile = 66) {
 }
 
 std::string pps(uint32_t id = 0) {
-  return BitWriter().ue(id).ue(0).u(1, 0).u(1, 0).ue(0).nal(0x68);
+  return Fields().ue(id).ue(0).u(1, 0).u(1, 0).ue(0).nal(0x68);
 }
 
 struct Slice {
@@ -84,7 +70,7 @@ struct Slice {
 };
 
 std::string slice(const Slice& fields, bool interlaced = false) {
-  BitWriter bits;
+  Fields bits;
   bits.ue(fields.first).ue(7).ue(fields.pps).u(6, fields.frame);
   if (interlaced) bits.u(1, fields.field >= 0 ? 1 : 0);
   if (fields.field >= 0) bits.u(1, fields.field == 1 ? 1 : 0);
@@ -185,21 +171,17 @@ TEST(AccessUnits, EndWhereThePictureEnds) {
   }
 }
 
-TEST(AccessUnits, EndWithEachField) {
+TEST(AccessUnits, EndWithEachFieldAndGoByTheFirstMacroblockWithoutParameters) {
   const std::string top = slice({.idr = true, .field = 0}, true);
   const std::string bottom = slice({.frame = 0, .order = 1, .field = 1}, true);
   const std::string frame = slice({.frame = 1, .order = 2}, true);
-  const auto expected = withStartCodes({{sps(true), pps(), top}, {bottom}, {frame}});
-  EXPECT_EQ(cut(joined(expected)).units, expected);
-}
-
-TEST(AccessUnits, GoByTheFirstMacroblockWhereParametersAreMissing) {
+  const auto fields = withStartCodes({{sps(true), pps(), top}, {bottom}, {frame}});
+  EXPECT_EQ(cut(joined(fields)).units, fields);
   const std::string idr = slice({.idr = true});
   const auto expected =
       withStartCodes({{idr, slice({.first = 7, .idr = true})}, {slice({.frame = 0})}, {slice({})}});
-  const Cut result = cut(joined(expected));
-  EXPECT_EQ(result.units, expected);
-  EXPECT_EQ(result.rate, std::nullopt);
+  EXPECT_EQ(cut(joined(expected)).units, expected);
+  EXPECT_EQ(cut(joined(expected)).rate, std::nullopt);
 }
 
 TEST(AccessUnits, SurviveStreamsThatAreDamagedOrNone) {

@@ -2,8 +2,9 @@
 #include <gtest/gtest.h>
 #include <signal.h>
 #include <stdlib.h>
+#include <sys/stat.h>
 
-#include <nlohmann/json.hpp>
+#include <fstream>
 #include <set>
 
 #include "tests/tools/process.h"
@@ -11,17 +12,6 @@
 namespace {
 
 using namespace tooltest;
-using nlohmann::json;
-
-constexpr int kUsage = 2;
-constexpr int kInput = 3;
-constexpr int kOutput = 4;
-constexpr int kDevice = 5;
-constexpr int kInterrupted = 130;
-
-bool contains(const std::string& text, std::string_view part) {
-  return text.find(part) != std::string::npos;
-}
 
 std::string replaced(std::string text, const std::string& what, const std::string& by) {
   for (size_t at = text.find(what); at != std::string::npos; at = text.find(what, at + by.size())) {
@@ -73,17 +63,19 @@ TEST(CommandLine, RefusesWhatItDoesNotUnderstandAndSaysWhatItTakes) {
 }
 
 TEST(CommandLine, HelpsWithExamplesAndExitCodes) {
-  for (const std::vector<std::string>& arguments :
-       {std::vector<std::string>{"--help"}, {"call", "--help"}, {"decode", "-h"}, {"devices", "--help"}}) {
-    const Ended run = runTool(arguments);
+  const struct {
+    std::vector<std::string> arguments;
+    const char* part;
+  } cases[] = {{{"--help"}, "Exit codes:"},
+               {{"call", "--help"}, "Examples:"},
+               {{"decode", "-h"}, "  130  interrupted"},
+               {{"devices", "--help"}, "Usage: omxbridge"}};
+  for (const auto& each : cases) {
+    const Ended run = runTool(each.arguments);
     EXPECT_EQ(run.exitCode, 0);
     EXPECT_EQ(run.err, "");
-    EXPECT_TRUE(contains(run.out, "Usage: omxbridge")) << run.out;
+    EXPECT_TRUE(contains(run.out, each.part)) << run.out;
   }
-  EXPECT_TRUE(contains(runTool({"--help"}).out, "Exit codes:"));
-  EXPECT_TRUE(contains(runTool({"call", "--help"}).out, "Examples:"));
-  EXPECT_TRUE(contains(runTool({"decode", "--help"}).out, "  130  interrupted"));
-  EXPECT_EQ(runTool({"--version"}).exitCode, 0);
 }
 
 TEST(CommandLine, TellsShellsAndManOfEveryOption) {
@@ -110,28 +102,20 @@ TEST(CommandLine, TellsShellsAndManOfEveryOption) {
   EXPECT_EQ(contentOf(answer), "convert compare components completion main --key-interval ");
 }
 
-TEST(CommandLine, ListsTheDevices) {
+TEST(CommandLine, ListsDevicesAndComponentsAndWhatTheyAreUsedFor) {
   const auto list = json::parse(runTool({"devices", "--json", "-d", "omap4"}).out)["devices"];
   ASSERT_GE(list.size(), 6U);
-  size_t chosen = 0;
   for (const auto& device : list) {
+    EXPECT_EQ(device["chosen"], device["name"] == "omap4");
     if (!device["chosen"]) continue;
-    ++chosen;
-    EXPECT_EQ(device["name"], "omap4");
     EXPECT_EQ(device["hardware_version"], 5);
     EXPECT_EQ(device["decoder"], "OMX.TI.DUCATI1.VIDEO.DECODER==");
   }
-  EXPECT_EQ(chosen, 1U);
   const Ended table = runTool({"devices"});
-  EXPECT_EQ(table.exitCode, 0);
   EXPECT_TRUE(contains(table.out, "* msm8960 ")) << table.out;
   EXPECT_TRUE(contains(table.out, "4 (MSM8x60)")) << table.out;
-}
 
-TEST(CommandLine, ListsTheComponentsAndWhatTheyAreUsedFor) {
-  const Ended run = runTool({"components", "--json", "-d", "omap4"});
-  ASSERT_EQ(run.exitCode, 0) << run.err;
-  const json object = json::parse(run.out);
+  const json object = json::parse(runTool({"components", "--json", "-d", "omap4"}).out);
   EXPECT_EQ(object["device"], "omap4");
   std::set<std::string> uses;
   for (const auto& component : object["components"]) {
@@ -139,11 +123,8 @@ TEST(CommandLine, ListsTheComponentsAndWhatTheyAreUsedFor) {
     if (!component["use"].is_null()) uses.insert(component["use"]);
   }
   EXPECT_EQ(uses, (std::set<std::string>{"decoder", "encoder"}));
-  EXPECT_TRUE(contains(runTool({"components"}).out, "hardware version 1")) << run.out;
-
-  const Ended none = runTool({"components", "-d", "exynos4"});
-  EXPECT_EQ(none.exitCode, 0) << none.err;
-  EXPECT_TRUE(contains(none.out, "no components")) << none.out;
+  EXPECT_TRUE(contains(runTool({"components"}).out, "hardware version 1"));
+  EXPECT_TRUE(contains(runTool({"components", "-d", "exynos4"}).out, "no components"));
   const Ended noServer =
       runTool({"components"}, {.environment = {"OMXBRIDGE_MEDIASERVER=/missing", "OMXBRIDGE_LOG=silent"}});
   EXPECT_EQ(noServer.exitCode, kDevice);
@@ -163,10 +144,8 @@ TEST(CommandLine, NamesTheFileThatIsWrong) {
       {{"call", text}, kInput, "notes.txt"},
       {{"call", empty}, kInput, "empty"},
       {{"call", "-"}, kInput, "standard input"},
-      {{"call", text, "--size", "64x64"}, kInput, "notes.txt"},
       {{"call", directory.file("")}, kInput, directory.file("")},
       {{"decode", text}, kInput, "notes.txt"},
-      {{"decode", empty}, kInput, "empty"},
       {{"call", "-o", directory.file("no/a.y4m")}, kOutput, "no/a.y4m"},
       {{"call", "--stream", "/dev/full"}, kOutput, "/dev/full"},
       {{"call", "-o", "/dev/full"}, kOutput, "/dev/full"},
@@ -186,15 +165,18 @@ TEST(CommandLine, NamesTheFileThatIsWrong) {
 }
 
 TEST(CommandLine, EndsAtCtrlCWhileItWaitsForInput) {
+  const TemporaryDirectory directory;
+  const std::string path = directory.file("pipe");
+  ASSERT_EQ(mkfifo(path.c_str(), 0600), 0);
+  std::fstream pipe(path);  // for both, which does not wait for the tool
   for (const int number : {SIGINT, SIGTERM}) {
-    const TemporaryDirectory directory;
-    Process tool({"call", "-", "-o", directory.file("a.y4m")}, {.inPipe = true});
-    tool.send("YUV4MPEG2 W64 H64 F30:1\n");
+    Process tool({"call", "-", "-o", directory.file("a.y4m")}, {.in = path});
+    pipe << "YUV4MPEG2 W64 H64 F30:1\n" << std::flush;
     ASSERT_TRUE(tool.waitForOutput("Components"));
     tool.signal(number);
     const Ended run = tool.finish();
     EXPECT_EQ(run.exitCode, kInterrupted) << run.err;
-    EXPECT_TRUE(directory.names().empty());
+    EXPECT_EQ(directory.names(), std::vector<std::string>{"pipe"});
   }
 }
 

