@@ -131,11 +131,6 @@ TEST_F(SettingsChange, IsAnnouncedAgainAfterIdleAndSettledByLoadedAlsoHalfWayThr
   EXPECT_EQ(node->messages().count(changed), 0u) << "there is nothing to hold back yet";
   node->fillAll();
   node->expect(changed);
-  node->command(OMX_CommandPortDisable, kOutputPort);
-  node->freeBuffers(kOutputPort);
-  node->expectComplete(OMX_CommandPortDisable, kOutputPort);
-  node->command(OMX_CommandPortEnable, kOutputPort);
-  EXPECT_EQ(node->give(kOutputPort), android::OK);  // and then no more
   node->executingToIdle();
   node->idleToLoaded();
   node->messages().clear();
@@ -144,6 +139,17 @@ TEST_F(SettingsChange, IsAnnouncedAgainAfterIdleAndSettledByLoadedAlsoHalfWayThr
   node->empty(0, "in new buffers");
   node->expect(fillBufferDone());
   EXPECT_EQ(node->messages().count(changed), 0u);
+  // A client that stops half-way through the reallocation.
+  sendBackAll(node.get());
+  decoder.announce(64, 48);
+  node->expect(changed);
+  node->command(OMX_CommandPortDisable, kOutputPort);
+  node->freeBuffers(kOutputPort);
+  node->expectComplete(OMX_CommandPortDisable, kOutputPort);
+  node->command(OMX_CommandPortEnable, kOutputPort);
+  EXPECT_EQ(node->give(kOutputPort), android::OK);  // and then no more
+  node->executingToIdle();
+  node->idleToLoaded();
 }
 
 }  // namespace

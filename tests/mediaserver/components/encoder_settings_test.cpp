@@ -37,8 +37,7 @@ std::string pictureSet(const std::vector<uint8_t>& unit) {
 TEST(EncoderSettings, ShowInTheParameterSets) {
   const struct {
     OMX_VIDEO_AVCPROFILETYPE profile;
-    bool cabac;
-    bool transform;
+    bool cabac, transform;
     OMX_U32 references;
     int idc;
     const char* pictureSet;

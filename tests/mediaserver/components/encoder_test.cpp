@@ -119,107 +119,83 @@ TEST(Encoder, SkipsAPictureThatIsNotWhole) {
   expectLike(run.units(), pictures, 25);
 }
 
-TEST(Encoder, PutsKeyFramesExactlyWhereTheyAreDue) {
+TEST(Encoder, PutsKeyFramesWhereTheyAreDueOrRequestedAndCountsFromTheLastOne) {
+  const auto qcom = [](EncoderRun& run, OMX_U32 pFrames, OMX_U32 bFrames) {
+    auto period = makeRecord<mediaserver::QcomIntraPeriod>(kOutputPort);
+    period.nIDRPeriod = 1;
+    period.nPFrames = pFrames;
+    period.nBFrames = bFrames;
+    return run.setConfig(mediaserver::kQcomIntraPeriodIndex, period);
+  };
   const struct {
     const char* device;
     OMX_U32 pFrames;
+    // '.' a picture, 'r' a request, 'q' Qualcomm's period of 3, 's' the standard's of ever.
+    const char* steps;
     std::vector<size_t> keys;
   } cases[] = {
-      {"msm8960", 4, {0, 5, 10}}, {"msm8960", 0, {0, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11}},
-      {"msm8960", 0xFFFF, {0}},   {"omap4", 5, {0, 5, 10}},
-      {"omap4", 0, {0}},
+      {"msm8960", 4, "............", {0, 5, 10}},
+      {"msm8960", 0, "....", {0, 1, 2, 3}},
+      {"msm8960", 5, "...r........q......s......", {0, 3, 9, 12, 15}},
+      {"msm7x30", 0xFFFF, ".r.r..r.....r.", {0, 1, 2, 4, 9}},
+      {"omap4", 0, ".r.r..r.....r.", {0, 1, 2, 4, 9}},
+      {"omap4", 5, "............", {0, 5, 10}},
   };
   for (const auto& each : cases) {
+    SCOPED_TRACE(std::string(each.device) + " " + each.steps);
     EncoderRun run(each.device, 64, 48);
     run.setPFrames(each.pFrames);
     EXPECT_EQ(run.avc().nPFrames, each.pFrames);
     run.start();
-    run.encodeScene(64, 48, 12);
-    EXPECT_EQ(run.keyFrames(), each.keys) << each.device << " " << each.pFrames;
-    for (const size_t key : each.keys) EXPECT_EQ(nalTypes(run.outputs[key].bytes), kKeyUnit);
-  }
-}
-
-TEST(Encoder, MakesTheNextPictureAKeyFrameEachTimeOneIsRequested) {
-  for (const char* device : {"msm7x30", "omap4"}) {
-    EncoderRun run(device, 64, 48);
-    run.setPFrames(0xFFFF);
-    run.start();
-    std::vector<size_t> wanted;
-    for (uint32_t i = 0; i < 50; ++i) {
-      wanted.push_back(run.outputs.size());
-      run.encodeScene(64, 48, 1);
-      EXPECT_EQ(nalTypes(run.outputs.back().bytes), kKeyUnit);
-      run.encodeScene(64, 48, i % 3);
-      EXPECT_EQ(run.requestKey(), kOk);
+    for (const char* step = each.steps; *step != 0; ++step) {
+      if (*step == '.') run.encodeScene(64, 48, 1);
+      EXPECT_TRUE(*step != 'r' || run.requestKey() == kOk);
+      EXPECT_TRUE(*step != 'q' || qcom(run, 2, 0) == kOk);
+      if (*step == 's') {
+        auto standard = makeRecord<OMX_VIDEO_CONFIG_AVCINTRAPERIOD>(kOutputPort);
+        standard.nPFrames = 0xFFFFFFFF;
+        EXPECT_EQ(run.setConfig(OMX_IndexConfigVideoAVCIntraPeriod, standard), kOk);
+      }
     }
-    EXPECT_EQ(run.keyFrames(), wanted) << device;
+    EXPECT_EQ(run.keyFrames(), each.keys);
+    for (const size_t key : each.keys) EXPECT_EQ(nalTypes(run.outputs[key].bytes), kKeyUnit);
+    EXPECT_EQ(qcom(run, 2, 1), run.isTi() ? kUnknownError : kUnsupported);
   }
 }
 
-TEST(Encoder, CountsKeyFramesFromTheLastOne) {
-  EncoderRun run("msm8960", 64, 48);
-  run.setPFrames(5);
-  run.start();
-  run.encodeScene(64, 48, 3);
-  EXPECT_EQ(run.requestKey(), kOk);
-  run.encodeScene(64, 48, 8);  // 3 is requested, 9 is due
-  auto period = makeRecord<mediaserver::QcomIntraPeriod>(kOutputPort);
-  period.nIDRPeriod = 1;
-  period.nPFrames = 2;
-  EXPECT_EQ(run.setConfig(mediaserver::kQcomIntraPeriodIndex, period), kOk);
-  run.encodeScene(64, 48, 6);  // 12, 15
-  auto standard = makeRecord<OMX_VIDEO_CONFIG_AVCINTRAPERIOD>(kOutputPort);
-  standard.nPFrames = 0xFFFFFFFF;
-  EXPECT_EQ(run.setConfig(OMX_IndexConfigVideoAVCIntraPeriod, standard), kOk);
-  run.encodeScene(64, 48, 6);
-  EXPECT_EQ(run.keyFrames(), (std::vector<size_t>{0, 3, 9, 12, 15}));
-  period.nBFrames = 1;
-  EXPECT_EQ(run.setConfig(mediaserver::kQcomIntraPeriodIndex, period), kUnsupported);
-  EXPECT_EQ(EncoderRun("omap4").setConfig(mediaserver::kQcomIntraPeriodIndex, period), kUnknownError);
-}
-
-TEST(Encoder, TurnsPicturesWhileRunningAsNewSettings) {
+TEST(Encoder, TurnsPicturesAndMakesRoomForLargerOnesWhileRunning) {
   for (const char* device : {"msm8960", "msm8x60", "omap4"}) {
     EncoderRun run(device, 96, 64);
-    run.setBitRate(1000000);
+    run.setBitRate(4000000);
     ASSERT_EQ(run.rotate(270), kOk);
     run.start();
     std::vector<Picture> wanted;
+    const auto encode = [&](const Picture& picture, int quarters) {
+      wanted.push_back(turned(picture, quarters));
+      const auto& video = run.encode(picture).definition.format.video;
+      EXPECT_EQ(video.nFrameWidth, wanted.back().width);
+      EXPECT_EQ(video.nFrameHeight, wanted.back().height);
+    };
     for (const int quarters : {3, 1, 2, 0}) {
       EXPECT_EQ(run.rotate(quarters * 90), kOk);
-      for (uint32_t i = 0; i < 2; ++i) {
-        wanted.push_back(turned(scene(96, 64, i), quarters));
-        const auto& video = run.encode(scene(96, 64, i)).definition.format.video;
-        EXPECT_EQ(video.nFrameWidth, wanted.back().width);
-        EXPECT_EQ(video.nFrameHeight, wanted.back().height);
-      }
+      for (uint32_t i = 0; i < 2; ++i) encode(scene(96, 64, i), quarters);
     }
-    expectLike(run.units(), wanted, 33);
-    EXPECT_EQ(run.keyFrames(), (std::vector<size_t>{0, 4})) << "a new size takes a new stream";
     for (const int32_t refused : {45, -90, 360, 1}) EXPECT_EQ(run.rotate(refused), kUnsupported) << refused;
+    EXPECT_EQ(run.reconfigurations, 0U);
+    // A larger size, by way of the input port.
+    run.reopenInput([&] {
+      const auto enlarge = [](auto& video) {
+        video.nFrameWidth = 640;
+        video.nFrameHeight = 480;
+      };
+      EXPECT_EQ(run.define(kInputPort, enlarge), kOk);
+    });
+    encode(scene(640, 480, 1), 0);
+    EXPECT_EQ(run.reconfigurations, 1U);
+    expectLike(run.units(), wanted, 30);
+    EXPECT_EQ(run.keyFrames(), (std::vector<size_t>{0, 4, 8})) << "a new size takes a new stream";
     EXPECT_EQ(run.errors, Errors{});
   }
-}
-
-// The same for a size that the client changes by way of the input port.
-TEST(Encoder, MakesRoomForLargerPicturesWhileRunning) {
-  EncoderRun run("msm8960", 64, 48);
-  run.setBitRate(4000000);
-  run.start();
-  const std::vector<Picture> pictures = {scene(64, 48, 0), scene(640, 480, 1)};
-  run.encode(pictures[0]);
-  run.reopenInput([&] {
-    EXPECT_EQ(run.define(kInputPort,
-                         [](auto& video) {
-                           video.nFrameWidth = 640;
-                           video.nFrameHeight = 480;
-                         }),
-              kOk);
-  });
-  EXPECT_EQ(run.encode(pictures[1]).definition.format.video.nFrameWidth, 640U);
-  EXPECT_EQ(run.reconfigurations, 1U);
-  expectLike(run.units(), pictures, 30);
 }
 
 TEST(Encoder, EndsAStreamAndBeginsAnotherAlsoAfterAFlush) {
