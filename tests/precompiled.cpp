@@ -1,0 +1,1 @@
+// A target of precompiled headers has to have a source.
