@@ -210,12 +210,14 @@ TEST(AccessUnits, SurviveStreamsThatAreDamagedOrNone) {
 }
 
 TEST(AccessUnits, AreReadOverTheEdgesOfTheBuffer) {
-  // Slices of many lengths put start codes at every place of the reader's chunks.
-  Units units{{sps(), pps(), slice({.idr = true}) + std::string(65500, 'x')}};
-  for (uint32_t i = 1; i < 60; ++i) {
-    units.push_back({slice({.frame = i}) + std::string(65536 - 20 + i, 'y')});
+  constexpr size_t kChunk = 65536;
+  // Each start code lies a byte further to the front of an edge than the one before.
+  std::vector<std::string> expected = withStartCodes({{sps(), pps(), slice({.idr = true})}});
+  expected[0].resize(kChunk + 4, 'x');
+  for (uint32_t i = 1; i < 12; ++i) {
+    expected.push_back(std::string("\0\0\1", 3) + slice({.frame = i}));
+    expected.back().resize(kChunk - 1, 'y');
   }
-  const auto expected = withStartCodes(units);
   EXPECT_EQ(cut(joined(expected)).units, expected);
 }
 

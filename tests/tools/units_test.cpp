@@ -53,7 +53,7 @@ TEST(Units, CountsTimeWithoutDriftOrOverflow) {
   EXPECT_EQ(ntsc.microseconds(0), 0);
   EXPECT_EQ(ntsc.microseconds(1), 33366);
   EXPECT_EQ(ntsc.microseconds(30000), 1001'000'000);
-  EXPECT_EQ(ntsc.microseconds(3'000'000'000), 100'100'000'000'000);
+  EXPECT_EQ(ntsc.microseconds(30'000'000'000), 1'001'000'000'000'000);
   EXPECT_EQ((FrameRate{999'983, 1'000'000}).microseconds(999'982), 999'998'999'982);
 }
 
