@@ -29,6 +29,7 @@ struct Expected {
   std::map<Step, int> results;             // those that are not 0
   std::optional<Step> stuck;               // waits for what the fault keeps back
   LogLines lines;                          // besides those of every life
+  std::string maybe;                       // one that depends on who is quicker; empty: none
   std::optional<size_t> picturesLost = 0;  // nothing: does not matter
   int endMarkEvents = 1;                   // that a decoder sees
 };

@@ -29,7 +29,6 @@ constexpr const char* kGeometry =
     "OMXINTERFACE - SETUP PORT PARAMETERS: Set Port Definition Failed: $status\n";
 constexpr const char* kNoDefinition =
     "OMXINTERFACE - ALLOCATE BUFFERS: Could not get port definition: $status";
-constexpr const char* kNoFill = "OMXINTERFACE - fillBuffer failed w/ error 0x$hex";
 constexpr const char* kNoEmpty = "OMXINTERFACE - ETB::emptyBuffer failed w/ error 0x$hex \n";
 
 using enum Step;

@@ -30,6 +30,7 @@ struct Rule {
   Effect effect = Effect::None;
 };
 
+inline constexpr const char* kNoFill = "OMXINTERFACE - fillBuffer failed w/ error 0x$hex";
 inline constexpr const char* kNoBuffer =
     "OMXINTERFACE - Could not allocate memory: port $port buffer $buffer error $status(0x$hex)\n";
 
