@@ -180,11 +180,6 @@ size_t take(LogLines* log, const std::string& begin) {
 
 }  // namespace
 
-const char* Subject::component() const {
-  if (isTi()) return encoding ? "OMX.TI.DUCATI1.VIDEO.H264E" : "OMX.TI.DUCATI1.VIDEO.DECODER==";
-  return encoding ? "OMX.qcom.video.encoder.avc" : "OMX.qcom.video.decoder.avc";
-}
-
 Expected expected(const Subject& subject, const Fault& fault, const Hit& hit) {
   switch (fault.kind) {
     case Kind::Refused:

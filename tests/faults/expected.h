@@ -6,6 +6,8 @@
 #include <optional>
 #include <string>
 
+#include <omxhost/device.h>
+
 #include "tests/core/log_lines.h"
 #include "tests/faults/life.h"
 
@@ -18,7 +20,10 @@ struct Subject {
   bool isTi() const { return std::string(device) == "omap4"; }
   // One, so that each is needed: but a decoder of TI's asks for four.
   size_t inputs() const { return isTi() && !encoding ? 4 : 1; }
-  const char* component() const;
+  const char* component() const {
+    const omxhost::Device& posed = *omxhost::findDevice(device);
+    return encoding ? posed.encoderComponent : posed.decoderComponent;
+  }
 };
 
 inline void PrintTo(const Subject& subject, std::ostream* stream) {

@@ -43,21 +43,18 @@ Injector::~Injector() {
 
 void Injector::enter(Step step) {
   const std::lock_guard<std::mutex> lock(_mutex);
-  if (_step == step && !_marks.empty()) return;
+  if (_step == step) return;
   _step = step;
-  _marks.push_back({step, omxhost::memoryBlocksAsked(), threadsMade()});
-}
-
-size_t Injector::nth(const Likeness& likeness) {
-  return ++_alike[likeness];
+  _alike.clear();
+  // Until it happens: that step is the last one that begins before.
+  if (!_happened && asked() < _fault.number) _hit = {step, _fault.number - asked(), {}, 0, {}};
 }
 
 bool Injector::refuses(const Call& call) {
   const std::lock_guard<std::mutex> lock(_mutex);
   const OMX_U32 port = portOf(call);
-  const size_t nth = this->nth({static_cast<size_t>(_step), static_cast<size_t>(call.method), port,
-                                static_cast<size_t>(call.index), static_cast<size_t>(call.command),
-                                static_cast<size_t>(call.param)});
+  const size_t nth = ++_alike[{static_cast<OMX_U32>(call.method), port, static_cast<OMX_U32>(call.index),
+                               call.command, static_cast<OMX_U32>(call.param)}];
   if (++_calls != _fault.number || _fault.place != Place::Call) return false;
   _hit = {_step, nth, call, port, {}};
   _happened = true;
@@ -66,7 +63,7 @@ bool Injector::refuses(const Call& call) {
 
 Fate Injector::fate(android::omx_message& message) {
   const std::lock_guard<std::mutex> lock(_mutex);
-  const size_t nth = this->nth({static_cast<size_t>(_step), SIZE_MAX, static_cast<size_t>(message.type)});
+  const size_t nth = ++_alike[{~OMX_U32{0}, static_cast<OMX_U32>(message.type)}];
   if (++_messages != _fault.number || _fault.place != Place::Message) return Fate::Pass;
   _hit = {_step, nth, {}, 0, message};
   _happened = true;
@@ -96,8 +93,13 @@ void Injector::awaitRepeat() const {
 }
 
 uint64_t Injector::threadsMade() const {
-  const size_t asked = _fault.place == Place::Thread ? _fault.number : kCounting;
-  return asked - _threadFault.left();
+  const size_t allowed = _fault.place == Place::Thread ? _fault.number : kCounting;
+  return allowed - _threadFault.left();
+}
+
+// Blocks of memory or threads, whichever the fault is one of.
+uint64_t Injector::asked() const {
+  return _fault.place == Place::Memory ? omxhost::memoryBlocksAsked() : threadsMade();
 }
 
 std::array<size_t, kPlaces> Injector::counts() const {
@@ -107,17 +109,9 @@ std::array<size_t, kPlaces> Injector::counts() const {
 
 std::optional<Hit> Injector::hit() const {
   const std::lock_guard<std::mutex> lock(_mutex);
-  if (_happened) return _hit;
-  if (_fault.place == Place::Call || _fault.place == Place::Message) return {};
-  // In the last step that began before it.
-  const bool memory = _fault.place == Place::Memory;
-  if ((memory ? omxhost::memoryBlocksAsked() : threadsMade()) < _fault.number) return {};
-  Hit hit;
-  for (const Mark& mark : _marks) {
-    const uint64_t before = memory ? mark.blocks : mark.threads;
-    if (before < _fault.number) hit = {mark.step, _fault.number - before, {}, 0, {}};
-  }
-  return hit;
+  const bool noted = _fault.place == Place::Call || _fault.place == Place::Message;
+  if (noted ? !_happened : asked() < _fault.number) return {};
+  return _hit;
 }
 
 std::string Injector::describe() const {

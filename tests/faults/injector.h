@@ -8,7 +8,6 @@
 #include <mutex>
 #include <optional>
 #include <string>
-#include <vector>
 
 #include "tests/core/faults.h"
 #include "tests/support/scripted_media_server.h"
@@ -70,28 +69,20 @@ class Injector {
   std::string describe() const;
 
  private:
-  struct Mark {
-    Step step;
-    uint64_t blocks;
-    uint64_t threads;
-  };
-  using Likeness = std::array<size_t, 6>;
-
   bool refuses(const Call& call);
   Fate fate(android::omx_message& message);
-  size_t nth(const Likeness& likeness);
   uint64_t threadsMade() const;
+  uint64_t asked() const;
 
   ScriptedMediaServer& _server;
   const Fault _fault;
   const faults::Fault _threadFault;
   std::atomic<bool> _happened{false};  // to a call or a message
   mutable std::mutex _mutex;           // guards everything below
-  Step _step = Step::Create;
+  Step _step = Step::Destroy;          // of nobody yet
   size_t _calls = 0;
   size_t _messages = 0;
-  std::map<Likeness, size_t> _alike;
-  std::vector<Mark> _marks;
+  std::map<std::array<OMX_U32, 5>, size_t> _alike;  // how many of each in this step
   Hit _hit;
 };
 

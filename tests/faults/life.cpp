@@ -92,6 +92,7 @@ int Life::configure() {
     }
   } else {
     results.push_back(omx_decoder_set_input_compression_format(_session, 0));
+    results.push_back(omx_decoder_set_input_packing_format(_session, 1));
     const int buffers = omx_interface_get_buffer_number(_session);
     results.push_back(buffers > 0 ? 0 : buffers);
   }

@@ -18,6 +18,7 @@ constexpr OMX_U32 kAvc = OMX_IndexParamVideoAvc;
 constexpr OMX_U32 kRate = OMX_IndexParamVideoBitrate;
 constexpr OMX_U32 kProfile = OMX_IndexParamVideoProfileLevelCurrent;
 constexpr OMX_U32 kPictureOrder = 0x7F000010;
+constexpr OMX_U32 kPacking = 0x7F000002;
 
 constexpr OMX_U32 state(OMX_U32 param) {
   return 100 * (OMX_CommandStateSet + 1) + param;
@@ -80,6 +81,7 @@ const Rule kRules[] = {
     {nullptr, 'E', Configure, SetConfig, 0, -1, 0, Configure, 33, "===qoxtest setConfig Error $index!"},
     {nullptr, 'D', Configure, GetParameter, kDefinition, 0, 1, Configure, -1, "OMXINTERFACE - Could not get parameters for Video Compression Format ($status)"},
     {nullptr, 'D', Configure, SetParameter, kDefinition, 0, 1, Configure, -1, "OMXINTERFACE - Could not set Video Compression Format"},
+    {kQcom, 'D', Configure, SetParameter, kPacking, 0, 0, Configure, 31, "OMXINTERFACE - Could not set input frame packing format ($status)"},
     {nullptr, 'D', Configure, GetParameter, kDefinition, 0, 2, Configure, -1, "get OMX_IndexParamPortDefinition InPort Error:$status"},
 
     {nullptr, 'B', Init, SendCommand, state(OMX_StateIdle), -1, 0, Init, 20, ""},

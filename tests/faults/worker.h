@@ -12,13 +12,10 @@ namespace omxtest {
 
 class Worker {
  public:
-  Worker() : _thread([this] { run(); }) {}
   ~Worker() {
     start(nullptr);
     _thread.join();
   }
-  Worker(const Worker&) = delete;
-  Worker& operator=(const Worker&) = delete;
 
   // The last call has to be done. Null: the end of the thread.
   void start(std::function<int()> call) {
@@ -32,10 +29,7 @@ class Worker {
     return !_due;
   }
   // Of the last call, which is done.
-  int result() const {
-    const std::lock_guard<std::mutex> lock(_mutex);
-    return _result;
-  }
+  int result() const { return _result; }
 
  private:
   void run() {
@@ -43,21 +37,19 @@ class Worker {
     for (;;) {
       _changed.wait(lock, [this] { return _due; });
       if (!_call) return;
-      const auto call = std::exchange(_call, nullptr);
       lock.unlock();
-      const int result = call();
+      _result = _call();
       lock.lock();
-      _result = result;
       _due = false;
     }
   }
 
-  mutable std::mutex _mutex;  // guards everything below; not held during a call
+  mutable std::mutex _mutex;  // guards _due, which says whose turn the others are
   std::condition_variable _changed;
   std::function<int()> _call;
-  bool _due = false;
   int _result = 0;
-  std::thread _thread;  // last: it uses the others
+  bool _due = false;
+  std::thread _thread{[this] { run(); }};  // last: it uses the others
 };
 
 }  // namespace omxtest
