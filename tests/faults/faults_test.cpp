@@ -76,13 +76,13 @@ std::array<size_t, kPlaces> FaultsTest::live(const Fault& fault) {
     hangReport() = nullptr;
   }
   // A thread may still be on its way out when it has been joined.
-  if (fault.kind == Kind::None) {
-    _before = Belongings();
-  } else if (!eventually([&] { return Belongings() == _before; }, std::chrono::milliseconds(2000))) {
-    const Belongings after;
+  requireEventually([&] { return Belongings() == _before || atStandstill(); }, "the end of all movement");
+  const Belongings after;
+  if (fault.kind != Kind::None && after != _before) {
     leaks += std::to_string(after.objects - _before.objects) + " objects, threads " +
              std::to_string(after.threads) + ", files " + std::to_string(after.files);
   }
+  _before = after;
   if (!leaks.empty()) ++_summary.leaks;
   if (wrong.empty() && leaks.empty()) ++_summary.answered;
   ++_summary.injected;
