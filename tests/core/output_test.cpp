@@ -241,12 +241,8 @@ TEST_F(OutputTest, FillsACleanRecordUnlessThePortIsReconfigured) {
 
 TEST_F(OutputTest, TakesABufferBackThatTheComponentRefuses) {
   start();
-  omx().fail(Method::FillBuffer);
-  feedThrough("lost on its way back");
-  waitForFills(kOutputs + 1);
   keepBuffers();
-  for (const char* text : {"b", "c"}) feedThrough(text);
-  EXPECT_EQ(_session->threadError(), OMXI_OK);
+  for (const char* text : {"a", "b"}) feedThrough(text);
   omx().fail(Method::FillBuffer);
   EXPECT_EQ(_session->fillOutputBuffer(outputRecord(0)), OMXI_ERR_FILL_BUFFER);
   EXPECT_FALSE(outputRecord(0)->busy);
@@ -254,7 +250,7 @@ TEST_F(OutputTest, TakesABufferBackThatTheComponentRefuses) {
   omx().fail(Method::FillBuffer, 2);
   EXPECT_EQ(_session->fillOutputBuffers(), OMXI_ERR_FILL_BUFFER);
   EXPECT_EQ(trace(before), (Trace{"fillBuffer out0", "fillBuffer out1 failed"}));  // and no further
-  EXPECT_EQ(log(), LogLines(3, std::string("E OMXINTERFACE - fillBuffer failed w/ error ") + kRefusedHex));
+  EXPECT_EQ(log(), LogLines(2, std::string("E OMXINTERFACE - fillBuffer failed w/ error ") + kRefusedHex));
   EXPECT_FALSE(outputRecord(1)->busy);
   EXPECT_EQ(_session->fillOutputBuffers(), OMXI_OK);
   EXPECT_EQ(busyCount(1), kOutputs);
