@@ -225,8 +225,11 @@ std::string differences(const Subject& subject, const Fault& fault, const std::o
     return each.second == 0 || told;
   });
   compare("results", inWords(results), inWords(wanted.results));
-  compare("waits", outcome.stuck.has_value() ? name(*outcome.stuck) : "nowhere",
-          wanted.stuck.has_value() ? name(*wanted.stuck) : "nowhere");
+  if (!outcome.hang.empty()) text << "HANG: " << outcome.hang << " has what it needs and waits on\n";
+  if (outcome.stuck != wanted.stuck) {
+    if (outcome.stuck.has_value()) text << "HANG: " << name(*outcome.stuck) << " waits for nothing\n";
+    if (wanted.stuck.has_value()) text << name(*wanted.stuck) << " does not wait\n";
+  }
   if (wanted.results.empty() && wanted.picturesLost.has_value()) {
     const size_t all = subject.encoding ? Life::kFrames : 2 * Life::kFrames;
     compare("pictures", outcome.pictures, all - *wanted.picturesLost);
@@ -260,7 +263,6 @@ std::string differences(const Subject& subject, const Fault& fault, const std::o
     return together;
   };
   compare("lines", joined(lines), joined(wanted.lines));
-  if (!outcome.hang.empty()) text << "HANG in " << outcome.hang << "\n";
   return text.str();
 }
 
