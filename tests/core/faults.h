@@ -25,7 +25,7 @@ class Fault {
   Fault& operator=(const Fault&) = delete;
 
   bool happened() const { return left() == 0; }
-  // Threads that can still be made before the one that fails; of an allocation, its bytes until it has failed.
+  // Threads that can be made up to the one that fails; of an allocation, its bytes until it has failed.
   size_t left() const;
 
  private:

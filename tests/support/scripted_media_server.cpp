@@ -42,8 +42,8 @@ const omxhost::Device& pose(const char* device) {
 ScriptedMediaServer::ScriptedMediaServer(const char* device, std::chrono::milliseconds readingTime)
     : _decoder(std::make_unique<Script>(Script::Kind::Decoder)),
       _encoder(std::make_unique<Script>(Script::Kind::Encoder)),
-      _server(new mediaserver::OmxServer(components(pose(device), _decoder.get(), _encoder.get()),
-                                         readingTime)),
+      _server(
+          new mediaserver::OmxServer(components(pose(device), _decoder.get(), _encoder.get()), readingTime)),
       _omx(new RecordingOmx(_server)),
       _loadedOnDemand(omxhost::setLoadOnDemand(false)) {
   serve();

@@ -1,4 +1,5 @@
-// Faults on request, and what they may leave behind, for tests. Any thread may call these functions; they concern the whole process.
+// Faults on request, and what they may leave behind, for tests. Any thread may call these functions; they
+// concern the whole process.
 #pragma once
 
 #include <stdint.h>
