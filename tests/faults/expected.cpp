@@ -55,6 +55,11 @@ void runOutOfInput(const Subject& subject, const Hit& hit, Expected* result) {
   if (hit.step == Step::Feed) result->results[Step::FeedMore] = -1;
 }
 
+// Where a failure comes out: one of the event thread's when the session is taken down.
+Step resultStep(const Hit& hit) {
+  return hit.step == Step::Reconfigure ? Step::DeInit : hit.step;
+}
+
 Expected refusedCall(const Subject& subject, const Hit& hit) {
   Expected result;
   const Rule* const rule = findRule(subject, hit);
@@ -62,7 +67,7 @@ Expected refusedCall(const Subject& subject, const Hit& hit) {
     result.lines.emplace_back("no rule for this call");
     return result;
   }
-  if (rule->code != 0) result.results[rule->shows] = rule->code;
+  if (rule->code != 0) result.results[resultStep(hit)] = rule->code;
   if (!rule->line.empty()) {
     result.lines.push_back("E " + filledIn(rule->line, subject, hit, hit.port, hit.nth - 1));
   }
@@ -78,7 +83,7 @@ Expected refusedMemory(const Subject& subject, const Hit& hit) {
   Expected result;
   const bool input = hit.step == Step::Init && hit.nth <= subject.inputs();
   const size_t before = hit.step == Step::Init && !input ? subject.inputs() : 0;
-  result.results[hit.step == Step::Init ? Step::Init : Step::DeInit] = OMXI_ERR_ALLOCATE_MEMORY;
+  result.results[resultStep(hit)] = OMXI_ERR_ALLOCATE_MEMORY;
   result.lines.push_back(
       filledIn("E OMXINTERFACE - Memory dealer allocation failed for port $port buffer $buffer\n", subject,
                hit, input ? 0 : 1, hit.nth - 1 - before));

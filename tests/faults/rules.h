@@ -24,8 +24,7 @@ struct Rule {
   OMX_U32 what;      // index, or 100 * (command + 1) + its parameter; 0: any
   int port;          // -1: any
   size_t nth;        // of its like in the step; 0: any further one
-  Step shows;        // whose result is ...
-  int code;          // ... this
+  int code;          // the step's result; of a reconfiguration, that of the end
   std::string line;  // may name $status, $hex, $index, $name, $port and $buffer; empty: silence
   Effect effect = Effect::None;
 };
