@@ -71,6 +71,11 @@ void Script::setFormats(OMX_U32 port, std::vector<mediaserver::VideoFormat> form
   _formats.at(port) = std::move(formats);
 }
 
+void Script::separatePorts() {
+  const Lock lock(_mutex);
+  _portsAreSeparate = true;
+}
+
 void Script::setExtensions(std::vector<mediaserver::Extension> extensions) {
   const Lock lock(_mutex);
   _extensions = std::move(extensions);

@@ -56,6 +56,8 @@ class Script {
   void editPort(OMX_U32 port, const PortEdit& edit);
   // Defaults: AVC, MPEG-4, H.263, WMV (an encoder: AVC); 21 and TI's 0x7F000100.
   void setFormats(OMX_U32 port, std::vector<mediaserver::VideoFormat> formats);
+  // The output keeps its size when a client gives the input another one.
+  void separatePorts();
   // Default: the extension that storeMetaDataInBuffers needs, which takes false and refuses true.
   void setExtensions(std::vector<mediaserver::Extension> extensions);
 
@@ -133,6 +135,7 @@ class Script {
   mutable std::mutex _mutex;
   mutable std::condition_variable _changed;
   mediaserver::PortPair _ports{};
+  bool _portsAreSeparate = false;
   std::array<std::vector<mediaserver::VideoFormat>, mediaserver::kPortCount> _formats;
   std::vector<mediaserver::Extension> _extensions;
   std::map<std::pair<Access, OMX_INDEXTYPE>, OMX_ERRORTYPE> _refused;
