@@ -19,7 +19,8 @@ install(TARGETS omxbridge omxhost EXPORT omxbridge
 install(DIRECTORY include/omxbridge DESTINATION ${CMAKE_INSTALL_INCLUDEDIR} COMPONENT development)
 install(DIRECTORY host/include/omxhost DESTINATION ${CMAKE_INSTALL_INCLUDEDIR} COMPONENT development
   PATTERN services.h EXCLUDE)
-install(DIRECTORY docs/ DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/libomxbridge-dev COMPONENT development)
+install(DIRECTORY docs/ DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/libomxbridge-dev COMPONENT development
+  PATTERN reference EXCLUDE)
 install(DIRECTORY examples DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/libomxbridge-dev COMPONENT development
   USE_SOURCE_PERMISSIONS)
 # Loaded at run time by the platform's port, which looks beside itself.
