@@ -1,9 +1,9 @@
-#pragma once
 // One buffer of a port: its header, the memory behind it and who holds it. The node's table owns it; the
 // worker keeps a second reference while its codec works on the memory, so a client that frees a buffer
 // which it does not hold harms nobody.
 // Threads: `holder`, `header`, `freed` and `unread` are guarded by the node's mutex, `incomplete` is atomic.
 // The memory belongs to whoever holds the buffer; pointers and sizes never change.
+#pragma once
 
 #include <atomic>
 #include <cstddef>

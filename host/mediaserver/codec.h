@@ -1,4 +1,3 @@
-#pragma once
 // What a component is behind its node: an encoder, a decoder, or a script of a test.
 //
 // The node does everything that all components have in common (states, ports, who holds which buffer,
@@ -7,6 +6,7 @@
 //    guards them with a lock of its own, never blocks in them, and picks changes up at its next send;
 //  - work, called on the node's worker thread only, one call at a time.
 // The node holds no lock during any call, so a codec may call its CodecHost from everywhere.
+#pragma once
 
 #include <array>
 #include <cstddef>

@@ -1,7 +1,7 @@
-#pragma once
 // One observer's messages: a queue and the thread that delivers it, strictly in the order of post.
 // post may be called under the caller's locks; the observer is called without any lock of ours and never
 // on the poster's thread. The channel does not keep the observer alive, except while it is called.
+#pragma once
 
 #include <functional>
 #include <memory>

@@ -1,4 +1,3 @@
-#pragma once
 // One instance of a component: OpenMAX IL 1.1 behaviour (states, ports, buffer ownership, events) around a
 // Codec. Every public operation may come from any thread, several at once; none calls the client, and
 // results are IL codes. Completions reach the client through the node's own delivery thread, in order.
@@ -28,6 +27,7 @@
 // _channel          create                          all             fixed, guards itself, takes no other lock
 // _id, _component,  constructor                     all             constant
 // _readingTime
+#pragma once
 
 #include <array>
 #include <chrono>

@@ -1,8 +1,8 @@
-#pragma once
 // One compressed video stream being decoded by libavcodec: buffers in, pictures out, in display order or in
 // the order of decoding (but for WMV, which libavcodec gives in display order alone). Interlaced pictures
 // come with both fields woven into one. Damaged data gives concealed pictures or none, and never an end. One
 // thread.
+#pragma once
 
 #include <cstddef>
 #include <cstdint>
