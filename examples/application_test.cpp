@@ -90,7 +90,8 @@ int main(int argc, char** argv) {
   void* encoder = nullptr;
   if ((probe.decoder = decoder_create(&result, nullptr)) != nullptr)
     encoder = encoder_create(&result, &settings);
-  if (encoder == nullptr) return std::fprintf(stderr, "no session: %s\n", resultDescription(result)), 1;
+  if (encoder == nullptr)
+    return std::fprintf(stderr, "no session, code %d: %s\n", result, resultDescription(result)), 1;
   omx_interface_register_output_callback(encoder, onCoded, &probe);
   omx_interface_register_output_callback(probe.decoder, onPicture, &probe);
   if (omx_interface_init(probe.decoder) != OMXI_OK || omx_interface_init(encoder) != OMXI_OK) return 1;

@@ -87,7 +87,8 @@ int main(int argc, char** argv) {
   decoder.file.open(argv[2], std::ios::binary);
   int result = OMXI_OK;
   void* const session = decoder_create(&result, nullptr);
-  if (session == nullptr) return std::fprintf(stderr, "no decoder: %s\n", resultDescription(result)), 1;
+  if (session == nullptr)
+    return std::fprintf(stderr, "no decoder, code %d: %s\n", result, resultDescription(result)), 1;
   omx_interface_register_input_callback(session, onInput, &decoder);
   omx_interface_register_output_callback(session, onPicture, &decoder);
   result = omx_interface_init(session);

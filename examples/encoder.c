@@ -84,7 +84,7 @@ int main(int argc, char** argv) {
   int result = OMXI_OK;
   void* session = encoder_create(&result, &settings);
   if (session == NULL) {
-    fprintf(stderr, "no encoder: %s\n", resultDescription(result));
+    fprintf(stderr, "no encoder, code %d: %s\n", result, resultDescription(result));
     return 1;
   }
   omx_interface_register_input_callback(session, onInput, &encoder);

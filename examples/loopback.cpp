@@ -90,7 +90,8 @@ int main() {
   int result = OMXI_OK;
   if ((call.decoder = decoder_create(&result, nullptr)) != nullptr)
     call.encoder = encoder_create(&result, &settings);
-  if (call.encoder == nullptr) return std::fprintf(stderr, "no session: %s\n", resultDescription(result)), 1;
+  if (call.encoder == nullptr)
+    return std::fprintf(stderr, "no session, code %d: %s\n", result, resultDescription(result)), 1;
   omx_interface_register_input_callback(call.encoder, onInput, &call.encoding);
   omx_interface_register_output_callback(call.encoder, onCoded, &call);
   omx_interface_register_input_callback(call.decoder, onInput, &call.decoding);

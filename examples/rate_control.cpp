@@ -70,7 +70,8 @@ int main() {
   Stream stream;
   int result = OMXI_OK;
   void* const session = encoder_create(&result, &settings);
-  if (session == nullptr) return std::fprintf(stderr, "no encoder: %s\n", resultDescription(result)), 1;
+  if (session == nullptr)
+    return std::fprintf(stderr, "no encoder, code %d: %s\n", result, resultDescription(result)), 1;
   omx_interface_register_output_callback(session, onOutput, &stream);
   result = omx_interface_init(session);
   std::vector<unsigned char> frame(kWidth * kHeight * 3 / 2);

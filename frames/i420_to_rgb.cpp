@@ -21,7 +21,6 @@ struct Rows {
   std::ptrdiff_t first, second, pair;
 };
 
-// Unsigned until here: these are also formed for sizes that turn out to be refused.
 std::ptrdiff_t offset(std::size_t bytes) {
   return static_cast<std::ptrdiff_t>(bytes);
 }
@@ -52,10 +51,8 @@ Chroma semiPlanar(unsigned width, unsigned height) {
   return {planeArea(width, height), planeArea(width, height) + 1, 2};
 }
 
-// result: of checkedBytes; a refusal is passed on.
-int convert(int result, RowPairToRgb kernel, const std::uint8_t* src, Chroma chroma, unsigned width,
-            unsigned height, std::uint8_t* dst, Rows rows) {
-  if (result == kRefused) return kRefused;
+void walk(RowPairToRgb kernel, const std::uint8_t* src, Chroma chroma, unsigned width, unsigned height,
+          std::uint8_t* dst, Rows rows) {
   const std::size_t pairs = width / 2;
   for (std::size_t p = 0; p < height / 2; ++p) {
     // Kept: a pair of rows takes the even part of the width and the width, so pictures of odd width lean by
@@ -65,6 +62,35 @@ int convert(int result, RowPairToRgb kernel, const std::uint8_t* src, Chroma chr
     std::uint8_t* to = dst + rows.first + static_cast<std::ptrdiff_t>(p) * rows.pair;
     kernel(y, y + width, src + chroma.u + sample, src + chroma.v + sample, to, to + rows.second, pairs);
   }
+}
+
+struct Pixels {
+  RowPairToRgb kernel;
+  unsigned bytes;  // of each
+};
+
+enum class Order { kTopDown, kBottomUp };
+
+using ChromaOf = Chroma (*)(unsigned width, unsigned height);
+
+// The conversions whose rows are a stride apart.
+int convert(Pixels pixels, Order order, ChromaOf chroma, const std::uint8_t* src, std::uint8_t* dst,
+            unsigned width, unsigned height, unsigned stride) {
+  const int result = checkedBytes(width, height, stride, pixels.bytes);
+  if (result == kRefused) return kRefused;
+  const std::size_t pitch = std::size_t{stride} * pixels.bytes;
+  walk(pixels.kernel, src, chroma(width, height), width, height, dst,
+       order == Order::kTopDown ? topDown(pitch) : bottomUp(pitch, height));
+  return result;
+}
+
+// Kept: the stride of the two 1555 functions counts in checks and result, the rows are as wide as the
+// picture.
+int convertTo1555(Order order, const std::uint8_t* src, std::uint8_t* dst, unsigned width, unsigned height,
+                  unsigned stride) {
+  const int result = checkedBytes(width, height, stride, 2);
+  if (result == kRefused) return kRefused;
+  convert({yuvToRgbKernels().argb1555, 2}, order, planar, src, dst, width, height, kNoStride);
   return result;
 }
 
@@ -72,78 +98,58 @@ int convert(int result, RowPairToRgb kernel, const std::uint8_t* src, Chroma chr
 
 int ConvertI420ToRGB24(const unsigned char* src, unsigned char* dst, unsigned int width,
                        unsigned int height) {
-  unsigned stride = kNoStride;
-  const int result = checkedBytes(width, height, stride, 3);
-  return convert(result, yuvToRgbKernels().bgr24, src, planar(width, height), width, height, dst,
-                 bottomUp(std::size_t{stride} * 3, height));
+  return convert({yuvToRgbKernels().bgr24, 3}, Order::kBottomUp, planar, src, dst, width, height, kNoStride);
 }
 
 int ConvertI420ToRGB24_EX(const unsigned char* src, unsigned char* dst, unsigned int width,
                           unsigned int height) {
-  unsigned stride = kNoStride;
-  const int result = checkedBytes(width, height, stride, 3);
-  return convert(result, yuvToRgbKernels().bgr24, src, planar(width, height), width, height, dst,
-                 topDown(std::size_t{stride} * 3));
+  return convert({yuvToRgbKernels().bgr24, 3}, Order::kTopDown, planar, src, dst, width, height, kNoStride);
 }
 
 int ConvertI420ToARGB(const unsigned char* src, unsigned char* dst, unsigned int width, unsigned int height,
                       unsigned int stride) {
-  const int result = checkedBytes(width, height, stride, 4);
-  return convert(result, yuvToRgbKernels().bgra, src, planar(width, height), width, height, dst,
-                 topDown(std::size_t{stride} * 4));
+  return convert({yuvToRgbKernels().bgra, 4}, Order::kTopDown, planar, src, dst, width, height, stride);
 }
 
 int ConvertI420ToARGBMac(const unsigned char* src, unsigned char* dst, unsigned int width,
                          unsigned int height, unsigned int stride) {
-  const int result = checkedBytes(width, height, stride, 4);
-  return convert(result, yuvToRgbKernels().bgra, src, exchanged(width, height), width, height, dst,
-                 topDown(std::size_t{stride} * 4));
+  return convert({yuvToRgbKernels().bgra, 4}, Order::kTopDown, exchanged, src, dst, width, height, stride);
 }
 
 int ConvertI420ToRGBAMac(const unsigned char* src, unsigned char* dst, unsigned int width,
                          unsigned int height, unsigned int stride) {
-  const int result = checkedBytes(width, height, stride, 4);
-  return convert(result, yuvToRgbKernels().argb, src, exchanged(width, height), width, height, dst,
-                 topDown(std::size_t{stride} * 4));
+  return convert({yuvToRgbKernels().argb, 4}, Order::kTopDown, exchanged, src, dst, width, height, stride);
 }
 
 int ConvertI420ToRGBAIPhone(const unsigned char* src, unsigned char* dst, unsigned int width,
                             unsigned int height, unsigned int stride) {
-  const int result = checkedBytes(width, height, stride, 4);
-  return convert(result, yuvToRgbKernels().rgba, src, planar(width, height), width, height, dst,
-                 bottomUp(std::size_t{stride} * 4, height));
+  return convert({yuvToRgbKernels().rgba, 4}, Order::kBottomUp, planar, src, dst, width, height, stride);
 }
 
 int ConvertI420ToARGB4444(const unsigned char* src, unsigned char* dst, unsigned int width,
                           unsigned int height, unsigned int stride) {
-  const int result = checkedBytes(width, height, stride, 2);
-  return convert(result, yuvToRgbKernels().argb4444, src, planar(width, height), width, height, dst,
-                 bottomUp(std::size_t{stride} * 2, height));
+  return convert({yuvToRgbKernels().argb4444, 2}, Order::kBottomUp, planar, src, dst, width, height, stride);
 }
 
 int ConvertI420ToARGB4444_EX(const unsigned char* src, unsigned char* dst, unsigned int width,
                              unsigned int height, unsigned int stride) {
   const int result = checkedBytes(width, height, stride, 2);
+  if (result == kRefused) return kRefused;
   // Kept: only the second row of a pair is a stride away, the next pair a stride and a width.
   const std::size_t second = std::size_t{stride} * 2;
-  return convert(result, yuvToRgbKernels().argb4444, src, planar(width, height), width, height, dst,
-                 {0, offset(second), offset(second + std::size_t{width} * 2)});
+  walk(yuvToRgbKernels().argb4444, src, planar(width, height), width, height, dst,
+       {0, offset(second), offset(second + std::size_t{width} * 2)});
+  return result;
 }
 
 int ConvertI420ToRGB565(const unsigned char* src, unsigned char* dst, unsigned int width,
                         unsigned int height) {
-  unsigned stride = kNoStride;
-  const int result = checkedBytes(width, height, stride, 2);
-  return convert(result, yuvToRgbKernels().rgb565, src, planar(width, height), width, height, dst,
-                 bottomUp(std::size_t{stride} * 2, height));
+  return convert({yuvToRgbKernels().rgb565, 2}, Order::kBottomUp, planar, src, dst, width, height, kNoStride);
 }
 
 int ConvertI420ToRGB565_EX(const unsigned char* src, unsigned char* dst, unsigned int width,
                            unsigned int height) {
-  unsigned stride = kNoStride;
-  const int result = checkedBytes(width, height, stride, 2);
-  return convert(result, yuvToRgbKernels().rgb565, src, planar(width, height), width, height, dst,
-                 topDown(std::size_t{stride} * 2));
+  return convert({yuvToRgbKernels().rgb565, 2}, Order::kTopDown, planar, src, dst, width, height, kNoStride);
 }
 
 int ConvertI420ToRGB565Android(const unsigned char* src, unsigned char* dst, unsigned int width,
@@ -151,28 +157,20 @@ int ConvertI420ToRGB565Android(const unsigned char* src, unsigned char* dst, uns
   return ConvertI420ToRGB565_EX(src, dst, width, height);
 }
 
-// Kept: the stride of the two 1555 functions counts in checks and result, the rows are as wide as the
-// picture.
 int ConvertI420ToARGB1555(const unsigned char* src, unsigned char* dst, unsigned int width,
                           unsigned int height, unsigned int stride) {
-  const int result = checkedBytes(width, height, stride, 2);
-  return convert(result, yuvToRgbKernels().argb1555, src, planar(width, height), width, height, dst,
-                 bottomUp(std::size_t{width} * 2, height));
+  return convertTo1555(Order::kBottomUp, src, dst, width, height, stride);
 }
 
 int ConvertI420ToARGB1555_EX(const unsigned char* src, unsigned char* dst, unsigned int width,
                              unsigned int height, unsigned int stride) {
-  const int result = checkedBytes(width, height, stride, 2);
-  return convert(result, yuvToRgbKernels().argb1555, src, planar(width, height), width, height, dst,
-                 topDown(std::size_t{width} * 2));
+  return convertTo1555(Order::kTopDown, src, dst, width, height, stride);
 }
 
 int ConvertNV12ToRGB565(const unsigned char* src, unsigned char* dst, unsigned int width,
                         unsigned int height) {
-  unsigned stride = kNoStride;
-  const int result = checkedBytes(width, height, stride, 2);
-  return convert(result, yuvToRgbKernels().semiPlanarRgb565, src, semiPlanar(width, height), width, height,
-                 dst, bottomUp(std::size_t{stride} * 2, height));
+  return convert({yuvToRgbKernels().semiPlanarRgb565, 2}, Order::kBottomUp, semiPlanar, src, dst, width,
+                 height, kNoStride);
 }
 
 int ConvertRGB24ToARGB(const unsigned char* src, unsigned char* dst, unsigned int width, unsigned int height,

@@ -1,5 +1,9 @@
-# The Debian packages that each step needs; read by ./call, ./check and .ci/run.
+# shellcheck shell=sh disable=SC2034
+# The Debian packages that each step needs; read by ./call, ./check, .ci/run and the other scripts.
 BUILD_PACKAGES="cmake g++ ninja-build pkg-config libavcodec-dev libavformat-dev libavutil-dev libcli11-dev libhwy-dev libpng-dev libswscale-dev nlohmann-json3-dev"
 TEST_PACKAGES="$BUILD_PACKAGES binutils libgtest-dev"
-CI_PACKAGES="$TEST_PACKAGES clang-14 clang-format-14 libclang-rt-14-dev"
+PACKAGE_PACKAGES="dpkg-dev file"
+REFERENCE_PACKAGES="doxygen"
+FUZZ_PACKAGES="clang-14 libclang-rt-14-dev"
+CI_PACKAGES="$TEST_PACKAGES $PACKAGE_PACKAGES $REFERENCE_PACKAGES $FUZZ_PACKAGES clang-format-14"
 FRAMES_BENCH_PACKAGES="libavfilter-dev libopencv-imgproc-dev libswscale-dev"

@@ -51,6 +51,17 @@ FILE* summaryFile(bool videoOnStandardOutput) {
   return videoOnStandardOutput ? stderr : stdout;
 }
 
+// Prints what came of a command to `out`, and passes on that the input broke off.
+template <typename Report, typename Json, typename Summary>
+Outcome conclude(const Result<Report>& report, FILE* out, const Options& options, const Interrupt& interrupt,
+                 Json json, Summary summary) {
+  if (!report.ok()) return report.failure();
+  const std::string text =
+      options.json ? json(report.value(), interrupt.requested()) : summary(report.value());
+  if (auto failure = print(out, text)) return failure;
+  return report.value().inputFailure;
+}
+
 Outcome call(const Options& options, const Interrupt& interrupt, std::stop_source& enough) {
   const CallSettings& settings = options.call;
   FILE* const out =
@@ -64,60 +75,40 @@ Outcome call(const Options& options, const Interrupt& interrupt, std::stop_sourc
       return failure;
     }
   }
-  const auto report = runCall(settings, *source.value(), enough);
-  if (!report.ok()) return report.failure();
   WrittenFiles files;
   if (!settings.streamPath.empty()) files.emplace_back("Stream in", settings.streamPath);
   if (!settings.picturesPath.empty()) files.emplace_back("Pictures in", settings.picturesPath);
   for (const SnapshotRequest& snapshot : settings.snapshots) files.emplace_back("Snapshot in", snapshot.path);
   if (!settings.reportPath.empty()) files.emplace_back("Report in", settings.reportPath);
-  if (auto failure = print(out, options.json ? callJson(report.value(), interrupt.requested())
-                                             : callSummary(report.value(), files))) {
-    return failure;
-  }
-  return report.value().inputFailure;
+  return conclude(runCall(settings, *source.value(), enough), out, options, interrupt, callJson,
+                  [&files](const CallReport& report) { return callSummary(report, files); });
 }
 
 Outcome decode(const Options& options, const Interrupt& interrupt, std::stop_source& enough) {
   const auto stream = openAccessUnits(options.decodeInput, enough.get_token());
   if (!stream.ok()) return stream.failure();
-  const auto report = runDecode(options.decode, *stream.value(), enough);
-  if (!report.ok()) return report.failure();
   const std::string& path = options.decode.picturesPath;
-  if (auto failure = print(summaryFile(isStandardOutput(path)),
-                           options.json ? decodeJson(report.value(), interrupt.requested())
-                                        : decodeSummary(report.value(), path))) {
-    return failure;
-  }
-  return report.value().inputFailure;
+  return conclude(runDecode(options.decode, *stream.value(), enough), summaryFile(isStandardOutput(path)),
+                  options, interrupt, decodeJson,
+                  [&path](const DecodeReport& report) { return decodeSummary(report, path); });
 }
 
 Outcome encode(const Options& options, const Interrupt& interrupt, std::stop_source& enough) {
   const auto source = openFrameSource(options.source, enough.get_token());
   if (!source.ok()) return source.failure();
-  const auto report = runEncode(options.encode, *source.value(), enough);
-  if (!report.ok()) return report.failure();
   const std::string& path = options.encode.path;
-  if (auto failure = print(summaryFile(isStandardOutput(path)),
-                           options.json ? encodeJson(report.value(), interrupt.requested())
-                                        : encodeSummary(report.value(), path))) {
-    return failure;
-  }
-  return report.value().inputFailure;
+  return conclude(runEncode(options.encode, *source.value(), enough), summaryFile(isStandardOutput(path)),
+                  options, interrupt, encodeJson,
+                  [&path](const EncodeReport& report) { return encodeSummary(report, path); });
 }
 
 Outcome convert(const Options& options, const Interrupt& interrupt, std::stop_source& enough) {
   const auto source = openFrameSource(options.source, enough.get_token());
   if (!source.ok()) return source.failure();
-  const auto report = runConvert(options.convert, *source.value(), enough);
-  if (!report.ok()) return report.failure();
   const std::string& path = options.convert.path;
-  if (auto failure = print(summaryFile(isStandardOutput(path)),
-                           options.json ? convertJson(report.value(), interrupt.requested())
-                                        : convertSummary(report.value(), path))) {
-    return failure;
-  }
-  return report.value().inputFailure;
+  return conclude(runConvert(options.convert, *source.value(), enough), summaryFile(isStandardOutput(path)),
+                  options, interrupt, convertJson,
+                  [&path](const ConvertReport& report) { return convertSummary(report, path); });
 }
 
 Outcome compare(const Options& options, const Interrupt& interrupt, std::stop_source& enough) {
@@ -125,13 +116,9 @@ Outcome compare(const Options& options, const Interrupt& interrupt, std::stop_so
   if (!one.ok()) return one.failure();
   const auto other = openFrameSource(options.secondSource, enough.get_token());
   if (!other.ok()) return other.failure();
-  const auto report = runCompare(*one.value(), *other.value(), enough);
-  if (!report.ok()) return report.failure();
-  if (auto failure = print(stdout, options.json ? compareJson(report.value(), interrupt.requested())
-                                                : compareSummary(report.value(), options.perPicture))) {
-    return failure;
-  }
-  return report.value().inputFailure;
+  return conclude(
+      runCompare(*one.value(), *other.value(), enough), stdout, options, interrupt, compareJson,
+      [&options](const CompareReport& report) { return compareSummary(report, options.perPicture); });
 }
 
 Outcome run(const Options& options, const Interrupt& interrupt) {

@@ -2,6 +2,10 @@
 
 #include <stdexcept>
 
+#include <omxhost/device.h>
+
+#include "host/mediaserver/components/picture_layout.h"
+
 extern "C" {
 #include <libavcodec/avcodec.h>
 #include <libavutil/opt.h>
@@ -93,6 +97,19 @@ void DirectDecoder::decode(const Unit& unit) {
   const bool sent = avcodec_send_packet(_context.get(), _packet.get()) >= 0;
   av_packet_unref(_packet.get());
   require(sent && avcodec_receive_frame(_context.get(), _frame.get()) >= 0, "no picture for a unit");
+}
+
+void DirectDecoder::decodeForDevice(const Unit& unit) {
+  decode(unit);
+  const AVFrame& picture = *_frame;
+  const mediaserver::PlanarView view{{picture.data[0], picture.data[1], picture.data[2]},
+                                     {picture.linesize[0], picture.linesize[1], picture.linesize[2]},
+                                     static_cast<uint32_t>(picture.width),
+                                     static_cast<uint32_t>(picture.height)};
+  const mediaserver::OutputGeometry geometry =
+      mediaserver::outputGeometry(omxhost::posedDevice().components.decoderOutput, view.width, view.height);
+  _laidOut.resize(geometry.bytes);
+  mediaserver::writePicture(geometry, view, _laidOut.data());
 }
 
 }  // namespace bench

@@ -45,11 +45,14 @@ class DirectDecoder {
 
   // Decodes one unit to one picture, which stays in the decoder's own memory.
   void decode(const Unit& unit);
+  // And writes it into memory of this object, in the layout in which the posed device delivers.
+  void decodeForDevice(const Unit& unit);
 
  private:
   const std::unique_ptr<AVCodecContext, AvDeleter> _context;
   const std::unique_ptr<AVFrame, AvDeleter> _frame;
   const std::unique_ptr<AVPacket, AvDeleter> _packet;
+  Frame _laidOut;
 };
 
 }  // namespace bench

@@ -140,9 +140,11 @@ void measureSize(const char* device, tool::Size size) {
   }
   DirectDecoder direct;
   BridgeCodec bridge = BridgeCodec::decoder(nullptr);
-  const Cost cost =
-      measure({[&](size_t i) { direct.decode(units[i]); }, [&](size_t i) { bridge.send(units[i]); }, bridge});
-  print(device, "decode", size, cost);
+  const auto sendToBridge = [&](size_t i) { bridge.send(units[i]); };
+  print(device, "decode", size,
+        measure({[&](size_t i) { direct.decodeForDevice(units[i]); }, sendToBridge, bridge}));
+  print(device, "decode, left planar", size,
+        measure({[&](size_t i) { direct.decode(units[i]); }, sendToBridge, bridge}));
 }
 
 int measureDevice(const char* device) {

@@ -2,6 +2,7 @@
 
 #include <atomic>
 
+#include <omxhost/faults.h>
 #include <utils/RefBase.h>
 
 namespace android {
@@ -12,11 +13,14 @@ namespace {
 // be promoted before the first strong one exists, while 0 always means: gone.
 constexpr int32_t kNeverHeld = 1 << 28;
 
+std::atomic<int64_t> counted{0};
+
 }  // namespace
 
 class RefBase::Counts : public RefBase::weakref_type {
  public:
-  explicit Counts(RefBase* owner) : object(owner) {}
+  explicit Counts(RefBase* owner) : object(owner) { counted.fetch_add(1, std::memory_order_relaxed); }
+  ~Counts() { counted.fetch_sub(1, std::memory_order_relaxed); }
 
   void countFirst() {
     strong.fetch_sub(kNeverHeld, std::memory_order_relaxed);
@@ -93,3 +97,7 @@ void RefBase::onFirstRef() {}
 void RefBase::onLastStrongRef(const void* /*id*/) {}
 
 }  // namespace android
+
+int64_t omxhost::liveObjects() {
+  return android::counted.load(std::memory_order_relaxed);
+}

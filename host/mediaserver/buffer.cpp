@@ -67,10 +67,4 @@ void Buffer::copyIn(size_t offset, size_t length) {
   std::memcpy(data() + offset, _backup + offset, length);
 }
 
-void Buffer::copyOut(size_t offset, size_t length) {
-  if (_backup == nullptr || offset >= capacity()) return;
-  length = std::min(length, capacity() - offset);
-  if (length > 0) std::memcpy(_backup + offset, data() + offset, length);
-}
-
 }  // namespace mediaserver

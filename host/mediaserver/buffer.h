@@ -1,10 +1,11 @@
-#pragma once
 // One buffer of a port: its header, the memory behind it and who holds it. The node's table owns it; the
 // worker keeps a second reference while its codec works on the memory, so a client that frees a buffer
 // which it does not hold harms nobody.
-// Threads: `holder`, `header`, `freed` and `unread` are guarded by the node's mutex. The memory belongs to
-// whoever holds the buffer; pointers and sizes never change.
+// Threads: `holder`, `header`, `freed` and `unread` are guarded by the node's mutex, `incomplete` is atomic.
+// The memory belongs to whoever holds the buffer; pointers and sizes never change.
+#pragma once
 
+#include <atomic>
 #include <cstddef>
 #include <cstdint>
 #include <memory>
@@ -29,8 +30,8 @@ class Buffer {
  public:
   // Works on the client's block directly. Null when there is no block or no memory behind it.
   static std::shared_ptr<Buffer> onBlock(const android::sp<android::IMemory>& block);
-  // Memory of its own, as large as the client's block, and copied to and from it. Null as above, or when
-  // memory is short.
+  // Memory of its own, as large as the client's block, and copied from it. Null as above, or when memory is
+  // short.
   static std::shared_ptr<Buffer> withBackup(const android::sp<android::IMemory>& block);
   // Memory of its own. Null when memory is short.
   static std::shared_ptr<Buffer> own(size_t size);
@@ -40,16 +41,17 @@ class Buffer {
   // True when `length` bytes from `offset` lie inside the buffer.
   bool contains(size_t offset, size_t length) const;
 
-  // Copy a range between the client's block and the own memory; nothing without a backup, and never more
-  // than the buffer has. The caller holds the buffer, and no lock.
+  // Copies a range of the client's block into the own memory; nothing without a backup, and never more than
+  // the buffer has. The caller holds the buffer, and no lock.
   void copyIn(size_t offset, size_t length);
-  void copyOut(size_t offset, size_t length);
 
   OMX_BUFFERHEADERTYPE header{};
   android::IOMX::buffer_id id = nullptr;
   Holder holder = Holder::Client;
   bool freed = false;   // no longer in its port's table
   bool unread = false;  // came back to the client with output, and has not been sent again
+  // On its way back to the client, and yet to be written: nobody may send it.
+  std::atomic<bool> incomplete{false};
 
  private:
   struct Release {

@@ -1,4 +1,3 @@
-#pragma once
 // What a component is behind its node: an encoder, a decoder, or a script of a test.
 //
 // The node does everything that all components have in common (states, ports, who holds which buffer,
@@ -7,6 +6,7 @@
 //    guards them with a lock of its own, never blocks in them, and picks changes up at its next send;
 //  - work, called on the node's worker thread only, one call at a time.
 // The node holds no lock during any call, so a codec may call its CodecHost from everywhere.
+#pragma once
 
 #include <array>
 #include <cstddef>
@@ -52,7 +52,8 @@ struct InputView {
   OMX_U32 flags;
 };
 
-// An empty output buffer, and what the codec made of it. The memory is borrowed for the call.
+// An empty output buffer, and what the codec made of it. The memory is borrowed for the call, and until
+// `complete` has run.
 struct OutputSpace {
   uint8_t* data;
   size_t capacity;  // bytes
@@ -60,6 +61,9 @@ struct OutputSpace {
   OMX_U32 length = 0;
   OMX_U32 flags = 0;
   OMX_TICKS timestamp = 0;
+  // What is left to be written, if anything. It runs on the delivery thread just before the client hears of
+  // the buffer, and perhaps never: the codec goes on meanwhile, and may even be gone.
+  std::function<void()> complete = nullptr;
 };
 
 enum class Sent {

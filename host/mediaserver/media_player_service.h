@@ -1,6 +1,6 @@
-#pragma once
 // The service "media.player": the way to the media server's IOMX.
 // Any thread may call it. Keeps the IOMX alive; a null one is handed out as such.
+#pragma once
 
 #include <media/IMediaPlayerService.h>
 #include <media/IOMX.h>

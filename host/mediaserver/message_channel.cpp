@@ -16,7 +16,11 @@ thread_local const MessageChannel* tDelivering = nullptr;
 struct MessageChannel::Queue {
   std::mutex mutex;
   std::condition_variable changed;
-  std::deque<android::omx_message> messages;
+  struct Entry {
+    android::omx_message message;
+    std::function<void()> before;
+  };
+  std::deque<Entry> messages;
   bool closed = false;
 };
 
@@ -53,12 +57,14 @@ bool MessageChannel::open() {
   return true;
 }
 
-void MessageChannel::post(const android::omx_message& message) {
+void MessageChannel::post(const android::omx_message& message, std::function<void()> before) {
   std::lock_guard<std::mutex> lock(_mutex);
   if (_queue == nullptr) return;
-  std::lock_guard<std::mutex> queueLock(_queue->mutex);
-  _queue->messages.push_back(message);
-  _queue->changed.notify_one();
+  {
+    std::lock_guard<std::mutex> queueLock(_queue->mutex);
+    _queue->messages.push_back({message, std::move(before)});
+  }
+  _queue->changed.notify_one();  // outside, so that the thread that wakes need not wait for the lock
 }
 
 void MessageChannel::close() {
@@ -89,13 +95,14 @@ void MessageChannel::deliver(const MessageChannel* channel, std::shared_ptr<Queu
   for (;;) {
     queue->changed.wait(lock, [&] { return queue->closed || !queue->messages.empty(); });
     if (queue->closed) return;
-    const android::omx_message message = queue->messages.front();
+    const Queue::Entry entry = std::move(queue->messages.front());
     queue->messages.pop_front();
     lock.unlock();
+    if (entry.before) entry.before();
     {
       // It may be the last one that holds the observer by then, and the end of the block that of the channel.
       const android::sp<android::IOMXObserver> client = observer.promote();
-      if (client != nullptr) client->onMessage(message);
+      if (client != nullptr) client->onMessage(entry.message);
     }
     lock.lock();
   }

@@ -1,8 +1,9 @@
-#pragma once
 // One observer's messages: a queue and the thread that delivers it, strictly in the order of post.
 // post may be called under the caller's locks; the observer is called without any lock of ours and never
 // on the poster's thread. The channel does not keep the observer alive, except while it is called.
+#pragma once
 
+#include <functional>
 #include <memory>
 #include <mutex>
 #include <thread>
@@ -22,8 +23,9 @@ class MessageChannel {
   // Starts the delivery thread, or does nothing when it runs. False when the system has no thread left.
   [[nodiscard]] bool open();
 
-  // Queues a message; drops it unless the channel is open.
-  void post(const android::omx_message& message);
+  // Queues a message; drops it unless the channel is open. `before`, if there is one, runs on the delivery
+  // thread before the message is delivered.
+  void post(const android::omx_message& message, std::function<void()> before = nullptr);
 
   // Drops what waits and returns when no delivery is in progress; nothing is delivered from then on until
   // the channel is opened again. Called from inside a delivery, it does not wait for that one.

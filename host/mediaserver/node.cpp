@@ -136,9 +136,18 @@ void Node::event(OMX_EVENTTYPE kind, OMX_U32 data1, OMX_U32 data2) {
   _channel.post(eventMessage(_id, kind, data1, data2));
 }
 
-void Node::giveBack(OMX_U32 port, const std::shared_ptr<Buffer>& buffer) {
+void Node::giveBack(OMX_U32 port, const std::shared_ptr<Buffer>& buffer, std::function<void()> complete) {
   buffer->holder = Holder::Client;
-  if (!buffer->freed) _channel.post(bufferMessage(_id, port, *buffer));
+  if (buffer->freed) return;
+  std::function<void()> before;
+  if (complete) {
+    buffer->incomplete = true;
+    before = [buffer, complete = std::move(complete)] {
+      complete();
+      buffer->incomplete = false;
+    };
+  }
+  _channel.post(bufferMessage(_id, port, *buffer), std::move(before));
 }
 
 void Node::giveBackAll(OMX_U32 port) {

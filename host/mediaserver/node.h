@@ -1,4 +1,3 @@
-#pragma once
 // One instance of a component: OpenMAX IL 1.1 behaviour (states, ports, buffer ownership, events) around a
 // Codec. Every public operation may come from any thread, several at once; none calls the client, and
 // results are IL codes. Completions reach the client through the node's own delivery thread, in order.
@@ -28,6 +27,7 @@
 // _channel          create                          all             fixed, guards itself, takes no other lock
 // _id, _component,  constructor                     all             constant
 // _readingTime
+#pragma once
 
 #include <array>
 #include <chrono>
@@ -112,7 +112,8 @@ class Node final : private CodecHost {
   void event(OMX_EVENTTYPE event, OMX_U32 data1, OMX_U32 data2);
   void error(OMX_ERRORTYPE code) { event(OMX_EventError, static_cast<OMX_U32>(code), 0); }
   void completed(OMX_COMMANDTYPE command, OMX_U32 data) { event(OMX_EventCmdComplete, command, data); }
-  void giveBack(OMX_U32 port, const std::shared_ptr<Buffer>& buffer);
+  void giveBack(OMX_U32 port, const std::shared_ptr<Buffer>& buffer,
+                std::function<void()> complete = nullptr);
   void giveBackAll(OMX_U32 port);
   PortPair definitions() const;
 
@@ -149,7 +150,7 @@ class Node final : private CodecHost {
   bool announce();
   bool receiveOutput(Lock& lock);
   bool sendInput(Lock& lock);
-  void finishOutput(const std::shared_ptr<Buffer>& buffer, const OutputSpace& space);
+  void finishOutput(const std::shared_ptr<Buffer>& buffer, OutputSpace space);
   void endAnnouncement(Settings next);
   void pause(Lock& lock);
   bool readersAreDone();

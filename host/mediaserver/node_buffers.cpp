@@ -75,7 +75,7 @@ OMX_ERRORTYPE Node::claim(OMX_U32 index, BufferId id, std::shared_ptr<Buffer>* b
   }
   if (_state != OMX_StateExecuting && _state != OMX_StatePause) return OMX_ErrorIncorrectStateOperation;
   if (!port.enabled() || port.commands > 0) return OMX_ErrorIncorrectStateOperation;
-  if ((*buffer)->holder != Holder::Client) return OMX_ErrorIncorrectStateOperation;
+  if ((*buffer)->holder != Holder::Client || (*buffer)->incomplete) return OMX_ErrorIncorrectStateOperation;
   return OMX_ErrorNone;
 }
 

@@ -62,19 +62,18 @@ bool Node::receiveOutput(Lock& lock) {
   OutputSpace space{buffer->data(), buffer->capacity()};
   lock.unlock();
   const Received received = _codec->receive(space);
-  if (received == Received::Filled) buffer->copyOut(space.offset, space.length);
   lock.lock();
 
   switch (received) {
     case Received::Filled:
-      finishOutput(buffer, space);
+      finishOutput(buffer, std::move(space));
       return true;
     case Received::Drained:
       if (_draining) {
         OutputSpace end{buffer->data(), buffer->capacity()};
         end.flags = OMX_BUFFERFLAG_EOS;
         end.timestamp = _drainTime;
-        finishOutput(buffer, end);
+        finishOutput(buffer, std::move(end));
         return true;
       }
       break;
@@ -116,7 +115,7 @@ bool Node::changeGeometry(Lock& lock) {
   return true;
 }
 
-void Node::finishOutput(const std::shared_ptr<Buffer>& buffer, const OutputSpace& space) {
+void Node::finishOutput(const std::shared_ptr<Buffer>& buffer, OutputSpace space) {
   buffer->header.nOffset = space.offset;
   buffer->header.nFilledLen = space.length;
   buffer->header.nFlags = space.flags;
@@ -128,7 +127,7 @@ void Node::finishOutput(const std::shared_ptr<Buffer>& buffer, const OutputSpace
     // Before the buffer, which clients may take for the last they hear.
     event(OMX_EventBufferFlag, kOutputPort, space.flags);
   }
-  giveBack(kOutputPort, buffer);
+  giveBack(kOutputPort, buffer, std::move(space.complete));
 }
 
 bool Node::sendInput(Lock& lock) {

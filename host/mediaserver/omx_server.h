@@ -1,10 +1,10 @@
-#pragma once
 // The IOMX of this media server: the list of components and the table of nodes. Finds a call's node by its
 // id, checks arguments, and turns the node's IL results into statuses.
 // Any thread may call it, several at once. A call keeps its node alive until it returns, also when the
 // node is freed meanwhile. No lock is held while a node or a client is called. Ids are numbers: one that is
 // unknown or out of date gives UNKNOWN_ERROR, as every misuse does. A client whose observer dies has gone
 // away without freeing its nodes, and they are freed for it.
+#pragma once
 
 #include <chrono>
 #include <cstdint>

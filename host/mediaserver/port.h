@@ -1,6 +1,6 @@
-#pragma once
 // One port of a node: its definition, its buffers, those of them that wait with the node, and the enable
 // or disable in progress. Plain data with the rules that concern a single port; guarded by the node's mutex.
+#pragma once
 
 #include <deque>
 #include <memory>

@@ -3,7 +3,6 @@
 #include <gtest/gtest.h>
 
 #include <cstring>
-#include <functional>
 
 #include "core/omx_interface.h"
 #include "omxbridge/omxbridge.h"
@@ -32,6 +31,10 @@ struct Generation {
   unsigned int frameBytes;  // of an encoder's input
   bool native;              // delivers pictures as the component made them
 };
+
+void PrintTo(const Generation& generation, std::ostream* stream) {
+  *stream << generation.device;
+}
 
 class GenerationTest : public ::testing::TestWithParam<Generation> {};
 
@@ -68,81 +71,54 @@ INSTANTIATE_TEST_SUITE_P(Devices, GenerationTest,
                                            Generation{"msm-unknown", 1920, 1088, 38016, true},
                                            Generation{"omap4", 1920, 1088, 38016, false}));
 
-// What is missing or refused, and what is said of it in front of the last line.
+// What is missing or refused.
+enum class Missing { Nothing, Server, Omx, Settings };
+
 struct Failure {
+  const char* device;
   bool encoder;
-  std::function<void(RecordingOmx& omx, ScriptedMediaServer& server)> arrange;
+  Missing missing;
   int code;
-  LogLines lines;
-  bool noSettings = false;
+  std::string line;  // in front of the last ones; empty: none
 };
 
-void expectReportedAndNothingLeft(const char* device, const std::vector<Failure>& failures) {
-  for (const Failure& failure : failures) {
-    SCOPED_TRACE(failure.code);
-    const omxhost::LogCapture log;
-    ScriptedMediaServer server(device);
-    failure.arrange(server.omx(), server);
-    int result = -77;
-    webrtc::VideoCodec codec = settings();
-    void* const session = failure.encoder ? encoder_create(&result, failure.noSettings ? nullptr : &codec)
-                                          : decoder_create(&result, nullptr);
-    EXPECT_EQ(session, nullptr);
-    EXPECT_EQ(result, failure.code);
-    LogLines lines;
-    if (failure.encoder) {
-      lines.push_back(std::string("4/zol-video enter hardCodec encoder_create: build time:") +
-                      g_strPrgCreatTime + " ");
-    }
-    for (const std::string& line : failure.lines) lines.push_back("E " + line);
-    lines.push_back(std::string("E OMXINTERFACE - ERROR creating ") +
-                    (failure.encoder ? "encoder: " : "decoder: ") + std::to_string(failure.code) + " (" +
-                    resultDescription(failure.code) + ")");
-    EXPECT_EQ(logLines(log), lines);
-    EXPECT_EQ(server.leaks(), "");
+class FailureTest : public ::testing::TestWithParam<Failure> {};
+
+TEST_P(FailureTest, IsReportedAndLeavesNothing) {
+  const Failure& failure = GetParam();
+  omxhost::LogCapture log;
+  ScriptedMediaServer server(failure.device);
+  if (failure.missing == Missing::Server) server.unregister();
+  if (failure.missing == Missing::Omx) server.serveWithoutOmx();
+  int result = -77;
+  webrtc::VideoCodec codec = settings();
+  webrtc::VideoCodec* const given = failure.missing != Missing::Settings ? &codec : nullptr;
+  EXPECT_EQ(failure.encoder ? encoder_create(&result, given) : decoder_create(&result, nullptr), nullptr);
+  EXPECT_EQ(result, failure.code);
+  LogLines lines;
+  if (failure.encoder) {
+    lines.push_back(std::string("4/zol-video enter hardCodec encoder_create: build time:") +
+                    g_strPrgCreatTime + " ");
   }
+  if (!failure.line.empty()) lines.push_back("E " + failure.line);
+  lines.push_back(std::string("E OMXINTERFACE - ERROR creating ") +
+                  (failure.encoder ? "encoder: " : "decoder: ") + std::to_string(failure.code) + " (" +
+                  resultDescription(failure.code) + ")");
+  EXPECT_EQ(logLines(log), lines);
+  EXPECT_EQ(server.leaks(), "");
 }
 
 const std::string kNoServer = "OMXINTERFACE: CANNOT ACQUIRE MEDIA PLAYER SERVICE";
 const std::string kNoOmx = "OMXINTERFACE: MEDIA PLAYER SERVICE CANNOT GET IOMX INTERFACE";
-const std::string kNotFound = "OMXINTERFACE: CODEC NOT FOUND: OMX.qcom.video.decoder.avc";
-const std::string kNoNode = "OMXINTERFACE - Could not allocate node: OMX.qcom.video.";
-const std::string kNotSet = "OMXINTERFACE - SETUP PORT PARAMETERS: Set Port Definition Failed: -2147483648\n";
-const std::string kNoRates = "OMXINTERFACE - RATE CONTROL: ERROR getting bitrate parameters: -2147483648";
-const std::string kNoAvc = "OMXINTERFACE - RATE CONTROL: ERROR getting avc parameters: -2147483648";
-const std::string kNoMetaData = "Storing meta data in video buffers is not supported";
-const std::string kNoSetup = "OMXINTERFACE - [ENC] Init: failed to setup params!";
 
-TEST(Creation, ReportsWhatFailsAndLeavesNothing) {
-  const auto noServer = [](auto&, auto& server) { server.unregister(); };
-  const auto noNode = [](auto& omx, auto&) { omx.fail(Method::AllocateNode); };
-  expectReportedAndNothingLeft(
-      "msm8960",
-      {{false, noServer, 3, {kNoServer}},
-       {false, [](auto&, auto& server) { server.serveWithoutOmx(); }, 3, {kNoOmx}},
-       {false, [](auto& omx, auto&) { omx.fail(Method::ListNodes); }, 6, {kNotFound}},
-       {false, noNode, 4, {kNoNode + "decoder.avc -- error -2147483648"}},
-       {false, [](auto& omx, auto&) { omx.fail(Method::GetParameter); }, 13, {}},
-       // The first one is the picture order.
-       {false, [](auto& omx, auto&) { omx.fail(Method::SetParameter, 2); }, 14, {kNotSet}},
-       {true, noServer, 3, {kNoServer}},
-       {true, noNode, 4, {kNoNode + "encoder.avc -- error -2147483648"}},
-       {true, [](auto& omx, auto&) { omx.fail(Method::GetParameter, 5); }, 17, {kNoRates, kNoSetup}},
-       {true, [](auto& omx, auto&) { omx.fail(Method::GetParameter, 3); }, 34, {kNoAvc, kNoSetup}},
-       {true, [](auto&, auto&) {}, 28, {}, true}});
-}
+INSTANTIATE_TEST_SUITE_P(Reasons, FailureTest,
+                         ::testing::Values(Failure{"msm8960", false, Missing::Server, 3, kNoServer},
+                                           Failure{"msm8960", false, Missing::Omx, 3, kNoOmx},
+                                           Failure{"exynos4", false, Missing::Nothing, 36, ""},
+                                           Failure{"msm8960", true, Missing::Server, 3, kNoServer},
+                                           Failure{"msm8960", true, Missing::Settings, 28, ""}));
 
-// Each of these devices in a process of its own.
-TEST(Creation, FailsWithoutComponents) {
-  expectReportedAndNothingLeft("exynos4", {{false, [](auto&, auto&) {}, 36, {}}});
-}
-
-TEST(Creation, FailsWhereMetaDataIsRefused) {
-  const auto refuse = [](auto& omx, auto&) { omx.fail(Method::StoreMetaDataInBuffers); };
-  expectReportedAndNothingLeft("omap4", {{true, refuse, -1, {kNoMetaData, kNoSetup}}});
-}
-
-TEST(Creation, WorksWithoutAPlaceForTheResult) {
+TEST(Create, WorksWithoutAPlaceForTheResult) {
   ScriptedMediaServer server("msm8960");
   webrtc::VideoCodec codec = settings();
   for (void* session : {encoder_create(nullptr, &codec), decoder_create(nullptr, nullptr)}) {

@@ -93,7 +93,6 @@ struct SetupFailure {
   bool served;
   Failing fault;
   size_t failing;  // the number of the fault; 0: none
-  bool refused;    // the node is
   int result;
   LogLines log;
   Trace calls;  // with those of destruction
@@ -105,7 +104,6 @@ TEST_P(SetupFailureTest, LeavesTheRestToDestruction) {
   const SetupFailure& expected = GetParam();
   if (expected.platform != nullptr) property_set("ro.board.platform", expected.platform);
   if (!expected.served) _server.unregister();
-  if (expected.refused) omx().fail(Method::AllocateNode, 1, -19);
   construct();
   {
     const faults::Fault failed(expected.fault, expected.failing);
@@ -125,34 +123,19 @@ const LogLines kNone;
 INSTANTIATE_TEST_SUITE_P(
     Reasons, SetupFailureTest,
     ::testing::Values(
-        SetupFailure{nullptr, false, Failing::New, 0, false, 3, {kNoService}, {}},
-        SetupFailure{"omap4430",
-                     true,
-                     Failing::New,
-                     0,
-                     false,
-                     6,
-                     {kNotFound + "OMX.TI.DUCATI1.VIDEO.H264E"},
-                     {"listNodes"}},
-        SetupFailure{nullptr, true, Failing::New, sizeof(OmxCodecObserver), false, 5, kNone, {"listNodes"}},
-        SetupFailure{nullptr,
-                     true,
-                     Failing::New,
-                     0,
-                     true,
-                     4,
-                     {"E OMXINTERFACE - Could not allocate node: OMX.qcom.video.encoder.avc -- error -19"},
-                     {"listNodes", kAllocate + " failed"}},
+        SetupFailure{nullptr, false, Failing::New, 0, 3, {kNoService}, {}},
+        SetupFailure{
+            "omap4430", true, Failing::New, 0, 6, {kNotFound + "OMX.TI.DUCATI1.VIDEO.H264E"}, {"listNodes"}},
+        SetupFailure{nullptr, true, Failing::New, sizeof(OmxCodecObserver), 5, kNone, {"listNodes"}},
         SetupFailure{nullptr,
                      true,
                      Failing::NothrowNew,
                      sizeof(CQcomBoardPlatformWrapper),
-                     false,
                      36,
                      kNone,
                      {"listNodes", kAllocate, "freeNode"}},
-        SetupFailure{"exynos4", true, Failing::New, 0, false, 36, kNone, {}},
-        SetupFailure{"exynos4", false, Failing::New, 0, false, 3, {kNoService}, {}}));
+        SetupFailure{"exynos4", true, Failing::New, 0, 36, kNone, {}},
+        SetupFailure{"exynos4", false, Failing::New, 0, 3, {kNoService}, {}}));
 
 TEST_F(ConnectionTest, ReportsWhatItCannotDoWithoutAConnection) {
   construct();
@@ -190,28 +173,6 @@ TEST_F(ConnectionTest, HearsNothingThroughAnObserverThatWasReplaced) {
   ASSERT_TRUE(messages().forge(node, makeEvent(OMX_EventError, 1, 2)));
   require(messages().waitForDelivered(anyEvent(), 1), "the late message");
   EXPECT_EQ(log(), LogLines{});
-}
-
-TEST_F(ConnectionTest, ALateMessageFindsNobody) {
-  // The server delivers after freeNode() has returned; the session behind the observer is gone.
-  start();
-  messages().hold(anyMessage());
-  componentProduces("late");
-  ASSERT_EQ(feed("late"), 0);
-  script().raiseError(OMX_ErrorHardware);
-  require(messages().waitForHeld(4), "the messages");
-  void* const node = _session->_node;
-  destroy();
-  messages().passAll();
-  start();  // the next session is not the one that they are for
-  const size_t before = messages().deliveredCount(anyMessage());
-  _log.clear();
-  messages().releaseAll();
-  messages().forge(node, makeEmptyBufferDone(this));
-  require(messages().waitForDelivered(anyMessage(), before + 5), "the late messages");
-  EXPECT_EQ(log(), LogLines{});
-  EXPECT_EQ(_application.outputs().size(), 0u);
-  EXPECT_EQ(_session->threadError(), OMXI_OK);
 }
 
 }  // namespace

@@ -17,43 +17,18 @@ class DestructionTest : public SessionTest {
   }
 };
 
-struct Wait {
-  bool starting;  // in init(), or in deInit()
-  bool ended;     // the end of output has been reached
-  int failure;
-  Match held;
-  int SessionState::*waiters;
-  int result;
-};
-
-TEST_F(DestructionTest, EndsAnInitOrADeInitWhereverItWaits) {
-  const auto state = [](OMX_U32 which) { return commandComplete(OMX_CommandStateSet, which); };
-  constexpr auto kStates = &SessionState::stateWaiters;
-  constexpr auto kReturns = &SessionState::outputReturnWaiters;
-  const Wait waits[] = {
-      {true, false, 0, state(OMX_StateIdle), kStates, 20},
-      {true, false, 0, state(OMX_StateExecuting), kStates, 21},
-      {false, false, 0, nullptr, &SessionState::endOfOutputWaiters, 20},
-      {false, true, 0, state(OMX_StateIdle), kStates, 20},
-      {false, false, 27, state(OMX_StateIdle), kStates, 27},
-      {false, true, 0, fillBufferDone(), kReturns, 20},
-      {false, false, 32, fillBufferDone(), kReturns, 32},
-      {false, true, 0, state(OMX_StateLoaded), kStates, 20},
-  };
-  for (const Wait& wait : waits) {
-    SCOPED_TRACE(&wait - waits);
-    connect();
-    if (!wait.starting) {
-      ASSERT_EQ(init(), OMXI_OK);
-    }
-    if (wait.ended) endOfStream();
-    if (wait.failure != 0) _session->setThreadError(wait.failure);
-    if (wait.held) messages().hold(wait.held);
-    Later<int> call = wait.starting ? beginInit() : beginDeInit();
-    if (wait.held) require(messages().waitForHeld(1), "the message that is waited for");
-    waitForSleeper(wait.waiters);
+TEST_F(DestructionTest, EndsADeInitWithTheFailureThatWasRecorded) {
+  const std::pair<Match, int SessionState::*> waits[] = {
+      {commandComplete(OMX_CommandStateSet, OMX_StateIdle), &SessionState::stateWaiters},
+      {fillBufferDone(), &SessionState::outputReturnWaiters}};
+  for (const auto& [held, waiters] : waits) {
+    start();
+    _session->setThreadError(OMXI_ERR_APPLICATION);
+    messages().hold(held);
+    Later<int> ending = beginDeInit();
+    waitForSleeper(waiters);
     Later<bool> destroyed = beginDestroy();
-    EXPECT_EQ(call.result(), wait.result);
+    EXPECT_EQ(ending.result(), OMXI_ERR_APPLICATION);
     destroyed.result();
     expectNodeFreedLast();
   }

@@ -81,8 +81,8 @@ Fault::Fault(Failing function, size_t number) : _function(function) {
 Fault::~Fault() {
   __atomic_store_n(&failing(_function), size_t{0}, __ATOMIC_SEQ_CST);
 }
-bool Fault::happened() const {
-  return __atomic_load_n(&failing(_function), __ATOMIC_SEQ_CST) == 0;
+size_t Fault::left() const {
+  return __atomic_load_n(&failing(_function), __ATOMIC_SEQ_CST);
 }
 
 ThreadHook::ThreadHook(Entry entry, std::function<void()> run) {

@@ -1,5 +1,4 @@
 // init() and deInit(): the calls in their order, what they wait for, and what a refused call leaves behind.
-#include "tests/core/faults.h"
 #include "tests/core/session_fixture.h"
 
 namespace omxtest {
@@ -67,20 +66,6 @@ TEST_F(LifecycleTest, WaitsForEachStateThatItAsksFor) {
   messages().passAll();
 }
 
-TEST_F(LifecycleTest, WaitsForTheOutputBuffersBeforeItFreesThem) {
-  start();
-  endOfStream();
-  messages().hold(fillBufferDone());
-  Later<int> ending = beginDeInit();
-  require(messages().waitForHeld(kOutputs - 1), "the buffers of a component that goes Idle");
-  waitForSleeper(&SessionState::outputReturnWaiters);
-  EXPECT_EQ(omx().count(Method::FreeBuffer), 0u);
-  while (messages().release(messages().held().size() - 1)) {
-  }
-  EXPECT_EQ(ending.result(), OMXI_OK);
-  EXPECT_EQ(omx().count(Method::FreeBuffer), kInputs + kOutputs);
-}
-
 TEST_F(LifecycleTest, TellsTheApplicationOfAFailure) {
   construct();
   _session->setThreadError(OMXI_ERR_FILL_BUFFER);  // nobody to tell yet
@@ -115,61 +100,8 @@ TEST_F(LifecycleTest, FollowsTheComponentsStateAndLogsItsErrors) {
 
 // --- Refusals ---
 
-struct InitFailure {
-  Method method;
-  size_t nth;
-  int result;
-  std::string line;  // empty: none
-  size_t inputs;     // records that stay
-  size_t outputs;
-  size_t calls;  // of that init()
-};
-
-class InitFailureTest : public SessionTest, public ::testing::WithParamInterface<InitFailure> {};
-
-TEST_P(InitFailureTest, StopsAndLeavesWhatWasDone) {
-  const InitFailure& expected = GetParam();
-  connect();
-  omx().clearCalls();
-  omx().fail(expected.method, expected.nth);
-  EXPECT_EQ(init(), expected.result);
-  EXPECT_EQ(log(), expected.line.empty() ? LogLines{} : LogLines{expected.line});
-  EXPECT_EQ(omx().count(), expected.calls) << ::testing::PrintToString(trace());
-  EXPECT_EQ(_session->_portBuffers[0].size(), expected.inputs);
-  EXPECT_EQ(_session->_portBuffers[1].size(), expected.outputs);
-  EXPECT_EQ(_session->threadError(), OMXI_OK);
-  // The output thread waits on, and destruction ends it.
-  destroy();
-  EXPECT_EQ(log().back(), kEncoderOver);
-}
-
-const std::string kNoDefinition =
-    "E OMXINTERFACE - ALLOCATE BUFFERS: Could not get port definition: -2147483648";
-std::string noMemory(int port, int buffer) {
-  return "E OMXINTERFACE - Could not allocate memory: port " + std::to_string(port) + " buffer " +
-         std::to_string(buffer) + " error -2147483648(0x80000000)\n";
-}
-
-INSTANTIATE_TEST_SUITE_P(
-    Calls, InitFailureTest,
-    ::testing::Values(InitFailure{Method::SendCommand, 1, 20, "", 0, 0, 1},
-                      InitFailure{Method::GetParameter, 1, 13, kNoDefinition, 0, 0, 2},
-                      InitFailure{Method::UseBuffer, 3, 15, noMemory(0, 2), 2, 0, 5},
-                      InitFailure{Method::GetParameter, 2, 13, kNoDefinition, 4, 0, 7},
-                      InitFailure{Method::UseBuffer, 6, 15, noMemory(1, 1), 4, 1, 9},
-                      InitFailure{Method::SendCommand, 2, 21, "", 4, 6, 14},
-                      InitFailure{Method::FillBuffer, 3, 8,
-                                  "E OMXINTERFACE - fillBuffer failed w/ error 0x80000000", 4, 6, 17}));
-
 TEST_F(LifecycleTest, StartsAgainWithTheThreadOfAFailedStart) {
   connect();
-  const size_t before = omx().count();
-  {
-    const faults::Fault failed(faults::Failing::Thread, 1);
-    EXPECT_EQ(_session->init(), OMXI_ERR_CREATE_OUTPUT_THREAD);
-  }
-  EXPECT_EQ(omx().count(), before);
-  EXPECT_EQ(log(), LogLines{});
   omx().fail(Method::SendCommand, 1);
   ASSERT_EQ(init(), OMXI_ERR_SEND_COMMAND_STATE);
   const pthread_t thread = _session->_outputThread;
@@ -211,21 +143,6 @@ TEST_F(LifecycleTest, GoesBackFromIdleWhenExecutingWasRefused) {
   EXPECT_EQ(deInit(), OMXI_ERR_APPLICATION);
   EXPECT_EQ(trace()[0], "sendCommand state 1");
   EXPECT_EQ(omx().count(Method::FreeBuffer), kInputs + kOutputs);
-}
-
-TEST_F(LifecycleTest, IgnoresBuffersThatTheComponentDoesNotFree) {
-  start();
-  endOfStream();
-  omx().failWhere([](const Call& call) { return call.method == Method::FreeBuffer && call.port == 1; });
-  // Loaded is reached when the node has no buffers left, which here it has.
-  Later<int> ending = beginDeInit();
-  waitForSleeper(&SessionState::stateWaiters);
-  requireEventually([this]() -> bool { return _session->_deinitDone; }, "the buffers' release");
-  EXPECT_TRUE(_session->_portBuffers[0].isEmpty() && _session->_portBuffers[1].isEmpty());
-  deliverEvent(OMX_EventCmdComplete, OMX_CommandStateSet, OMX_StateLoaded);
-  EXPECT_EQ(ending.result(), OMXI_OK);
-  destroy();
-  EXPECT_EQ(omx().buffersFreedWithNode(), kOutputs);
 }
 
 }  // namespace

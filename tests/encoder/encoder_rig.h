@@ -96,30 +96,6 @@ inline std::vector<std::string> inShort(const std::vector<Call>& calls) {
   return result;
 }
 
-// Refuses one step of the configuration after the other: creation ends there, with the step's code and its
-// line, if it has one.
-inline void expectStopsAtEachRefusal(const char* device, const std::vector<std::string>& steps,
-                                     const std::vector<std::pair<int, std::string>>& refusals) {
-  EncoderRig rig(device);
-  ASSERT_EQ(refusals.size(), steps.size());
-  for (size_t step = 0; step < steps.size(); ++step) {
-    SCOPED_TRACE(steps[step]);
-    // Gets and sets take turns.
-    Method method = step % 2 == 0 ? Method::GetParameter : Method::SetParameter;
-    const bool metaData = steps[step][0] == 's' && step % 2 == 0;
-    if (metaData) method = Method::StoreMetaDataInBuffers;
-    rig.server.omx().fail(method, metaData ? 1 : step / 2 + 1);
-    EXPECT_EQ(rig.create(), refusals[step].first);
-    EXPECT_EQ(rig.session, nullptr);
-    EXPECT_EQ(inShort(settingCalls(rig.server.omx())),
-              std::vector<std::string>(steps.begin(), steps.begin() + static_cast<ptrdiff_t>(step) + 1));
-    LogLines lines{"E OMXINTERFACE - [ENC] Init: failed to setup params!"};
-    if (!refusals[step].second.empty()) lines.insert(lines.begin(), "E " + refusals[step].second);
-    EXPECT_EQ(logLines(rig.log), lines);
-    rig.server.omx().failNothing();
-  }
-}
-
 // What has to be written after `read`: its record with some fields changed, everything else, padding
 // too, as the component had it.
 template <typename Record>

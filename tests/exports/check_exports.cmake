@@ -1,11 +1,12 @@
 # cmake -DLIBRARY=... -DSYMBOLS=... -DNM=... -DREADELF=... -P check_exports.cmake
-# Fails where the library exports anything but the listed symbols ('+': exported and not listed, '-': the
-# other way round), has another SONAME than applications link to, or needs a library that is not allowed.
+# Fails where the library exports anything but the listed symbols at its version ('+': exported and not listed,
+# '-': the other way round), has another SONAME than applications link to, or needs a library that is not allowed.
 cmake_minimum_required(VERSION 3.25)
 
 # What the library may stand on: the platform, the vector library, the language's runtime, a sanitizer's. No codec.
 set(allowed "^lib(omxhost|hwy|stdc\\+\\+|gcc_s|c\\+\\+|c\\+\\+abi|m|c|pthread|asan|ubsan|tsan)\\.so|^ld-linux")
-set(soname "libomxbridge.so.0")
+set(soname "libomxbridge.so.1")
+set(version "OMXBRIDGE_1")
 
 function(run out)
   execute_process(COMMAND ${ARGN} OUTPUT_VARIABLE text RESULT_VARIABLE result)
@@ -19,11 +20,14 @@ endfunction()
 set(faults "")
 
 file(STRINGS ${SYMBOLS} listed REGEX "^[^#]")
-run(lines ${NM} -D --defined-only --demangle ${LIBRARY})
+run(lines ${NM} -D --defined-only --demangle --with-symbol-versions ${LIBRARY})
 set(exported "")
 foreach(line IN LISTS lines)
-  if(line MATCHES "^[0-9a-f]+ . (.*)$")
+  if(line MATCHES "^[0-9a-f]+ . (.*)@@${version}$")
     list(APPEND exported "${CMAKE_MATCH_1}")
+  elseif(NOT line MATCHES "^(0+ A ${version})?$")
+    string(REGEX REPLACE "^[0-9a-f]+ . " "" symbol "${line}")
+    list(APPEND exported "${symbol}")  # of another version or none
   endif()
 endforeach()
 list(REMOVE_DUPLICATES exported)  # the forms of a constructor or destructor

@@ -72,23 +72,6 @@ TEST(QcomWrapper, LeavesH264SettingsAloneForOtherCodecs) {
   EXPECT_EQ(inShort(settingCalls(rig.server.omx())), expected);
 }
 
-TEST(QcomWrapper, StopsAtTheFirstRefusalWithItsCode) {
-  const std::string geometry =
-      "OMXINTERFACE - SETUP PORT PARAMETERS: Set Port Definition Failed: -2147483648\n";
-  const std::string rates = "OMXINTERFACE - RATE CONTROL: ERROR ";
-  expectStopsAtEachRefusal("msm8960", kSteps,
-                           {{13, ""},
-                            {14, geometry},
-                            {13, ""},
-                            {14, geometry},
-                            {34, rates + "getting avc parameters: -2147483648"},
-                            {35, rates + "setting avc parameters: -2147483648"},
-                            {13, "OMXINTERFACE - BITRATE: ERROR getting port definition: -2147483648"},
-                            {14, "OMXINTERFACE - BITRATE: ERROR setting port definition: -2147483648"},
-                            {17, rates + "getting bitrate parameters: -2147483648"},
-                            {18, rates + "setting bitrate parameters: -2147483648"}});
-}
-
 TEST(QcomWrapper, NeedsAnEncoderSessionToConfigure) {
   webrtc::VideoCodec codec = settings();
   CQcomBoardPlatformWrapper ownerless(nullptr, nullptr, nullptr);

@@ -97,24 +97,6 @@ TEST(TiWrapper, ConfiguresAnEncoderStepByStep) {
   EXPECT_EQ(logLines(rig.log), LogLines());
 }
 
-TEST(TiWrapper, StopsAtTheFirstRefusalWithItsLine) {
-  std::vector<std::pair<int, std::string>> refusals{
-      {-1,
-       "get OMX_IndexParamVideoPortFormat InPort Error:0x80000000. OMX_ErrorUnsupportedIndex=0x8000101a"}};
-  for (const char* line :
-       {"set OMX_IndexParamVideoPortFormat InPort Error:", "get OMX_IndexParamVideoPortFormat OutPort Error:",
-        "set OMX_IndexParamVideoPortFormat OutPort Error:", "get OMX_IndexParamPortDefinition InPort Error:",
-        "set OMX_IndexParamPortDefinition InPort Error:", "get OMX_IndexParamPortDefinition OutPort Error:",
-        "set OMX_IndexParamPortDefinition OutPort Error:", "get OMX_IndexParamVideoAvc failed : ",
-        "set OMX_IndexParamVideoAvc failed : ", "get OMX_IndexParamVideoProfileLevelCurrent failed : ",
-        "set OMX_IndexParamVideoProfileLevelCurrent failed : ", "get OMX_IndexParamVideoBitrate failed : "}) {
-    refusals.emplace_back(-1, std::string(line) + "-2147483648");
-  }
-  refusals.emplace_back(-1, "");  // silent
-  refusals.emplace_back(-1, "Storing meta data in video buffers is not supported");
-  expectStopsAtEachRefusal("omap4", kSteps, refusals);
-}
-
 TEST(TiWrapper, LooksForTheOutputFormatUntilTheListEnds) {
   EncoderRig rig("omap4");
   const auto indices = [&] {

@@ -98,7 +98,7 @@ void MessageTap::passAll() {
   _filter = nullptr;
 }
 
-void MessageTap::onMessage(const sp<Observer>& observer, const omx_message& message) {
+void MessageTap::onMessage(const sp<Observer>& observer, omx_message message) {
   Fate fate = Fate::Pass;
   {
     std::lock_guard<std::mutex> lock(_mutex);

@@ -23,7 +23,8 @@ namespace omxtest {
 
 enum class Fate { Pass, Hold, Drop, Repeat };  // Repeat: delivered twice
 
-using Filter = std::function<Fate(const android::omx_message&)>;
+// May change the message.
+using Filter = std::function<Fate(android::omx_message&)>;
 using Match = std::function<bool(const android::omx_message&)>;
 
 // Matches for the usual kinds of messages.
@@ -97,7 +98,7 @@ class MessageTap {
     android::omx_message message;
   };
 
-  void onMessage(const android::sp<Observer>& observer, const android::omx_message& message);
+  void onMessage(const android::sp<Observer>& observer, android::omx_message message);
   size_t countDelivered(const Match& match) const;  // with the lock held
   void noteDelivered(const android::omx_message& message);
 

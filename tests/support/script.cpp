@@ -69,6 +69,11 @@ void Script::setFormats(OMX_U32 port, std::vector<mediaserver::VideoFormat> form
   _formats.at(port) = std::move(formats);
 }
 
+void Script::separatePorts() {
+  const Lock lock(_mutex);
+  _portsAreSeparate = true;
+}
+
 void Script::refuse(Access access, OMX_INDEXTYPE index, OMX_ERRORTYPE error) {
   const Lock lock(_mutex);
   _refused[{access, index}] = error;

@@ -56,6 +56,8 @@ class Script {
   void editPort(OMX_U32 port, const PortEdit& edit);
   // Defaults: AVC, MPEG-4, H.263, WMV (an encoder: AVC); 21 and TI's 0x7F000100.
   void setFormats(OMX_U32 port, std::vector<mediaserver::VideoFormat> formats);
+  // The output keeps its size when a client gives the input another one.
+  void separatePorts();
 
   // Accesses to `index` fail, also to the records that the node answers by itself. Otherwise readable and
   // writable are those that our wrappers send.
@@ -129,6 +131,7 @@ class Script {
   mutable std::mutex _mutex;
   mutable std::condition_variable _changed;
   mediaserver::PortPair _ports{};
+  bool _portsAreSeparate = false;
   std::array<std::vector<mediaserver::VideoFormat>, mediaserver::kPortCount> _formats;
   std::map<std::pair<Access, OMX_INDEXTYPE>, OMX_ERRORTYPE> _refused;
   std::map<OMX_INDEXTYPE, std::vector<uint8_t>> _answers;

@@ -91,11 +91,12 @@ std::vector<mediaserver::VideoFormat> ScriptedCodec::formats(OMX_U32 port) const
 }
 
 OMX_ERRORTYPE ScriptedCodec::definePort(OMX_U32 port, const PortDefinition& wanted, PortPair& ports) {
+  const Lock lock(_script._mutex);
   const auto& before = ports[port].format.video;
   const auto& after = wanted.format.video;
   const bool resized = before.nFrameWidth != after.nFrameWidth || before.nFrameHeight != after.nFrameHeight;
   ports[port] = wanted;
-  if (resized && port == kInputPort) {
+  if (resized && port == kInputPort && !_script._portsAreSeparate) {
     auto& output = ports[kOutputPort].format.video;
     output.nFrameWidth = after.nFrameWidth;
     output.nFrameHeight = after.nFrameHeight;

@@ -39,10 +39,11 @@ const omxhost::Device& pose(const char* device) {
 
 }  // namespace
 
-ScriptedMediaServer::ScriptedMediaServer(const char* device)
+ScriptedMediaServer::ScriptedMediaServer(const char* device, std::chrono::milliseconds readingTime)
     : _decoder(std::make_unique<Script>(Script::Kind::Decoder)),
       _encoder(std::make_unique<Script>(Script::Kind::Encoder)),
-      _server(new mediaserver::OmxServer(components(pose(device), _decoder.get(), _encoder.get()))),
+      _server(
+          new mediaserver::OmxServer(components(pose(device), _decoder.get(), _encoder.get()), readingTime)),
       _omx(new RecordingOmx(_server)),
       _loadedOnDemand(omxhost::setLoadOnDemand(false)) {
   serve();

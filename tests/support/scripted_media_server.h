@@ -4,6 +4,7 @@
 // end it takes the service away and reports nodes that were not freed as test failures.
 // One at a time in a process. Threads: as its parts; the object itself belongs to the test.
 
+#include <chrono>
 #include <memory>
 #include <string>
 
@@ -19,7 +20,9 @@ class ScriptedMediaServer {
  public:
   // Poses as `device`, a name from the host's table; null: as whatever the process poses as. Product code
   // detects the device once a process, so tests for several devices run in processes of their own.
-  explicit ScriptedMediaServer(const char* device = nullptr);
+  // `readingTime` is that of the server's nodes.
+  explicit ScriptedMediaServer(const char* device = nullptr,
+                               std::chrono::milliseconds readingTime = std::chrono::milliseconds(500));
   ~ScriptedMediaServer();
   ScriptedMediaServer(const ScriptedMediaServer&) = delete;
   ScriptedMediaServer& operator=(const ScriptedMediaServer&) = delete;

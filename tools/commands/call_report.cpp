@@ -9,18 +9,11 @@
 
 #include "tools/base/text.h"
 #include "tools/commands/devices.h"
+#include "tools/commands/summary.h"
 
 namespace tool {
 
 namespace {
-
-double reachedBitRate(const CallReport& report) {
-  return report.seconds > 0 ? static_cast<double>(report.figures.streamBytes) * 8 / report.seconds : 0;
-}
-
-nlohmann::ordered_json orNull(const char* name) {
-  return name != nullptr ? nlohmann::ordered_json(name) : nullptr;
-}
 
 nlohmann::ordered_json keyFrames(const CallTrace& trace) {
   auto list = nlohmann::ordered_json::array();
@@ -50,28 +43,17 @@ nlohmann::ordered_json network(const CallReport& report) {
           {"key_requests", report.path.keyRequests.size()}};
 }
 
-std::string row(const char* label, const std::string& value) {
-  return formatted("%-14s %s\n", label, value.c_str());
-}
-
-std::string rateText(FrameRate rate) {
-  return formatted("%.4g frames/s", rate.perSecond());
-}
-
 }  // namespace
 
 std::string callSummary(const CallReport& report, const WrittenFiles& files) {
   const CallFigures& figures = report.figures;
-  const auto count = [](uint64_t number) { return formatted("%" PRIu64, number); };
-  std::string text;
-  text += row("Video", formatted("%dx%d, %s", report.encoder.size.width, report.encoder.size.height,
-                                 rateText(report.encoder.rate).c_str()));
+  std::string text = videoRow(report.encoder.size, report.encoder.rate);
   if (report.sequence) text += row("Stream", toText(*report.sequence));
-  text += row("Frames in", count(figures.framesIn));
-  text += row("Encoded", count(figures.framesEncoded));
-  text += row("Decoded", count(figures.framesDecoded));
-  text += row("Dropped", count(figures.framesDropped()));
-  if (figures.framesOutOfOrder > 0) text += row("Out of order", count(figures.framesOutOfOrder));
+  text += row("Frames in", figures.framesIn);
+  text += row("Encoded", figures.framesEncoded);
+  text += row("Decoded", figures.framesDecoded);
+  text += row("Dropped", figures.framesDropped());
+  if (figures.framesOutOfOrder > 0) text += row("Out of order", figures.framesOutOfOrder);
   if (report.impairments.any()) {
     const PathFigures& path = report.path;
     text += row("On the way", formatted("%" PRIu64 " packets, %" PRIu64 " lost, %" PRIu64 " late; %" PRIu64
@@ -83,13 +65,11 @@ std::string callSummary(const CallReport& report, const WrittenFiles& files) {
     text += row("Changed",
                 formatted("at %.3f s: %s", static_cast<double>(change.time) / 1e6, change.text.c_str()));
   }
-  text += row("Bit rate", formatted("%.1f kbit/s asked, %.1f kbit/s reached", report.meanBitRate / 1e3,
-                                    reachedBitRate(report) / 1e3));
+  text += bitRateRow(report.meanBitRate, bitRate(figures.streamBytes, report.seconds));
   text += row("PSNR", formatted("%.2f dB (luma, mean)", figures.psnr));
   text += row("Latency", formatted("p50 %.1f ms, p95 %.1f ms, p99 %.1f ms", figures.latencies.p50,
                                    figures.latencies.p95, figures.latencies.p99));
-  text += row("CPU time", formatted("%.2f s in %.2f s, %.1f frames/s", report.cpuSeconds, report.wallSeconds,
-                                    static_cast<double>(figures.framesIn) / report.wallSeconds));
+  text += timeRow(report.cpuSeconds, report.wallSeconds, figures.framesIn);
   for (const auto& [label, path] : files) text += row(label.c_str(), path);
   return text;
 }
@@ -113,7 +93,7 @@ std::string callJson(const CallReport& report, bool interrupted) {
   object["frames_dropped"] = figures.framesDropped();
   object["frames_out_of_order"] = figures.framesOutOfOrder;
   object["bitrate_target"] = std::llround(report.meanBitRate);
-  object["bitrate_reached"] = rounded(reachedBitRate(report));
+  object["bitrate_reached"] = rounded(bitRate(figures.streamBytes, report.seconds));
   object["psnr_y"] = rounded(figures.psnr);
   object["latency_ms"] = {{"p50", rounded(figures.latencies.p50)},
                           {"p95", rounded(figures.latencies.p95)},

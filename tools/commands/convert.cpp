@@ -7,6 +7,7 @@
 #include "tools/base/clock.h"
 #include "tools/base/text.h"
 #include "tools/commands/progress_bar.h"
+#include "tools/commands/summary.h"
 #include "tools/files/picture_writer.h"
 #include "tools/video/rework.h"
 
@@ -104,11 +105,11 @@ Result<ConvertReport> runConvert(const ConvertSettings& settings, FrameSource& s
 }
 
 std::string convertSummary(const ConvertReport& report, const std::string& path) {
-  std::string lines;
-  lines += formatted("%-14s %s to %s\n", "Video", text(report.from).c_str(), text(report.to).c_str());
-  lines += formatted("%-14s %" PRIu64 " in %.2f s, %.1f frames/s\n", "Pictures", report.pictures,
-                     report.wallSeconds, static_cast<double>(report.pictures) / report.wallSeconds);
-  if (!path.empty()) lines += formatted("%-14s %s\n", "Pictures in", path.c_str());
+  std::string lines = row("Video", text(report.from) + " to " + text(report.to));
+  lines +=
+      row("Pictures", formatted("%" PRIu64 " in %.2f s, %.1f frames/s", report.pictures, report.wallSeconds,
+                                static_cast<double>(report.pictures) / report.wallSeconds));
+  if (!path.empty()) lines += row("Pictures in", path);
   return lines;
 }
 

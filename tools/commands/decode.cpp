@@ -1,7 +1,5 @@
 #include "tools/commands/decode.h"
 
-#include <inttypes.h>
-
 #include <mutex>
 #include <nlohmann/json.hpp>
 
@@ -10,6 +8,7 @@
 #include "tools/base/cpu_time.h"
 #include "tools/base/text.h"
 #include "tools/commands/progress_bar.h"
+#include "tools/commands/summary.h"
 #include "tools/files/picture_writer.h"
 #include "tools/session/session.h"
 #include "tools/video/device_layout.h"
@@ -134,15 +133,12 @@ Result<DecodeReport> runDecode(const DecodeSettings& settings, AccessUnitSource&
 }
 
 std::string decodeSummary(const DecodeReport& report, const std::string& picturesPath) {
-  std::string text;
-  text += formatted("%-14s %dx%d, %.4g frames/s\n", "Video", report.size.width, report.size.height,
-                    report.rate.perSecond());
-  text += formatted("%-14s %" PRIu64 "\n", "Access units", report.unitsIn);
-  text += formatted("%-14s %" PRIu64 "\n", "Pictures", report.picturesOut);
-  if (report.sizeChanges > 0) text += formatted("%-14s %d\n", "Size changes", report.sizeChanges);
-  text += formatted("%-14s %.2f s in %.2f s, %.1f frames/s\n", "CPU time", report.cpuSeconds,
-                    report.wallSeconds, static_cast<double>(report.picturesOut) / report.wallSeconds);
-  if (!picturesPath.empty()) text += formatted("%-14s %s\n", "Pictures in", picturesPath.c_str());
+  std::string text = videoRow(report.size, report.rate);
+  text += row("Access units", report.unitsIn);
+  text += row("Pictures", report.picturesOut);
+  if (report.sizeChanges > 0) text += row("Size changes", std::to_string(report.sizeChanges));
+  text += timeRow(report.cpuSeconds, report.wallSeconds, report.picturesOut);
+  if (!picturesPath.empty()) text += row("Pictures in", picturesPath);
   return text;
 }
 

@@ -8,6 +8,7 @@
 
 #include "omxbridge/omxbridge.h"
 #include "tools/base/text.h"
+#include "tools/commands/summary.h"
 
 namespace tool {
 
@@ -38,10 +39,6 @@ std::string versionText(int version) {
 
 const char* orNone(const char* name) {
   return name != nullptr ? name : "none";
-}
-
-Json orNull(const char* name) {
-  return name != nullptr ? Json(name) : Json();
 }
 
 bool isNamed(const char* expected, const std::string& name) {

@@ -9,6 +9,7 @@
 
 #include "tools/base/cpu_time.h"
 #include "tools/base/text.h"
+#include "tools/commands/summary.h"
 #include "tools/media/stream_writer.h"
 
 namespace tool {
@@ -82,10 +83,6 @@ EncodeReport Encoding::report() const {
   return report;
 }
 
-double reachedBitRate(const EncodeReport& report) {
-  return report.seconds > 0 ? static_cast<double>(report.figures.streamBytes) * 8 / report.seconds : 0;
-}
-
 }  // namespace
 
 Result<EncodeReport> runEncode(const EncodeSettings& settings, FrameSource& source,
@@ -97,18 +94,14 @@ Result<EncodeReport> runEncode(const EncodeSettings& settings, FrameSource& sour
 
 std::string encodeSummary(const EncodeReport& report, const std::string& path) {
   const CallFigures& figures = report.figures;
-  std::string text;
-  text += formatted("%-14s %dx%d, %.4g frames/s\n", "Video", report.encoder.size.width,
-                    report.encoder.size.height, report.encoder.rate.perSecond());
-  if (report.sequence) text += formatted("%-14s %s\n", "Stream", toText(*report.sequence).c_str());
-  text += formatted("%-14s %" PRIu64 "\n", "Frames in", figures.framesIn);
-  text += formatted("%-14s %" PRIu64 ", %" PRIu64 " of them key frames\n", "Encoded", figures.framesEncoded,
-                    report.keyFrames);
-  text += formatted("%-14s %.1f kbit/s asked, %.1f kbit/s reached\n", "Bit rate", report.meanBitRate / 1e3,
-                    reachedBitRate(report) / 1e3);
-  text += formatted("%-14s %.2f s in %.2f s, %.1f frames/s\n", "CPU time", report.cpuSeconds,
-                    report.wallSeconds, static_cast<double>(figures.framesIn) / report.wallSeconds);
-  if (!path.empty()) text += formatted("%-14s %s\n", "Stream in", path.c_str());
+  std::string text = videoRow(report.encoder.size, report.encoder.rate);
+  if (report.sequence) text += row("Stream", toText(*report.sequence));
+  text += row("Frames in", figures.framesIn);
+  text += row("Encoded", formatted("%" PRIu64 ", %" PRIu64 " of them key frames", figures.framesEncoded,
+                                   report.keyFrames));
+  text += bitRateRow(report.meanBitRate, bitRate(figures.streamBytes, report.seconds));
+  text += timeRow(report.cpuSeconds, report.wallSeconds, figures.framesIn);
+  if (!path.empty()) text += row("Stream in", path);
   return text;
 }
 
@@ -126,7 +119,7 @@ std::string encodeJson(const EncodeReport& report, bool interrupted) {
   object["key_frames"] = report.keyFrames;
   object["bytes"] = report.figures.streamBytes;
   object["bitrate_target"] = std::llround(report.meanBitRate);
-  object["bitrate_reached"] = rounded(reachedBitRate(report));
+  object["bitrate_reached"] = rounded(bitRate(report.figures.streamBytes, report.seconds));
   object["cpu_seconds"] = rounded(report.cpuSeconds);
   object["wall_seconds"] = rounded(report.wallSeconds);
   object["interrupted"] = interrupted;

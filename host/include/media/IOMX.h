@@ -74,7 +74,7 @@ class IOMX : public IInterface {
   virtual status_t allocateBuffer(node_id node, OMX_U32 port_index, size_t size, buffer_id* buffer,
                                   void** buffer_data) = 0;
 
-  // The component allocates; the server copies between its memory and the block.
+  // As useBuffer, but what the client sends is copied first: it may reuse the block at once.
   virtual status_t allocateBufferWithBackup(node_id node, OMX_U32 port_index, const sp<IMemory>& params,
                                             buffer_id* buffer) = 0;
 

@@ -1,6 +1,6 @@
-#pragma once
 // H.264 byte streams: finding NAL units between start codes, and the bits inside of a parameter set. Pure
 // functions on memory; nothing reads beyond the range that it was given.
+#pragma once
 
 #include <cstddef>
 #include <cstdint>

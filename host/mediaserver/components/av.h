@@ -1,6 +1,6 @@
-#pragma once
 // Ownership of libavcodec's objects, and contexts that keep quiet. The only header here that includes
 // libavcodec's. No state; as thread safe as the objects themselves.
+#pragma once
 
 #include <memory>
 

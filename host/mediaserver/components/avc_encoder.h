@@ -1,6 +1,6 @@
-#pragma once
 // The H.264 encoder component: pictures in one of the vendors' layouts in, one access unit a buffer out.
 // Threads as for every Codec. What clients set lives in EncoderSettings; everything else is the worker's.
+#pragma once
 
 #include <cstdint>
 #include <memory>

@@ -1,5 +1,5 @@
-#pragma once
 // The levels of H.264: what pictures, rates and reference frames each holds. Pure arithmetic on a table.
+#pragma once
 
 #include <cstdint>
 

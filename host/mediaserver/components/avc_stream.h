@@ -1,7 +1,7 @@
-#pragma once
 // One H.264 stream being made by libx264 through libavcodec: one picture in, one picture out, nothing held
 // back. Parameter sets come with every key frame, profile and level as asked; there are no B pictures and no
 // key frames but those that are asked for. One thread.
+#pragma once
 
 #include <cstdint>
 #include <memory>

@@ -1,5 +1,5 @@
-#pragma once
 // The media server's components as one device has them. Any thread.
+#pragma once
 
 #include <vector>
 

@@ -1,7 +1,7 @@
-#pragma once
 // What clients can set on an H.264 encoder: the standard's and the vendor's records on one side, what they
 // mean on the other. Records may come on any thread, also while the encoder works; the worker looks at a copy
 // of the whole before each picture. Guards itself.
+#pragma once
 
 #include <cstddef>
 #include <cstdint>

@@ -1,6 +1,6 @@
-#pragma once
 // How raw pictures lie in the components' buffers, and moving them there and from there. Pictures are 4:2:0
 // with eight bits a sample. Pure functions on memory that the caller owns.
+#pragma once
 
 #include <cstddef>
 #include <cstdint>

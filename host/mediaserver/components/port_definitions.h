@@ -1,5 +1,5 @@
-#pragma once
 // What encoder and decoder components grant their clients alike. Pure functions.
+#pragma once
 
 #include <algorithm>
 #include <cstdint>

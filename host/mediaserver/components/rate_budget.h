@@ -1,4 +1,3 @@
-#pragma once
 // How many bits an encoder library has to be asked for so that a stream keeps its bit rate.
 //
 // The library spreads bits over pictures at the frame rate that it was opened with, and of what it was asked
@@ -6,6 +5,7 @@
 // per cent short. So it is asked anew before each picture: scaled to the frame rate of the moment, with a
 // part of what was saved or overspent so far, and with a small buffer for a second after each change, which
 // makes it forget what it learnt at the former rate. Plain arithmetic, one thread.
+#pragma once
 
 namespace mediaserver {
 

@@ -1,6 +1,6 @@
-#pragma once
 // Reading and writing of clients' parameter and configuration records. The size argument counts, not the
 // record's own size word, which some clients leave empty or use for something else. Any thread.
+#pragma once
 
 #include <cstddef>
 #include <cstdint>

@@ -1,6 +1,6 @@
-#pragma once
 // The sequence parameter set of H.264, as far as the components need it: what a decoder has to know about
 // picture order before the first picture, and the profile that an encoder declares. Pure functions.
+#pragma once
 
 #include <cstdint>
 #include <optional>

@@ -1,12 +1,13 @@
-#pragma once
 // One compressed video stream being decoded by libavcodec: buffers in, pictures out, in display order or in
 // the order of decoding (but for WMV, which libavcodec gives in display order alone). Interlaced pictures
 // come with both fields woven into one. Damaged data gives concealed pictures or none, and never an end. One
 // thread.
+#pragma once
 
 #include <cstddef>
 #include <cstdint>
 #include <deque>
+#include <memory>
 #include <set>
 #include <string>
 #include <vector>
@@ -53,7 +54,9 @@ class StreamDecoder {
   // Decoded pictures, oldest first.
   size_t waiting() const { return _pictures.size(); }
   void dropPictures() { _pictures.clear(); }
+  // A view of the picture and what keeps its memory.
   PlanarView front() const;
+  std::shared_ptr<const AVFrame> frontMemory() const { return _pictures.front().frame; }
   int64_t frontTimestamp() const { return _pictures.front().frame->pts; }
   bool frontIsKey() const { return _pictures.front().key; }
   void pop() { _pictures.pop_front(); }
@@ -63,7 +66,7 @@ class StreamDecoder {
 
  private:
   struct Picture {
-    AvFrame frame;
+    std::shared_ptr<const AVFrame> frame;
     bool key;
   };
 

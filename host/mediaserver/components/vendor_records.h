@@ -1,5 +1,5 @@
-#pragma once
 // Records of the vendors' and of Android's own indices, which the standard's headers do not have.
+#pragma once
 
 #include <OMX_Core.h>
 #include <OMX_IVCommon.h>

@@ -234,7 +234,10 @@ Received VideoDecoder::receive(OutputSpace& output) {
   if (_agreed != geometry || _buffers < neededBuffers() || output.capacity < geometry.bytes) {
     return Received::NewGeometry;
   }
-  writePicture(geometry, picture, output.data);
+  // Off this thread, which decodes the next picture meanwhile.
+  output.complete = [geometry, picture, memory = _decoder->frontMemory(), data = output.data] {
+    writePicture(geometry, picture, data);
+  };
   output.length = geometry.bytes;
   output.timestamp = _decoder->frontTimestamp();
   output.flags = OMX_BUFFERFLAG_ENDOFFRAME;

@@ -1,7 +1,7 @@
-#pragma once
 // The decoder component: compressed buffers in, pictures in the device's layout out, one a buffer. A picture
 // of another size than the output port's waits until the client has made buffers for it. Threads as for every
 // Codec; what both clients' threads and the worker use is guarded by _mutex.
+#pragma once
 
 #include <cstdint>
 #include <memory>

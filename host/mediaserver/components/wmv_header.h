@@ -1,7 +1,7 @@
-#pragma once
 // The beginning of a WMV stream, which has to be known before its first picture. Two kinds are understood:
 // the advanced profile in byte stream format, whose headers stand in the stream, and simple and main profile,
 // whose sequence header comes first, either as an RCV file has it or alone in a buffer of settings.
+#pragma once
 
 #include <cstddef>
 #include <cstdint>
