@@ -1,9 +1,6 @@
-// Nodes come and go: freed from any state, by anybody and at any moment; ids that are wrong harm nobody, nor
-// do calls that make no sense.
+// Nodes come and go: freed from any state, by anybody and at any moment; ids that are wrong harm nobody.
 
 #include <atomic>
-#include <map>
-#include <random>
 #include <thread>
 
 #include <omxhost/log.h>
@@ -205,117 +202,6 @@ TEST_F(Lifetime, NothingIsDeliveredOnceFreeNodeHasReturnedAndSlownessIsNobodyEls
   EXPECT_TRUE(eventually([&] { return observer->ended > ended && observer->getStrongCount() == 1; }));
   EXPECT_EQ(server->nodeCount(), 1u);
   observer->freeing = nullptr;
-}
-
-// Keeps account of one node's buffers: what the node was given must balance with what it gives back.
-class AccountingObserver : public android::BnOMXObserver {
- public:
-  void onMessage(const omx_message& message) override {
-    if (emptyBufferDone()(message)) sent(message.u.buffer_data.buffer, -1);
-    if (fillBufferDone()(message)) sent(message.u.extended_buffer_data.buffer, -1);
-    if (errorIs(OMX_ErrorNotImplemented)(message)) ++marks;
-  }
-
-  // Before the call, as the answer may overtake it; taken back when the call fails.
-  void sent(BufferId buffer, int times) {
-    std::lock_guard<std::mutex> lock(_mutex);
-    EXPECT_GE(_out[buffer] += times, 0) << "came back more often than it was sent";
-  }
-
-  std::atomic<int> marks{0};  // commands to mark that were answered
-
- private:
-  std::mutex _mutex;
-  std::map<BufferId, int> _out;
-};
-
-// Random calls, sound ones and nonsense, from several threads. Every buffer comes back at most once for each
-// time it was sent, nothing is left over, and the node still does its work or goes.
-TEST_F(Lifetime, RandomCallsFromSeveralThreadsKeepTheBooksInOrder) {
-  constexpr int kRounds = 30;
-  constexpr int kThreads = 3;
-  constexpr int kCalls = 400;
-  for (int round = 0; round < kRounds; ++round) {
-    SCOPED_TRACE(round);
-    const android::sp<AccountingObserver> account = new AccountingObserver;
-    NodeId node = nullptr;
-    ASSERT_EQ(server->allocateNode(kDecoder, account, &node), android::OK);
-    std::mutex mutex;
-    std::vector<BufferId> ids = execute(node);  // that any thread may use, in any way
-
-    const auto call = [&](std::minstd_rand& random) {
-      const auto pick = [&](unsigned limit) { return static_cast<unsigned>(random() >> 4) % limit; };
-      const OMX_U32 port = pick(20) == 0 ? pick(1000) : pick(kPortCount);
-      const auto any = [&, choice = pick(1000)] {
-        std::lock_guard<std::mutex> lock(mutex);
-        return choice % 16 == 0 ? reinterpret_cast<BufferId>(uintptr_t{choice}) : ids[choice % ids.size()];
-      };
-      const auto send = [&](OMX_COMMANDTYPE command, unsigned param) {
-        server->sendCommand(node, command, static_cast<OMX_S32>(param));
-      };
-      const unsigned kind = pick(40);
-      if (kind == 0) {
-        // Not Invalid, which would end the node's life; and not often far away from Executing.
-        send(OMX_CommandStateSet, pick(8) == 0 ? 1 + pick(5) : 2 + pick(2));
-      } else if (kind == 1) {
-        if (pick(3) == 0) send(static_cast<OMX_COMMANDTYPE>(1 + pick(5)), port);
-      } else if (kind == 2) {
-        if (pick(4) == 0) decoder.announce(8 + pick(8), 4);
-      } else if (kind == 3) {
-        send(OMX_CommandPortEnable, OMX_ALL);
-      } else if (kind <= 5) {
-        BufferId id = nullptr;
-        void* data = nullptr;
-        if (server->allocateBuffer(node, port, 40 + pick(100), &id, &data) != android::OK) return;
-        std::lock_guard<std::mutex> lock(mutex);
-        ids.push_back(id);
-      } else if (kind == 6) {
-        server->freeBuffer(node, port, any());
-      } else if (kind == 7) {
-        PortDefinition definition{};
-        definition.nPortIndex = port;
-        server->getParameter(node, OMX_IndexParamPortDefinition, &definition, sizeof(definition));
-        definition.nBufferCountActual = 1 + pick(3);
-        server->setParameter(node, OMX_IndexParamPortDefinition, &definition, sizeof(definition) - pick(2));
-      } else {
-        const BufferId id = any();
-        account->sent(id, 1);
-        const OMX_U32 flags = pick(10) == 0 ? OMX_BUFFERFLAG_EOS : 0;
-        const android::status_t status = pick(2) == 0
-                                             ? server->fillBuffer(node, id)
-                                             : server->emptyBuffer(node, id, pick(8), pick(64), flags, 0);
-        if (status != android::OK) account->sent(id, -1);
-      }
-    };
-    // Callers that never wait would keep the component from its turn.
-    const auto letItWork = [&] {
-      const int before = account->marks;
-      OMX_STATETYPE state{};
-      if (server->sendCommand(node, OMX_CommandMarkBuffer, 0) != android::OK) return;
-      EXPECT_TRUE(eventually(
-          [&] { return account->marks > before || server->getState(node, &state) != android::OK; }));
-    };
-
-    std::atomic<int> made{0};
-    std::vector<std::thread> threads;
-    for (int thread = 0; thread < kThreads; ++thread) {
-      threads.emplace_back([&, seed = static_cast<unsigned>(round * kThreads + thread + 1)] {
-        std::minstd_rand random(seed);
-        for (int i = 0; i < kCalls; ++i, ++made) {
-          call(random);
-          if (i % 10 == 0) letItWork();
-        }
-      });
-    }
-    // Half of the nodes are freed under the callers' feet.
-    const int enough = kThreads * kCalls * (round % 2 == 0 ? round : kRounds) / kRounds;
-    EXPECT_TRUE(eventually([&] { return made >= enough; }));
-    EXPECT_EQ(server->freeNode(node), android::OK);
-    for (std::thread& thread : threads) thread.join();
-    EXPECT_EQ(decoder.liveCodecs(), 0u);
-    EXPECT_EQ(decoder.starts(), decoder.stops());
-  }
-  EXPECT_GT(decoder.inputCount(), 0u) << "chance led to refusals only";
 }
 
 }  // namespace
