@@ -1,5 +1,6 @@
 #include "bench/soak/samples.h"
 
+#include <malloc.h>
 #include <unistd.h>
 
 #include <algorithm>
@@ -35,6 +36,11 @@ Usage usageNow() {
           entriesIn("/proc/self/task")};
 }
 
+double heapInUse() {
+  const auto heap = mallinfo2();
+  return static_cast<double>(heap.uordblks + heap.hblkhd);
+}
+
 void Latencies::add(double milliseconds) {
   const std::lock_guard held(_mutex);
   _values.push_back(milliseconds);
@@ -58,7 +64,7 @@ double Line::value(const Sample& sample) const {
 
 const std::vector<Line>& lines() {
   static const std::vector<Line> all = {
-      {"Memory", "MB in core", nullptr, &Usage::memory, 1e-6, 0.05, 8},
+      {"Memory", "MB in core", nullptr, &Usage::memory, 1e-6, 0.2, 8},
       {"Descriptors", "open files", nullptr, &Usage::descriptors, 1, 0.1, 8},
       {"Threads", "", nullptr, &Usage::threads, 1, 0.1, 8},
       {"Latency", "ms from sending to the output, 95th percentile", &Sample::latency, nullptr, 1, 0.5, 20},

@@ -15,6 +15,8 @@ struct Usage {
   double threads;
 };
 Usage usageNow();
+// Bytes of the heap that are handed out.
+double heapInUse();
 
 // Collects latencies between two looks. Any thread.
 class Latencies {
