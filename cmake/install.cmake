@@ -2,24 +2,22 @@
 include(GNUInstallDirs)
 include(CMakePackageConfigHelpers)
 
-foreach(target IN ITEMS omxbridge omxhost omxmediaserver)
-  set_target_properties(${target} PROPERTIES INSTALL_RPATH "$ORIGIN")
-endforeach()
-set_target_properties(omxbridge_tool PROPERTIES INSTALL_RPATH "$ORIGIN/../${CMAKE_INSTALL_LIBDIR}")
-
+set_target_properties(omxbridge PROPERTIES INSTALL_RPATH "$ORIGIN")
 install(TARGETS omxbridge EXPORT omxbridge
   LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}
   INCLUDES DESTINATION ${CMAKE_INSTALL_INCLUDEDIR})
-# The platform's port: linked by the library, and of use to tests of applications.
-install(TARGETS omxhost EXPORT omxbridge
-  LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}
-  INCLUDES DESTINATION ${CMAKE_INSTALL_INCLUDEDIR})
-# Loaded at run time by the platform's port, which looks beside itself.
-install(TARGETS omxmediaserver LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR})
-install(TARGETS omxbridge_tool RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
 install(DIRECTORY include/omxbridge DESTINATION ${CMAKE_INSTALL_INCLUDEDIR})
-install(DIRECTORY host/include/omxhost DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}
-  PATTERN services.h EXCLUDE)
+if(TARGET omxhost)
+  set_target_properties(omxhost omxmediaserver PROPERTIES INSTALL_RPATH "$ORIGIN")
+  # The platform's port: linked by the library, and of use to tests of applications.
+  install(TARGETS omxhost EXPORT omxbridge
+    LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}
+    INCLUDES DESTINATION ${CMAKE_INSTALL_INCLUDEDIR})
+  install(DIRECTORY host/include/omxhost DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}
+    PATTERN services.h EXCLUDE)
+  # Loaded at run time by the platform's port, which looks beside itself.
+  install(TARGETS omxmediaserver LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR})
+endif()
 
 set(package_directory ${CMAKE_INSTALL_LIBDIR}/cmake/omxbridge)
 install(EXPORT omxbridge NAMESPACE omxbridge:: FILE omxbridge-targets.cmake DESTINATION ${package_directory})
