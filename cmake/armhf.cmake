@@ -5,7 +5,8 @@ set(CMAKE_SYSTEM_PROCESSOR armv7l)
 set(CMAKE_C_COMPILER arm-linux-gnueabihf-gcc)
 set(CMAKE_CXX_COMPILER arm-linux-gnueabihf-g++)
 set(CMAKE_C_FLAGS_INIT "-march=armv7-a -mfpu=neon")
-set(CMAKE_CXX_FLAGS_INIT "-march=armv7-a -mfpu=neon")
+# Nothing here meets code of compilers before GCC 7, which passed some records otherwise.
+set(CMAKE_CXX_FLAGS_INIT "-march=armv7-a -mfpu=neon -Wno-psabi")
 
 cmake_path(ABSOLUTE_PATH CMAKE_CURRENT_LIST_DIR NORMALIZE OUTPUT_VARIABLE here)
 cmake_path(GET here PARENT_PATH project)
