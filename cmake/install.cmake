@@ -7,39 +7,47 @@ endif()
 include(GNUInstallDirs)
 include(CMakePackageConfigHelpers)
 
-foreach(target IN ITEMS omxbridge omxhost omxmediaserver)
-  set_target_properties(${target} PROPERTIES INSTALL_RPATH "$ORIGIN")
-endforeach()
-set_target_properties(omxbridge_tool PROPERTIES INSTALL_RPATH "$ORIGIN/../${CMAKE_INSTALL_LIBDIR}")
+# What of these there is depends on the platform: a device brings its own port, and no tool.
+set(installed_libraries omxbridge)
+if(TARGET omxhost)
+  list(APPEND installed_libraries omxhost)
+  set_target_properties(omxhost omxmediaserver PROPERTIES INSTALL_RPATH "$ORIGIN")
+endif()
+set_target_properties(omxbridge PROPERTIES INSTALL_RPATH "$ORIGIN")
 
 # The library, and the platform's port, which it links and which is of use to tests of applications.
-install(TARGETS omxbridge omxhost EXPORT omxbridge
+install(TARGETS ${installed_libraries} EXPORT omxbridge
   LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT library NAMELINK_COMPONENT development
   INCLUDES DESTINATION ${CMAKE_INSTALL_INCLUDEDIR})
 install(DIRECTORY include/omxbridge DESTINATION ${CMAKE_INSTALL_INCLUDEDIR} COMPONENT development)
-install(DIRECTORY host/include/omxhost DESTINATION ${CMAKE_INSTALL_INCLUDEDIR} COMPONENT development
-  PATTERN services.h EXCLUDE)
 install(DIRECTORY docs/ DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/libomxbridge-dev COMPONENT development
   PATTERN reference EXCLUDE)
 install(DIRECTORY examples DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/libomxbridge-dev COMPONENT development
   USE_SOURCE_PERMISSIONS)
-# Loaded at run time by the platform's port, which looks beside itself.
-install(TARGETS omxmediaserver LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT mediaserver)
+if(TARGET omxhost)
+  install(DIRECTORY host/include/omxhost DESTINATION ${CMAKE_INSTALL_INCLUDEDIR} COMPONENT development
+    PATTERN services.h EXCLUDE)
+  # Loaded at run time by the platform's port, which looks beside itself.
+  install(TARGETS omxmediaserver LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT mediaserver)
+endif()
 
 # The tool, which writes its own manual page and completions.
-install(TARGETS omxbridge_tool RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT tool)
-set(written ${CMAKE_BINARY_DIR}/tools/omxbridge.1.gz ${CMAKE_BINARY_DIR}/tools/omxbridge
-  ${CMAKE_BINARY_DIR}/tools/_omxbridge)
-add_custom_command(OUTPUT ${written} WORKING_DIRECTORY ${CMAKE_BINARY_DIR}/tools VERBATIM
-  COMMAND omxbridge_tool manual > omxbridge.1
-  COMMAND gzip -9nf omxbridge.1
-  COMMAND omxbridge_tool completion bash > omxbridge
-  COMMAND omxbridge_tool completion zsh > _omxbridge)
-add_custom_target(omxbridge_tool_writings ALL DEPENDS ${written})
-set(directories man/man1 bash-completion/completions zsh/site-functions)
-foreach(writing directory IN ZIP_LISTS written directories)
-  install(FILES ${writing} DESTINATION ${CMAKE_INSTALL_DATADIR}/${directory} COMPONENT tool)
-endforeach()
+if(TARGET omxbridge_tool)
+  set_target_properties(omxbridge_tool PROPERTIES INSTALL_RPATH "$ORIGIN/../${CMAKE_INSTALL_LIBDIR}")
+  install(TARGETS omxbridge_tool RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT tool)
+  set(written ${CMAKE_BINARY_DIR}/tools/omxbridge.1.gz ${CMAKE_BINARY_DIR}/tools/omxbridge
+    ${CMAKE_BINARY_DIR}/tools/_omxbridge)
+  add_custom_command(OUTPUT ${written} WORKING_DIRECTORY ${CMAKE_BINARY_DIR}/tools VERBATIM
+    COMMAND omxbridge_tool manual > omxbridge.1
+    COMMAND gzip -9nf omxbridge.1
+    COMMAND omxbridge_tool completion bash > omxbridge
+    COMMAND omxbridge_tool completion zsh > _omxbridge)
+  add_custom_target(omxbridge_tool_writings ALL DEPENDS ${written})
+  set(directories man/man1 bash-completion/completions zsh/site-functions)
+  foreach(writing directory IN ZIP_LISTS written directories)
+    install(FILES ${writing} DESTINATION ${CMAKE_INSTALL_DATADIR}/${directory} COMPONENT tool)
+  endforeach()
+endif()
 
 set(package_directory ${CMAKE_INSTALL_LIBDIR}/cmake/omxbridge)
 install(EXPORT omxbridge NAMESPACE omxbridge:: FILE omxbridge-targets.cmake DESTINATION ${package_directory}

@@ -140,8 +140,8 @@ void OmxInterface::onOmxObserverEvent(const android::omx_message& message) {
     }
     sem_post(&_semStateChanged);
   } else if (event.event == OMX_EventError) {
-    logError("OMXINTERFACE - Event error = %d(0x%x), data2 %d \n", static_cast<int>(event.data1), event.data1,
-             static_cast<int>(event.data2));
+    logError("OMXINTERFACE - Event error = %d(0x%x), data2 %d \n", static_cast<int>(event.data1),
+             static_cast<unsigned>(event.data1), static_cast<int>(event.data2));
   }
 }
 

@@ -104,9 +104,10 @@ void OmxInterface::onOmxObserverFillBufferDone(const android::omx_message& messa
   // for buffers that no component call was made for.)
   if (filled.buffer == nullptr || record == nullptr || !record->busy) return;
   const SessionState::Port& port = _state->ports[kOmxOutputPort];
-  const bool tooLong = filled.range_length > port.capacity;
+  const uint32_t length = filled.range_length;
+  const bool tooLong = length > port.capacity;
   record->busy = false;
-  record->rangeLength = tooLong ? port.capacity : filled.range_length;
+  record->rangeLength = tooLong ? port.capacity : length;
   record->eos = (filled.flags & OMX_BUFFERFLAG_EOS) != 0;
   record->timestamp = static_cast<uint32_t>(filled.timestamp);
   // Kept: delivered data starts at the buffer's start, whatever range_offset says. With a heap of the
@@ -119,7 +120,7 @@ void OmxInterface::onOmxObserverFillBufferDone(const android::omx_message& messa
   held.unlock();
 
   if (tooLong) {
-    logError("OMXINTERFACE - Output of %u bytes cut to the buffer's %u", filled.range_length, port.capacity);
+    logError("OMXINTERFACE - Output of %u bytes cut to the buffer's %u", length, port.capacity);
   }
   // Silence would have deInit() wait for an end of stream that nobody delivers.
   if (lost) setThreadError(OMXI_ERR_ALLOCATE_MEMORY);

@@ -142,8 +142,8 @@ int OmxInterface::allocateBuffers(int port) {
     return failWith(OMXI_ERR_GET_PORT_DEFINITION,
                     "OMXINTERFACE - ALLOCATE BUFFERS: Could not get port definition: %d", known);
   }
-  const OMX_U32 count = definition.nBufferCountActual;
-  const OMX_U32 size = definition.nBufferSize;
+  const uint32_t count = definition.nBufferCountActual;
+  const uint32_t size = definition.nBufferSize;
   // Kept: one name on every platform; memory statistics of devices know the pool by it.
   const sp<MemoryDealer> dealer = new MemoryDealer(size_t{count} * size, "QCOMXWrapper");
   _memoryDealer[port] = dealer;
@@ -162,7 +162,7 @@ int OmxInterface::allocateBuffers(int port) {
     }
   }
 
-  for (OMX_U32 i = 0; i < count; ++i) {
+  for (uint32_t i = 0; i < count; ++i) {
     sp<IMemory> block = dealer->allocate(size);
     if (block == nullptr) {
       return failWith(OMXI_ERR_ALLOCATE_MEMORY,

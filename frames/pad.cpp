@@ -100,13 +100,14 @@ int PadI420BottomRows(unsigned char* buffer, unsigned int size, unsigned int wid
   const std::uint64_t end = newArea + newArea / 4 + q + extra / 4;
   if (newSize > size || end > size) return kRefused;
 
-  // V before U: neither lands on what has not been moved yet.
-  std::uint8_t *u = buffer + newArea, *v = u + newArea / 4;
-  std::memmove(v, buffer + oldY + q, q);
-  std::memset(v + q, kFillChroma, extra / 4);
-  std::memmove(u, buffer + oldY, q);
-  std::memset(u + q, kFillChroma, extra / 4);
-  std::memset(buffer + oldY, kFillLuma, extra);
+  // V before U: neither lands on what has not been moved yet. All of it is within the buffer.
+  const auto chroma = static_cast<std::size_t>(q), fill = static_cast<std::size_t>(extra);
+  std::uint8_t *from = buffer + oldY, *u = buffer + newArea, *v = u + newArea / 4;
+  std::memmove(v, from + chroma, chroma);
+  std::memset(v + chroma, kFillChroma, fill / 4);
+  std::memmove(u, from, chroma);
+  std::memset(u + chroma, kFillChroma, fill / 4);
+  std::memset(from, kFillLuma, fill);
   outSize = static_cast<unsigned>(newSize);
   return 0;
 }

@@ -72,7 +72,7 @@ int enlarge(const ExpandRows& kernels, unsigned group, unsigned width, unsigned 
   std::uint8_t* to = grown ? grown.get() : buffer;
 
   // Last plane first: in place, each lands behind what is still to be read.
-  const std::size_t from = planeArea(width, height), toArea = toWidth * toHeight;
+  const std::size_t from = planeArea(width, height), toArea = static_cast<std::size_t>(toWidth * toHeight);
   enlarger.plane(buffer + from + from / 4, width / 2, height / 2, to + toArea + toArea / 4);
   enlarger.plane(buffer + from, width / 2, height / 2, to + toArea);
   enlarger.plane(buffer, width, height, to);

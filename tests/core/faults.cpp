@@ -6,6 +6,7 @@
 
 #include <mutex>
 #include <new>
+#include <type_traits>
 #include <utility>
 
 #include "omxbridge/omxbridge.h"
@@ -106,7 +107,8 @@ using faults::Failing;
 // Memory still comes from the library's (or a sanitizer's) own form, and goes back to it.
 void* operator new(size_t size) {
   using New = void* (*)(size_t);
-  static const auto next = reinterpret_cast<New>(dlsym(RTLD_NEXT, "_Znwm"));
+  constexpr const char* kName = std::is_same_v<size_t, unsigned long> ? "_Znwm" : "_Znwj";
+  static const auto next = reinterpret_cast<New>(dlsym(RTLD_NEXT, kName));
   if (faults::failsNow(Failing::New, size, __builtin_return_address(0))) throw std::bad_alloc();
   return next(size);
 }

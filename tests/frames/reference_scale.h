@@ -124,7 +124,7 @@ inline std::vector<int> bilinear(const Bytes& src, Size from, Size to) {
     const std::uint64_t xStep = w * 65536 / tw, yStep = h * 65536 / th;
     for (std::size_t j = 0; j < th; ++j) {
       const std::uint64_t y = j * yStep + (yStep > 0x1FFFF ? 32768 : 0);
-      const std::size_t r = y / 65536, f = y / 256 % 256;
+      const auto r = static_cast<std::size_t>(y / 65536), f = static_cast<std::size_t>(y / 256 % 256);
       std::vector<int> row(w + 1);
       for (std::size_t x = 0; x < w; ++x) {
         int below = memory.at(start + (r + 1) * pitch + x);
@@ -138,7 +138,7 @@ inline std::vector<int> bilinear(const Bytes& src, Size from, Size to) {
       if (xStep == 65536 && w > 1) row[w - 1] = row[w - 2];
       row[w] = row[w - 1];
       for (std::size_t i = 0; i < tw; ++i) {
-        const std::size_t x = i * xStep / 65536;
+        const auto x = static_cast<std::size_t>(i * xStep / 65536);
         const std::int64_t g = static_cast<std::int64_t>(i * xStep % 65536);
         const bool unknown = row[x] < 0 || (g != 0 && row[x + 1] < 0);
         const auto mixed = static_cast<int>((row[x + 1] * g + row[x] * (65535 - g)) / 65536);

@@ -244,9 +244,10 @@ Result<bool> Scene::next(Picture& picture) {
   const int left = -panX;
   const int top = -panY;
   const int u = _unit;
-  paint(_leaves[_frame % _leaves.size()], windowLeftOf(_room.size()) - pan.width + left,
+  paint(_leaves[static_cast<size_t>(_frame % _leaves.size())], windowLeftOf(_room.size()) - pan.width + left,
         even(kWindowTop * u) - pan.height + top, picture);
-  paint(_wheels[_frame / 2 % kWheelSteps], even(left + _size.width / 10), even(top + 25 * u), picture);
+  paint(_wheels[static_cast<size_t>(_frame / 2 % kWheelSteps)], even(left + _size.width / 10),
+        even(top + 25 * u), picture);
   const int sway = swing(_frame, 130, 2 * u);
   paint(_shoulders, even(left + _size.width / 2 - 17 * u + sway / 2), even(top + 28 * u), picture);
   const size_t mouth = scatter(static_cast<uint32_t>(_frame / 4), 0, 14) % kMouths;
