@@ -1,32 +1,22 @@
-// How the Qualcomm wrapper configures an encoder: which records, in which order, byte for byte.
+// How the Qualcomm wrapper sets up an encoder and a decoder: which records, byte for byte.
 #include <gtest/gtest.h>
 
+#include "decoder/omx_interface_decoder.h"
 #include "platform/qcom_board_platform_wrapper.h"
 #include "tests/encoder/encoder_rig.h"
 
+namespace omxtest {
 namespace {
 
-using namespace omxtest;
-
 using Definition = OMX_PARAM_PORTDEFINITIONTYPE;
-
-const std::vector<std::string> kSteps = {
-    "getParameter 2000001 port 0", "setParameter 2000001 port 0",  // geometry of the input
-    "getParameter 2000001 port 1", "setParameter 2000001 port 1",  // geometry of the output
-    "getParameter 600000d port 1", "setParameter 600000d port 1",  // H.264
-    "getParameter 2000001 port 1", "setParameter 2000001 port 1",  // bit rate of the port
-    "getParameter 6000004 port 1", "setParameter 6000004 port 1",  // rate control
-};
 
 TEST(QcomWrapper, ConfiguresAnEncoderStepByStep) {
   EncoderRig rig("msm8960");
   rig.server.encoder().answer(OMX_IndexParamVideoAvc, patternRecord<108>(1));
   ASSERT_EQ(rig.create(), 0);
-  const std::vector<Call> calls = settingCalls(rig.server.omx());
-  ASSERT_EQ(inShort(calls), kSteps);
-
+  std::vector<Call> calls = rig.settingCalls();
+  ASSERT_EQ(calls.size(), 10U);
   for (const size_t step : {0U, 2U}) {
-    SCOPED_TRACE(step);
     EXPECT_EQ(calls[step + 1].record, edited<Definition>(calls[step], [](Definition& definition) {
                 definition.format.video.nFrameWidth = 176;
                 definition.format.video.nFrameHeight = 144;
@@ -56,20 +46,71 @@ TEST(QcomWrapper, ConfiguresAnEncoderStepByStep) {
             }));
   EXPECT_EQ(words(calls[9].record),
             (Words{20, kVersion, 1, OMX_Video_ControlRateVariableSkipFrames, 500000}));
-
-  EXPECT_EQ(rig.session->_portBufferMode[kOmxInputPort], OMX_BUFFER_CLIENT_MEMORY);
-  EXPECT_EQ(rig.session->_portBufferMode[kOmxOutputPort], OMX_BUFFER_CLIENT_MEMORY);
-  EXPECT_EQ(logLines(rig.log), LogLines());
+  webrtc::VideoCodec codec = settings();
+  codec.codecType = webrtc::kVideoCodecOther;  // has no H.264 settings
+  ASSERT_EQ(rig.create(codec), 0);
+  calls.erase(calls.begin() + 4, calls.begin() + 6);
+  EXPECT_EQ(rig.settingCalls().size(), calls.size());
 }
 
-TEST(QcomWrapper, LeavesH264SettingsAloneForOtherCodecs) {
-  EncoderRig rig("msm8960");
-  webrtc::VideoCodec codec = settings();
-  codec.codecType = webrtc::kVideoCodecOther;
-  ASSERT_EQ(rig.create(codec), 0);
-  std::vector<std::string> expected = kSteps;
-  expected.erase(expected.begin() + 4, expected.begin() + 6);
-  EXPECT_EQ(inShort(settingCalls(rig.server.omx())), expected);
+class AvcSettings : public ::testing::TestWithParam<const char*> {};
+
+TEST_P(AvcSettings, FollowTheApplicationButOnAnMsm7x30) {
+  const bool baselineOnly = GetParam() == std::string("msm7x30");
+  const OMX_U32 own = patternRecord<108>(1)[14];
+  const struct {
+    int32_t profile;
+    int32_t keyFrameInterval;
+    uint8_t entropyCoding;
+    uint8_t transform8x8;
+    OMX_U32 pFrames;  // written
+    OMX_U32 profileWord;
+  } cases[] = {{66, 30, 0, 0, 29, 1},
+               {100, 0, 1, 1, 0xFFFF, 8},  // no further key frames
+               {88, INT32_MIN, 0, 0, 0x7FFFFFFF, own},
+               {77, 1, 0xC8, 0x80, 0, 2}};  // flags other than 1
+  EncoderRig rig(GetParam());
+  rig.server.encoder().answer(OMX_IndexParamVideoAvc, patternRecord<108>(1));
+  ASSERT_EQ(rig.create(), 0);
+  for (const auto& each : cases) {
+    webrtc::VideoCodecH264 h264 = {};
+    h264.profile = each.profile;
+    h264.keyFrameInterval = each.keyFrameInterval;
+    h264.entropyCoding = each.entropyCoding;
+    h264.transform8x8 = each.transform8x8;
+    EXPECT_EQ(rig.session->setupAvcSettings(&h264), 0);
+    const Words record = words(rig.settingCalls().back().record);
+    EXPECT_EQ((Words{record[4], record[14], record[19], record[23]}),
+              (baselineOnly ? Words{each.pFrames, OMX_VIDEO_AVCProfileBaseline, 0, 0}
+                            : Words{each.pFrames, each.profileWord, each.entropyCoding, each.transform8x8}));
+  }
+}
+
+INSTANTIATE_TEST_SUITE_P(Devices, AvcSettings, ::testing::Values("msm8960", "msm7x30"));
+
+TEST(QcomWrapper, SendsADecoderOneVendorRecordForEachSetting) {
+  ScriptedMediaServer server("msm8960");
+  OmxInterfaceDecoder* session = nullptr;
+  ASSERT_EQ(OmxInterfaceDecoder::Create(&session, nullptr), 0);
+  const std::unique_ptr<OmxInterfaceDecoder> owner(session);
+  using Set = int (OmxInterfaceDecoder::*)(int);
+  const Set order = &OmxInterfaceDecoder::setPictureOrder;
+  const Set packing = &OmxInterfaceDecoder::setInputPackingFormat;
+  const std::tuple<Set, int, Words> cases[] = {{order, 0, {16, 0, 0, 1}},  // without a version
+                                               {order, 1, {16, 0, 0, 2}},
+                                               {order, 2, {16, 0, 0, 0}},
+                                               {packing, 1, {24, kVersion, 0, 0, 0, 3}},
+                                               {packing, 2, {24, kVersion, 0, 0, 0, 1}},
+                                               {packing, 7, {24, kVersion, 0, 0, 0, 0}}};
+  for (const auto& [set, value, record] : cases) {
+    server.omx().clearCalls();
+    EXPECT_EQ((session->*set)(value), 0);
+    EXPECT_EQ(session->setOutputColorFormat(0), 0);  // without a call
+    ASSERT_EQ(server.omx().count(), 1U);
+    const Call call = server.omx().calls(Method::SetParameter).at(0);
+    EXPECT_EQ(static_cast<OMX_U32>(call.index), set == order ? 0x7F000010 : 0x7F000002);
+    EXPECT_EQ(words(call.record), record);
+  }
 }
 
 TEST(QcomWrapper, NeedsAnEncoderSessionToConfigure) {
@@ -79,8 +120,7 @@ TEST(QcomWrapper, NeedsAnEncoderSessionToConfigure) {
   OmxInterface notAnEncoder;
   CQcomBoardPlatformWrapper misplaced(&notAnEncoder, nullptr, nullptr);
   EXPECT_EQ(misplaced.configureEncoder(&codec), OMXI_ERR_CREATE_INTERFACE);
-  EXPECT_EQ(ownerless.setConfig(CONFIG_BITRATE, 1), OMXI_ERR_SET_CONFIG);
-  EXPECT_EQ(ownerless.setPictureOrder(1), OMXI_ERR_PICTURE_ORDER);
 }
 
 }  // namespace
+}  // namespace omxtest
