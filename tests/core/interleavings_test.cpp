@@ -21,10 +21,7 @@ TEST_F(InterleavingTest, AFailureWakesADeInitThatHasLookedForOneBefore) {
 TEST_F(InterleavingTest, NobodyFindsARecordOfAPortThatIsBeingFreed) {
   // Whoever used a record on its way out would use freed memory, or hand the component a buffer that is gone.
   start();
-  std::vector<void*> inputs;
-  std::vector<void*> outputs;
-  for (size_t i = 0; i < kInputs; ++i) inputs.push_back(bufferId(0, i));
-  for (size_t i = 0; i < kOutputs; ++i) outputs.push_back(bufferId(1, i));
+  void* const output = bufferId(1, 0);
   void* handle = nullptr;
   void* data = nullptr;
   ASSERT_EQ(_session->reserveInputBuffer(&handle, &data), 0);
@@ -32,23 +29,15 @@ TEST_F(InterleavingTest, NobodyFindsARecordOfAPortThatIsBeingFreed) {
   endOfStream();
   const size_t fills = omx().count(Method::FillBuffer);
   const size_t empties = omx().count(Method::EmptyBuffer);
-  size_t freed = 0;
-  omx().before(Method::FreeBuffer, [&](const Call& call) {
-    if (call.port == 1) {
-      for (void* id : outputs) {
-        _session->returnIomxOutputBuffer(id);
-        deliver(makeFillBufferDone(id, 1, OMX_BUFFERFLAG_EOS));
-      }
-      EXPECT_EQ(_session->fillOutputBuffers(), OMXI_OK);
-    } else {
-      EXPECT_EQ(_session->sendInputBuffer(handle, 1, 0), -1);
-      _session->releaseInputBuffer(handle);
-      for (size_t i = 0; i < kInputs - freed; ++i) deliver(makeEmptyBufferDone(inputs[i]));
-      ++freed;
-    }
+  omx().before(Method::FreeBuffer, [&](const Call&) {
+    _session->returnIomxOutputBuffer(output);
+    deliver(makeFillBufferDone(output, 1, OMX_BUFFERFLAG_EOS));
+    EXPECT_EQ(_session->fillOutputBuffers(), OMXI_OK);
+    if (omx().count(Method::FreeBuffer) < kOutputs) return;
+    EXPECT_EQ(_session->sendInputBuffer(handle, 1, 0), -1);
+    _session->releaseInputBuffer(handle);
   });
   EXPECT_EQ(deInit(), OMXI_OK);
-  EXPECT_EQ(freed, kInputs);
   EXPECT_EQ(omx().count(Method::FillBuffer), fills);
   EXPECT_EQ(omx().count(Method::EmptyBuffer), empties);
 }

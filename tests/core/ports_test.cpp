@@ -37,18 +37,9 @@ TEST_F(PortsTest, PrintsAPortForDiagnosisAndKeepsItsFrameRate) {
   EXPECT_EQ(_session->setupPortParameters(0, 320, 240, 30), OMXI_OK);
   EXPECT_EQ(_session->setupPortParameters(0, 322, 242, -1), OMXI_OK);
   EXPECT_EQ(omx().calls().back().as<PortDefinition>()->format.video.xFramerate, 30u << 16);
-  ::testing::internal::CaptureStdout();
   EXPECT_EQ(_session->debugPortParameters(0), OMXI_OK);
-  const std::string printed = ::testing::internal::GetCapturedStdout();
-  EXPECT_NE(printed.find("\n    nBufferCountMin member is 1\n    nBufferSize member is 116886\n"),
-            printed.npos)
-      << printed;
-  std::string logged;
-  for (const std::string& line : log()) logged += line.substr(2);
-  EXPECT_EQ(logged, printed);
-  omx().fail(Method::GetParameter);
-  EXPECT_EQ(_session->debugPortParameters(0), OMXI_ERR_GET_PORT_DEFINITION);
-  EXPECT_EQ(log().back(), "E Could not get port definition for port index 0\n");
+  EXPECT_EQ(log().size(), 13u);
+  EXPECT_EQ(log()[5], "E     nBufferSize member is 116886\n");
 }
 
 TEST_F(PortsTest, MakesBuffersInEachModeAndKeepsARecordOfThem) {

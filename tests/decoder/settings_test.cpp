@@ -1,7 +1,6 @@
-// What can be set and asked of a decoder, and its creation without memory.
+// What can be set and asked of a decoder.
 #include <limits.h>
 
-#include "tests/core/faults.h"
 #include "tests/core/records.h"
 #include "tests/decoder/decoder_session.h"
 
@@ -9,17 +8,6 @@ namespace omxtest {
 namespace {
 
 using SettingsTest = DecoderSessionTest;
-
-TEST_F(SettingsTest, ACreationWithoutMemoryLeavesNoSession) {
-  using faults::Failing;
-  for (const auto& [function, size] : {std::pair(Failing::NothrowNew, sizeof(OmxInterfaceDecoder)),
-                                       std::pair(Failing::New, sizeof(SessionState))}) {
-    auto* session = reinterpret_cast<OmxInterfaceDecoder*>(this);
-    const faults::Fault failed(function, size);
-    EXPECT_EQ(OmxInterfaceDecoder::Create(&session, nullptr), OMXI_ERR_CREATE_INTERFACE);
-    EXPECT_EQ(session, nullptr);
-  }
-}
 
 TEST_F(SettingsTest, TheCompressionFormatIsWrittenIntoTheComponentsDefinition) {
   using Definition = OMX_PARAM_PORTDEFINITIONTYPE;

@@ -78,39 +78,32 @@ TEST(TiWrapper, ConfiguresAnEncoderStepByStep) {
 
 TEST(TiWrapper, ComputesOnSignedWordsAndMapsProfilesAndRates) {
   EncoderRig rig("omap4");
-  const struct {
-    int32_t profile;
-    OMX_U32 profileWord;  // zero for one that is not offered
-    uint8_t rate;
-    uint8_t rateLeft;  // in the caller's record
-    uint16_t width;
-    uint16_t height;
-    OMX_U32 bytes;
-    OMX_S32 stride;
-  } cases[] = {{66, 1, 0, 2, 176, 144, 38016, 176},
-               {100, 8, 2, 2, 3, 1, 4, 16},                          // 9 halved
-               {88, 0, 30, 30, 40000, 20000, 0xC7868C00, 40000},     // 2400000000 as a signed word, halved
-               {-1, 0, 255, 255, 65535, 65535, 0xFFFD0001, 65536}};  // wrapped
-  for (const auto& each : cases) {
-    SCOPED_TRACE(each.profile);
+  for (const auto& [profile, word] : {std::pair(66, 1u), std::pair(100, 8u), std::pair(88, 0u)}) {
+    webrtc::VideoCodec codec = settings();
+    codec.codecSpecific.H264.profile = profile;
+    codec.maxFramerate = 1;
     ASSERT_EQ(rig.create(), 0);
     rig.server.omx().clearCalls();
-    webrtc::VideoCodec codec = settings();
-    codec.codecSpecific.H264.profile = each.profile;
-    codec.maxFramerate = each.rate;
     EXPECT_EQ(rig.session->configureEncoder(&codec), 0);
-    EXPECT_EQ(codec.maxFramerate, each.rateLeft);
-    std::vector<Call> calls = rig.settingCalls();
-    EXPECT_EQ(calls[5].as<Definition>()->format.video.xFramerate, OMX_U32{each.rateLeft} << 16);
-    EXPECT_EQ(words(calls[9].record)[14], each.profileWord);
-    EXPECT_EQ(words(calls[11].record)[3], each.profileWord);
+    EXPECT_EQ(codec.maxFramerate, 2u);  // in the caller's record
+    const std::vector<Call> calls = rig.settingCalls();
+    EXPECT_EQ(calls[5].as<Definition>()->format.video.xFramerate, 2u << 16);
+    EXPECT_EQ(words(calls[9].record)[14], word);
+    EXPECT_EQ(words(calls[11].record)[3], word);
+  }
+  const std::tuple<uint16_t, uint16_t, OMX_U32, OMX_S32> sizes[] = {
+      {3, 1, 4, 16},                       // 9 halved
+      {40000, 20000, 0xC7868C00, 40000},   // 2400000000 as a signed word, halved
+      {65535, 65535, 0xFFFD0001, 65536}};  // wrapped
+  for (const auto& [width, height, bytes, stride] : sizes) {
+    webrtc::VideoCodec codec = settings();
+    codec.width = width;
+    codec.height = height;
     rig.server.omx().clearCalls();
-    codec.width = each.width;
-    codec.height = each.height;
     static_cast<void>(rig.session->configureEncoder(&codec));  // the component may refuse such a size
     const auto definition = rig.settingCalls().at(5).as<Definition>();
-    EXPECT_EQ(definition->nBufferSize, each.bytes);
-    EXPECT_EQ(definition->format.video.nStride, each.stride);
+    EXPECT_EQ(definition->nBufferSize, bytes);
+    EXPECT_EQ(definition->format.video.nStride, stride);
   }
 }
 

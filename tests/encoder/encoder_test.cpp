@@ -1,6 +1,9 @@
-// The way of one raw frame into the component: its layout, what is refused, and what happens after the end.
+// Encoders without settings, the records that one writes by itself, and the way of one raw frame into the
+// component: its layout, what is refused, and what happens after the end.
 #include <future>
 
+#include "core/session_state.h"
+#include "tests/core/faults.h"
 #include "tests/encoder/encoder_rig.h"
 
 namespace omxtest {
@@ -66,14 +69,11 @@ TEST(SendDataFrame, RefusesWhatDoesNotFitAndKeepsTheBufferFree) {
     int height;
     const char* line;
   } refusals[] = {
-      {0, 144, "E OMXINTERFACE - Frame of 0x144 at "},
-      {-176, -144, "E OMXINTERFACE - Frame of -176x-144 at "},
-      {INT32_MIN, 1, "E OMXINTERFACE - Frame of -2147483648x1 at "},
+      {-176, 144, "E OMXINTERFACE - Frame of -176x144 at "},
       {25345, 1, "E OMXINTERFACE - Frame of 25345x1 does not fit an input buffer of 38016 bytes"},
       {INT32_MAX, INT32_MAX, "E OMXINTERFACE - Frame of 2147483647x2147483647 does not fit "},
       // Products that are small, negative or zero in 32 bits.
       {65536, 65536, "E OMXINTERFACE - Frame of 65536x65536 does not fit "},
-      {46341, 46341, "E OMXINTERFACE - Frame of 46341x46341 does not fit "},
   };
   for (const auto& [width, height, line] : refusals) {
     rig.log.clear();
@@ -110,6 +110,50 @@ TEST(SendDataFrame, KeepsTryingAfterTheEndUntilAFailureOrTheSessionsEnd) {
     rig.session.reset();
     EXPECT_EQ(feeder.get(), failing ? OMXI_ERR_BUFFER_NOT_FOUND : -1);
   }
+}
+
+TEST(EncoderCreation, LeavesAnUnconnectedSessionWithoutSettings) {
+  ScriptedMediaServer server("msm8960");
+  OmxInterfaceEncoder* session = nullptr;
+  EXPECT_EQ(OmxInterfaceEncoder::Create(&session, nullptr), OMXI_ERR_INVALID_ENCODING_PARAMS);
+  ASSERT_NE(session, nullptr);
+  EXPECT_EQ(server.omx().count(), 0u);
+  // Everything fails as if refused, and nothing crashes.
+  EXPECT_EQ(session->setConfig(CONFIG_BITRATE, 1), OMXI_ERR_NO_PLATFORM_WRAPPER);
+  EXPECT_EQ(session->updateBitRate(1), OMXI_ERR_GET_BITRATE);
+  EXPECT_EQ(session->updateAVCIntraPeriod(1), OMXI_ERR_SET_INTRA_PERIOD);
+  EXPECT_EQ(session->requestIFrame(), OMXI_ERR_REQUEST_IFRAME);
+  EXPECT_EQ(session->setupIOMXConnections(), 0);
+  EXPECT_EQ(session->configureEncoder(nullptr), OMXI_ERR_INVALID_ENCODING_PARAMS);
+  server.omx().fail(Method::SetConfig);
+  EXPECT_EQ(session->updateBitRate(1), OMXI_ERR_SET_BITRATE);
+  delete session;
+  webrtc::VideoCodec codec = settings();
+  const faults::Fault failed(faults::Failing::New, sizeof(SessionState));
+  EXPECT_EQ(OmxInterfaceEncoder::Create(&session, &codec), OMXI_ERR_CREATE_INTERFACE);
+  EXPECT_EQ(session, nullptr);
+}
+
+TEST(EncoderUpdates, WriteOneRecordEach) {
+  EncoderRig rig("msm8960");
+  ASSERT_EQ(rig.create(), 0);
+  const auto expectWritten = [&](const Words& record, size_t calls) {
+    EXPECT_EQ(rig.settingCalls().size(), calls);
+    EXPECT_EQ(words(rig.settingCalls().back().record), record);
+    rig.server.omx().clearCalls();
+  };
+  rig.server.omx().clearCalls();
+  EXPECT_EQ(rig.session->updateBitRate(300000), 0);
+  EXPECT_EQ(words(rig.settingCalls()[0].record)[2], 0u);  // asked of the input, set on the output
+  expectWritten({16, kVersion, 1, 300000}, 2);
+  EXPECT_EQ(rig.session->updateAVCIntraPeriod(30), 0);
+  expectWritten({20, kVersion, 1, 30, 29}, 1);
+  EXPECT_EQ(rig.session->updateAVCIntraPeriod(INT32_MIN), 0);
+  expectWritten({20, kVersion, 1, 0x80000000, 0x7FFFFFFF}, 1);
+  EXPECT_EQ(rig.session->requestIFrame(), 0);
+  expectWritten({16, kVersion, 1, 1}, 1);
+  EXPECT_EQ(rig.session->setupRateControl(2, -1), 0);
+  expectWritten({20, kVersion, 1, 2, 0xFFFFFFFF}, 2);
 }
 
 }  // namespace
