@@ -45,7 +45,7 @@ class LifeTest : public SessionTest, public ::testing::WithParamInterface<Life> 
       _session.reset(decoder);
       EXPECT_EQ(decoder->setInputCompressionFormat(0), 0);
       EXPECT_EQ(_session->setupPortParameters(0, 176, 144, 24), OMXI_OK);
-      _application.onOutput([this](const Output& output) {
+      _application.onOutput([](const Output& output) {
         const auto& info = *static_cast<const DECODEDDATAINFO*>(output.first);
         EXPECT_EQ(info.dataType, GetParam().dataType);
         EXPECT_EQ(output.length, info.dataType == DECODED_DATA_RGB565 ? 50688u : 11u);
