@@ -1,5 +1,5 @@
 // The application's side of a session: its two callbacks, which note what they are given and then do what
-// the test says. The callbacks run on the session's and the delivery threads; a test may ask from its own.
+// the test says. They run on the session's and the delivery threads; a test may ask from its own.
 #pragma once
 
 #include <atomic>
@@ -61,16 +61,8 @@ class Application {
     const std::lock_guard<std::mutex> lock(_mutex);
     return _inputs;
   }
-
-  // End the program where the limit passes.
   void waitForOutputs(size_t count) const {
-    std::unique_lock<std::mutex> lock(_mutex);
-    require(_changed.wait_for(lock, kWaitLimit, [&] { return _outputs.size() >= count; }), "an output");
-  }
-  void waitForInputCallbacks(size_t count) const {
-    std::unique_lock<std::mutex> lock(_mutex);
-    require(_changed.wait_for(lock, kWaitLimit, [&] { return _inputs.size() >= count; }),
-            "an input callback");
+    requireEventually([&] { return outputs().size() >= count; }, "an output");
   }
 
  private:
@@ -78,7 +70,6 @@ class Application {
     auto& self = *static_cast<Application*>(context);
     std::unique_lock<std::mutex> lock(self._mutex);
     self._inputs.push_back(session);
-    self._changed.notify_all();
     const auto handler = self._inputHandler;
     lock.unlock();
     if (handler) handler();
@@ -91,7 +82,6 @@ class Application {
     if (data != nullptr && self._readsData) output.bytes.assign(static_cast<const char*>(data), length);
     std::unique_lock<std::mutex> lock(self._mutex);
     self._outputs.push_back(output);
-    self._changed.notify_all();
     const OutputHandler handler = self._outputHandler;
     lock.unlock();
     return handler ? handler(output) : 0;
@@ -99,7 +89,6 @@ class Application {
 
   std::atomic<bool> _readsData{true};
   mutable std::mutex _mutex;  // guards everything below; not held in handlers
-  mutable std::condition_variable _changed;
   OutputHandler _outputHandler;
   std::function<void()> _inputHandler;
   std::vector<Output> _outputs;

@@ -4,7 +4,6 @@
 #include <errno.h>
 #include <pthread.h>
 
-#include <mutex>
 #include <new>
 #include <type_traits>
 #include <utility>
@@ -48,32 +47,6 @@ bool threadFailsNow() {
   return left == 1;
 }
 
-// Code that runs when something is done to one object.
-template <typename Object, typename... Arguments>
-class Hook {
- public:
-  void set(Object object, std::function<void(Arguments...)> run) {
-    const std::lock_guard<std::mutex> lock(_mutex);
-    _object = object;
-    _run = std::move(run);
-  }
-  void call(Object object, Arguments... arguments) {
-    std::unique_lock<std::mutex> lock(_mutex);
-    if (object != _object) return;
-    const auto run = _run;
-    lock.unlock();
-    run(arguments...);
-  }
-
- private:
-  std::mutex _mutex;  // guards both
-  Object _object = nullptr;
-  std::function<void(Arguments...)> _run;
-};
-
-Hook<ThreadHook::Entry> g_threadHook;
-Hook<sem_t*, SemaphoreCall> g_semaphoreHook;
-
 }  // namespace
 
 Fault::Fault(Failing function, size_t number) : _function(function) {
@@ -84,20 +57,6 @@ Fault::~Fault() {
 }
 size_t Fault::left() const {
   return __atomic_load_n(&failing(_function), __ATOMIC_SEQ_CST);
-}
-
-ThreadHook::ThreadHook(Entry entry, std::function<void()> run) {
-  g_threadHook.set(entry, std::move(run));
-}
-ThreadHook::~ThreadHook() {
-  g_threadHook.set(nullptr, nullptr);
-}
-
-SemaphoreHook::SemaphoreHook(sem_t& semaphore, std::function<void(SemaphoreCall)> run) {
-  g_semaphoreHook.set(&semaphore, std::move(run));
-}
-SemaphoreHook::~SemaphoreHook() {
-  g_semaphoreHook.set(nullptr, nullptr);
 }
 
 }  // namespace faults
@@ -131,13 +90,6 @@ void* __interceptor_malloc(size_t size) __attribute__((weak));
 void* __libc_malloc(size_t size);
 int __interceptor_pthread_create(pthread_t*, const pthread_attr_t*, void* (*)(void*), void*)
     __attribute__((weak));
-int __interceptor_sem_wait(sem_t*) __attribute__((weak));
-int __interceptor_sem_post(sem_t*) __attribute__((weak));
-}
-
-template <typename Function>
-Function* next(Function* interceptor, const char* name) {
-  return interceptor != nullptr ? interceptor : reinterpret_cast<Function*>(dlsym(RTLD_NEXT, name));
 }
 
 // Called before the program, and the sanitizers, are up: nothing in here may need them.
@@ -148,20 +100,10 @@ REPLACED __attribute__((no_sanitize("address", "thread", "undefined"))) void* ma
 
 REPLACED int pthread_create(pthread_t* thread, const pthread_attr_t* attributes, void* (*entry)(void*),
                             void* argument) {
-  faults::g_threadHook.call(entry);
   if (faults::threadFailsNow()) return EAGAIN;
-  static auto* const create = next(&__interceptor_pthread_create, "pthread_create");
+  static auto* const create =
+      __interceptor_pthread_create != nullptr
+          ? &__interceptor_pthread_create
+          : reinterpret_cast<decltype(&pthread_create)>(dlsym(RTLD_NEXT, "pthread_create"));
   return create(thread, attributes, entry, argument);
-}
-
-REPLACED int sem_wait(sem_t* semaphore) {
-  faults::g_semaphoreHook.call(semaphore, faults::SemaphoreCall::Wait);
-  static auto* const wait = next(&__interceptor_sem_wait, "sem_wait");
-  return wait(semaphore);
-}
-
-REPLACED int sem_post(sem_t* semaphore) noexcept {
-  faults::g_semaphoreHook.call(semaphore, faults::SemaphoreCall::Post);
-  static auto* const post = next(&__interceptor_sem_post, "sem_post");
-  return post(semaphore);
 }

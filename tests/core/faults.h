@@ -1,14 +1,9 @@
-// The system below the product on request: the next allocation of a size fails, or the next thread; a thread
-// is made, or a semaphore used, when the test says. All of it concerns the whole process and ends with the
-// object; one object of a kind at a time.
-// The test executable replaces the functions concerned (faults.cpp), so the product runs as it ships.
+// The system below the product on request: the next allocation of a size fails, or a thread. It concerns
+// the whole process and ends with the object; one object of a kind at a time. The test executable replaces
+// the functions concerned (faults.cpp), so the product runs as it ships.
 #pragma once
 
-#include <semaphore.h>
 #include <stddef.h>
-
-#include <atomic>
-#include <functional>
 
 namespace faults {
 
@@ -30,22 +25,6 @@ class Fault {
 
  private:
   const Failing _function;
-};
-
-// Runs `run` on the calling thread, which it may block, just before each thread with that entry is made.
-class ThreadHook {
- public:
-  using Entry = void* (*)(void*);
-  ThreadHook(Entry entry, std::function<void()> run);
-  ~ThreadHook();
-};
-
-// Runs `run` on the calling thread, which it may block, just before each wait for that semaphore, or post.
-enum class SemaphoreCall { Wait, Post };
-class SemaphoreHook {
- public:
-  SemaphoreHook(sem_t& semaphore, std::function<void(SemaphoreCall)> run);
-  ~SemaphoreHook();
 };
 
 }  // namespace faults

@@ -6,7 +6,6 @@
 
 #include <deque>
 #include <memory>
-#include <string>
 #include <vector>
 
 #include <omxhost/log.h>
@@ -22,49 +21,43 @@ namespace omxtest {
 
 using Trace = std::vector<std::string>;
 
-inline constexpr auto kRefused = RecordingOmx::kFailed;
-inline constexpr const char* kRefusedHex = "0x80000000";
-inline constexpr const char* kRefusedText = "-2147483648";
-inline constexpr const char* kEncoderOver = "W OMXINTERFACE - ===DataOutputThread over! enc thread!\n";
 inline constexpr const char* kDecoderOver = "W OMXINTERFACE - ===DataOutputThread over! dec thread!\n";
-
-// The calls as text, buffers by their place: "fillBuffer out0"; without the first `from` of them.
-Trace traceOf(RecordingOmx& omx, size_t from = 0);
 
 class SessionTest : public ::testing::Test {
  protected:
-  enum class Kind { Encoder, Decoder };
   static constexpr size_t kInputs = 4;   // buffers of the scripted components
   static constexpr size_t kOutputs = 6;  // of the encoder
 
   explicit SessionTest(const char* device = "msm8960");
   ~SessionTest() override;
 
-  // --- The session's life ---
-
-  // Constructs the session; an encoder's or a decoder's component, but the session as such.
-  void construct(Kind kind = Kind::Encoder);
+  // Constructs the session as such, with an encoder's component.
+  void construct();
   // ... connects it and registers the application.
-  void connect(Kind kind = Kind::Encoder);
+  void connect();
   // ... brings it to Executing.
-  void start(Kind kind = Kind::Encoder);
-  Later<int> beginInit();
+  void start();
+  Later<int> beginInit() {
+    return {"init()", [session = _session.get()] { return session->init(); }};
+  }
   int init() { return beginInit().result(); }
-  Later<int> beginDeInit();
+  Later<int> beginDeInit() {
+    return {"deInit()", [session = _session.get()] { return session->deInit(); }};
+  }
   int deInit() { return beginDeInit().result(); }
-  Later<int> beginEndOfInput(int timestamp = 0);
+  Later<int> beginEndOfInput(int timestamp = 0) {
+    return {"sendEndOfInputFlag()",
+            [session = _session.get(), timestamp] { return session->sendEndOfInputFlag(timestamp); }};
+  }
   // Sends the end mark and waits until it has come out and been delivered.
   void endOfStream(int timestamp = 0);
-  // Destroys the session, from another thread.
+  // Destroys the session, from another thread. The pointer stays readable for calls in progress.
   Later<bool> beginDestroy();
-  // The same for a session that cannot be gone before the test lets something in progress end: comes
-  // back once destruction has begun.
+  // The same for a session that cannot be gone before the test lets something in progress end: comes back
+  // once destruction has begun.
   Later<bool> beginDestroyOfBusySession();
   void destroy() { beginDestroy().result(); }
-  // A gate that lives as long as the session, for hooks and callbacks.
-  Gate& newGate() { return _gates.emplace_back(); }
-
-  // --- Traffic ---
+  Gate& newGate() { return _gates.emplace_back(); }  // lives as long as the session
 
   int feed(const std::string& text, int timestamp = 0);
   // Feeds and waits for the output.
@@ -72,7 +65,9 @@ class SessionTest : public ::testing::Test {
   // Keeps the component from returning input, and gives it all but `left` buffers.
   void holdInputAllBut(size_t left);
   // The component makes an output of its own accord.
-  void componentProduces(const std::string& text, OMX_TICKS timestamp = 0, OMX_U32 flags = 0);
+  void componentProduces(const std::string& text, OMX_TICKS timestamp = 0, OMX_U32 flags = 0) {
+    script().produce(Packet(text, timestamp, flags));
+  }
   // A message of the test's making reaches the session, and has been dealt with.
   void deliver(const android::omx_message& message);
   void deliverEvent(OMX_EVENTTYPE event, OMX_U32 data1, OMX_U32 data2) {
@@ -84,15 +79,14 @@ class SessionTest : public ::testing::Test {
     messages().releaseAll();
   }
 
-  // --- Asking ---
-
-  Script& script() { return _kind == Kind::Encoder ? _server.encoder() : _server.decoder(); }
+  Script& script() { return _decoding ? _server.decoder() : _server.encoder(); }
   RecordingOmx& omx() { return _server.omx(); }
   MessageTap& messages() { return _server.messages(); }
   void* bufferId(int port, size_t index) const { return _session->_portBuffers[port][index].bufferId; }
   BufferInfo* outputRecord(size_t index) { return &_session->_portBuffers[1].editItemAt(index); }
   size_t busyCount(int port) const;
-  Trace trace(size_t from = 0) { return traceOf(omx(), from); }
+  // The calls as text, buffers by their place: "fillBuffer out0"; without the first `from` of them.
+  Trace trace(size_t from = 0);
   static int valueOf(sem_t& semaphore);
   LogLines log() const { return logLines(_log); }
   // Wait until the condition holds, which is tested with the session's lock held.
@@ -106,16 +100,24 @@ class SessionTest : public ::testing::Test {
         what);
   }
   // ... that many threads sleep in the session's wait for ...
-  void waitForSleeper(int SessionState::*waiters, int count = 1);
-  void waitForBusy(int port, size_t count);
-  void waitForFills(size_t count);
-  void waitForOutputThreadToEnd();
+  void waitForSleeper(int SessionState::*waiters, int count = 1) {
+    requireUnderLock([=](SessionState& state) { return state.*waiters == count; }, "a thread that waits");
+  }
+  void waitForOutputThreadToEnd() {
+    requireUnderLock([](SessionState& state) { return !state.outputThread.running; }, "the thread's end");
+  }
+  void waitForBusy(int port, size_t count) {
+    requireEventually([&] { return busyCount(port) == count; }, "buffers to be where they should");
+  }
+  void waitForFills(size_t count) {
+    require(omx().waitForCalls(Method::FillBuffer, count), "a buffer given to the component");
+  }
 
   std::deque<Gate> _gates;
   omxhost::LogCapture _log;
   ScriptedMediaServer _server;
   Application _application;
-  Kind _kind = Kind::Encoder;
+  bool _decoding = false;
   std::unique_ptr<OmxInterface> _session;
 };
 

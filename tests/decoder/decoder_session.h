@@ -6,15 +6,10 @@
 #include <mutex>
 #include <vector>
 
-#include <media/IOMX.h>
-
 #include "decoder/omx_interface_decoder.h"
 #include "tests/core/session_fixture.h"
 
 namespace omxtest {
-
-// How a decoder takes the event that comes with the end of output.
-inline constexpr const char* kEndEvent = "E Unknown Event (4, 1, 1)";
 
 // A picture as the application got it; the description is of the time of the callback.
 struct Picture {
@@ -27,7 +22,7 @@ class DecoderSessionTest : public SessionTest {
   static constexpr size_t kInputBuffers = 4;  // of the scripted decoder
   static constexpr size_t kOutputBuffers = 8;
 
-  explicit DecoderSessionTest(const char* device = "msm8960") : SessionTest(device) { _kind = Kind::Decoder; }
+  explicit DecoderSessionTest(const char* device = "msm8960") : SessionTest(device) { _decoding = true; }
   ~DecoderSessionTest() override;
 
   void create(const char* componentName = nullptr);
@@ -35,43 +30,38 @@ class DecoderSessionTest : public SessionTest {
   void startDecoder();
   OmxInterfaceDecoder& decoder() { return static_cast<OmxInterfaceDecoder&>(*_session); }
 
-  // endOfStream(), until its event has been handled too.
-  void finishStream(int timestamp = 0);
   // The end of a stream comes out of a component that goes on executing.
   void endOfOutput();
-
   // Sends an event of the test's making, and waits until the event thread has handled it.
   void handleEvent(OMX_EVENTTYPE event, OMX_U32 data1, OMX_U32 data2);
   // Until the event thread has nothing to do, or has ended.
   void waitForEvents();
-  void waitForEndOfEventThread();
-  // Also waits until the picture is among pictures(): the application counts an output before it handles it.
+  void waitForEndOfEventThread() {
+    requireUnderLock([](SessionState& state) { return !state.eventThread.running; },
+                     "the event thread's end");
+  }
+  // Also waits until the picture is among pictures(): the application counts an output before it handles
+  // it.
   void feedThrough(const std::string& text, int timestamp = 0);
   // New settings, told by the test at the moment of its choice, and the session's answer: the command to
   // disable the port has gone out.
-  void announceAndDisable() {
-    deliverEvent(OMX_EventPortSettingsChanged, kOmxOutputPort, 0);
-    requireEventually([this] { return !commands().empty() && commands().back() == "sendCommand disable 1"; },
-                      "the disable");
-  }
-  Trace commands() {
-    Trace lines = trace();
-    std::erase_if(lines, [](const std::string& line) { return line.find("sendCommand") != 0; });
-    return lines;
-  }
+  void announceAndDisable();
+  Trace commands();
   size_t freed() { return omx().count(Method::FreeBuffer); }
-  void waitForPictures(size_t count);
-  std::vector<Picture> pictures() const;
-  // What the application's output callback answers.
-  void answerOutputs(int result);
+  std::vector<Picture> pictures() const {
+    const std::lock_guard<std::mutex> lock(_pictureMutex);
+    return _pictures;
+  }
   // The log without regard to its order: lines of different threads.
   LogLines sortedLog() const { return sorted(log()); }
-  static LogLines sorted(LogLines lines);
+  static LogLines sorted(LogLines lines) {
+    std::sort(lines.begin(), lines.end());
+    return lines;
+  }
 
  private:
   mutable std::mutex _pictureMutex;
   std::vector<Picture> _pictures;
-  int _answer = 0;
 };
 
 }  // namespace omxtest

@@ -1,0 +1,316 @@
+// The chip's generation, and how the vendors' wrappers set up encoders and decoders: which records, byte for
+// byte.
+#include <gtest/gtest.h>
+
+#include <optional>
+
+#include <cutils/properties.h>
+
+#include "decoder/omx_interface_decoder.h"
+#include "platform/board_platform_wrapper.h"
+#include "platform/hardware_version.h"
+#include "tests/encoder/encoder_rig.h"
+
+namespace omxtest {
+namespace {
+
+TEST(HardwareBaseVersionTest, FollowsThePropertyAndThenTheBuildId) {
+  const struct {
+    const char* property;
+    std::optional<std::string> buildId;
+    int version;
+  } cases[] = {
+      {"omap4430", std::nullopt, HW_VERSION_OMAP4},  {"OMAP4", "7630", HW_VERSION_OMAP4},
+      {"omap3630", "7630", HW_VERSION_MSM7X30},      {"omap3630", std::nullopt, HW_VERSION_UNKNOWN},
+      {"msm7x30", "7x30B-SCAQ", HW_VERSION_MSM7X30}, {"msm7x30", "7631", HW_VERSION_QCOM_OTHER},
+      {"msm7x30", "7640", HW_VERSION_QCOM_OTHER},    {"msm7x30", "8255", HW_VERSION_MSM8X55},
+      {"msm8660", "8260\n", HW_VERSION_MSM8X60},     {"msm8960", "8960", HW_VERSION_MSM8X60},
+      {"msm8960", "9960", HW_VERSION_QCOM_OTHER},    {"msm8960", "866", HW_VERSION_UNKNOWN},
+  };
+  for (const auto& each : cases) {
+    property_set("ro.board.platform", each.property);
+    omxhost::setBuildId(each.buildId);
+    EXPECT_EQ(CBoardPlatformWrapper::GetBoardPlatformType(), BOARD_PLATFORM_TI);
+    EXPECT_EQ(getHardwareBaseVersion(), each.version)
+        << each.property << " " << each.buildId.value_or("(no file)");  // asked anew at every call
+  }
+}
+
+using Definition = OMX_PARAM_PORTDEFINITIONTYPE;
+
+TEST(QcomWrapper, ConfiguresAnEncoderStepByStep) {
+  EncoderRig rig("msm8960");
+  rig.server.encoder().answer(OMX_IndexParamVideoAvc, patternRecord<108>(1));
+  ASSERT_EQ(rig.create(), 0);
+  std::vector<Call> calls = rig.settingCalls();
+  ASSERT_EQ(calls.size(), 10U);
+  for (const size_t step : {0U, 2U}) {
+    EXPECT_EQ(calls[step + 1].record, edited<Definition>(calls[step], [](Definition& definition) {
+                definition.format.video.nFrameWidth = 176;
+                definition.format.video.nFrameHeight = 144;
+                definition.format.video.xFramerate = 30 << 16;
+                definition.format.video.eColorFormat = OMX_COLOR_FormatYUV420SemiPlanar;
+              }));
+  }
+  // What the encoder's settings say, and everything else as the component has it.
+  Words avc = words(calls[4].record);
+  avc[4] = 59;                         // nPFrames
+  avc[5] = 0;                          // nBFrames
+  avc[6] = 1;                          // bUseHadamard
+  avc[7] = 2;                          // nRefFrames
+  avc[11] = avc[12] = avc[13] = 0;     // bEnableFMO, bEnableASO, bEnableRS
+  avc[14] = OMX_VIDEO_AVCProfileMain;  // eProfile
+  avc[15] = OMX_VIDEO_AVCLevel31;      // eLevel
+  avc[17] = 1;                         // bFrameMBsOnly
+  avc[18] = 0;                         // bMBAFF
+  avc[19] = 1;                         // bEntropyCodingCABAC
+  avc[20] = 0;                         // bWeightedPPrediction
+  avc[22] = 1;                         // bconstIpred
+  avc[23] = 1;                         // bDirect8x8Inference
+  avc[24] = 0;                         // bDirectSpatialTemporal
+  EXPECT_EQ(words(calls[5].record), avc);
+  EXPECT_EQ(calls[7].record, edited<Definition>(calls[6], [](Definition& definition) {
+              definition.format.video.nBitrate = 500000;
+            }));
+  EXPECT_EQ(words(calls[9].record),
+            (Words{20, kVersion, 1, OMX_Video_ControlRateVariableSkipFrames, 500000}));
+  webrtc::VideoCodec codec = settings();
+  codec.codecType = webrtc::kVideoCodecOther;  // has no H.264 settings
+  ASSERT_EQ(rig.create(codec), 0);
+  calls.erase(calls.begin() + 4, calls.begin() + 6);
+  EXPECT_EQ(rig.settingCalls().size(), calls.size());
+}
+
+class AvcSettings : public ::testing::TestWithParam<const char*> {};
+
+TEST_P(AvcSettings, FollowTheApplicationButOnAnMsm7x30) {
+  const bool baselineOnly = GetParam() == std::string("msm7x30");
+  const OMX_U32 own = patternRecord<108>(1)[14];
+  const struct {
+    int32_t profile;
+    int32_t keyFrameInterval;
+    uint8_t entropyCoding;
+    uint8_t transform8x8;
+    OMX_U32 pFrames;  // written
+    OMX_U32 profileWord;
+  } cases[] = {{66, 30, 0, 0, 29, 1},
+               {100, 0, 1, 1, 0xFFFF, 8},  // no further key frames
+               {88, INT32_MIN, 0, 0, 0x7FFFFFFF, own},
+               {77, 1, 0xC8, 0x80, 0, 2}};  // flags other than 1
+  EncoderRig rig(GetParam());
+  rig.server.encoder().answer(OMX_IndexParamVideoAvc, patternRecord<108>(1));
+  ASSERT_EQ(rig.create(), 0);
+  for (const auto& each : cases) {
+    webrtc::VideoCodecH264 h264 = {};
+    h264.profile = each.profile;
+    h264.keyFrameInterval = each.keyFrameInterval;
+    h264.entropyCoding = each.entropyCoding;
+    h264.transform8x8 = each.transform8x8;
+    EXPECT_EQ(rig.session->setupAvcSettings(&h264), 0);
+    const Words record = words(rig.settingCalls().back().record);
+    EXPECT_EQ((Words{record[4], record[14], record[19], record[23]}),
+              (baselineOnly ? Words{each.pFrames, OMX_VIDEO_AVCProfileBaseline, 0, 0}
+                            : Words{each.pFrames, each.profileWord, each.entropyCoding, each.transform8x8}));
+  }
+}
+
+INSTANTIATE_TEST_SUITE_P(Devices, AvcSettings, ::testing::Values("msm8960", "msm7x30"));
+
+TEST(QcomWrapper, SendsADecoderOneVendorRecordForEachSetting) {
+  ScriptedMediaServer server("msm8960");
+  OmxInterfaceDecoder* session = nullptr;
+  ASSERT_EQ(OmxInterfaceDecoder::Create(&session, nullptr), 0);
+  const std::unique_ptr<OmxInterfaceDecoder> owner(session);
+  const auto last = [&] { return words(server.omx().calls(Method::SetParameter).back().record); };
+  for (const auto& [order, word] : {std::pair(0, 1u), std::pair(1, 2u), std::pair(2, 0u)}) {
+    EXPECT_EQ(session->setPictureOrder(order), 0);
+    EXPECT_EQ(last(), (Words{16, 0, 0, word}));  // without a version
+  }
+  for (const auto& [format, word] : {std::pair(1, 3u), std::pair(2, 1u), std::pair(7, 0u)}) {
+    EXPECT_EQ(session->setInputPackingFormat(format), 0);
+    EXPECT_EQ(last(), (Words{24, kVersion, 0, 0, 0, word}));
+  }
+}
+
+constexpr auto kTiSemiPlanar = static_cast<OMX_COLOR_FORMATTYPE>(0x7F000100);
+
+TEST(TiWrapper, ConfiguresAnEncoderStepByStep) {
+  EncoderRig rig("omap4");
+  rig.server.encoder().answer(OMX_IndexParamVideoAvc, patternRecord<108>(1));
+  rig.server.encoder().answer(OMX_IndexParamVideoProfileLevelCurrent, patternRecord<24>(1));
+  // Near misses in front of the match: another coding, a colour besides the coding.
+  rig.server.encoder().setFormats(1, {{OMX_VIDEO_CodingH263, OMX_COLOR_FormatUnused},
+                                      {OMX_VIDEO_CodingAVC, OMX_COLOR_FormatYUV420SemiPlanar},
+                                      {OMX_VIDEO_CodingAVC, OMX_COLOR_FormatUnused}});
+  webrtc::VideoCodec codec = settings();
+  codec.width = 180;
+  codec.codecSpecific.H264.entropyCoding = 0xC8;
+  ASSERT_EQ(rig.create(codec), 0);
+  std::vector<Call> calls = rig.settingCalls();
+  ASSERT_EQ(calls.size(), 17U);
+  EXPECT_EQ(calls[1].record, calls[0].record) << "the input's format is confirmed as it is";
+  for (const size_t i : {0U, 1U, 2U}) EXPECT_EQ(words(calls[2 + i].record)[3], i);
+  EXPECT_EQ(calls[5].record, calls[4].record) << "the output's third format is the one looked for";
+  calls.erase(calls.begin() + 2, calls.begin() + 4);
+  EXPECT_EQ(calls[5].record, edited<Definition>(calls[4], [](Definition& definition) {
+              definition.nBufferSize = 180 * 144 * 3 / 2;
+              auto& video = definition.format.video;
+              video.nFrameWidth = 180;
+              video.nFrameHeight = 144;
+              video.nStride = 192;
+              video.nSliceHeight = 0;
+              video.xFramerate = 0x1E0000;
+              video.eCompressionFormat = OMX_VIDEO_CodingUnused;
+              video.eColorFormat = kTiSemiPlanar;
+            }));
+  EXPECT_EQ(calls[7].record, edited<Definition>(calls[6], [](Definition& definition) {
+              definition.nBufferCountActual = 4;
+              auto& video = definition.format.video;
+              video.nFrameWidth = 180;
+              video.nFrameHeight = 144;
+              video.nBitrate = 500000;
+              video.xFramerate = 0;
+              video.eCompressionFormat = OMX_VIDEO_CodingAVC;
+              video.eColorFormat = OMX_COLOR_FormatUnused;
+            }));
+  // All of it is ours but the weighted prediction mode.
+  Words avc(27, 0);
+  const std::pair<size_t, OMX_U32> set[] = {{0, 108},
+                                            {1, kVersion},
+                                            {2, 1},
+                                            {4, 60},
+                                            {6, 1},
+                                            {7, 2},
+                                            {14, OMX_VIDEO_AVCProfileMain},
+                                            {15, OMX_VIDEO_AVCLevel31},
+                                            {16, 3},
+                                            {17, 1},
+                                            {19, 0xC8},
+                                            {21, patternRecord<108>(1)[21]}};
+  for (const auto& [place, value] : set) avc[place] = value;
+  EXPECT_EQ(words(calls[9].record), avc);
+  EXPECT_EQ(words(calls[11].record), (Words{24, kVersion, 1, OMX_VIDEO_AVCProfileMain, OMX_VIDEO_AVCLevel31,
+                                            patternRecord<24>(1)[5]}));
+  EXPECT_EQ(words(calls[13].record), (Words{20, kVersion, 1, OMX_Video_ControlRateVariable, 500000}));
+  EXPECT_EQ(calls[14].enable, OMX_FALSE);
+
+  rig.server.encoder().setFormats(1, {{OMX_VIDEO_CodingH263, OMX_COLOR_FormatUnused}});
+  EXPECT_EQ(rig.create(), -1);
+  EXPECT_EQ(rig.settingCalls().size(), 4U);  // up to the list's end
+}
+
+TEST(TiWrapper, ComputesOnSignedWordsAndMapsProfilesAndRates) {
+  EncoderRig rig("omap4");
+  for (const auto& [profile, word] : {std::pair(66, 1u), std::pair(100, 8u), std::pair(88, 0u)}) {
+    webrtc::VideoCodec codec = settings();
+    codec.codecSpecific.H264.profile = profile;
+    codec.maxFramerate = 1;
+    ASSERT_EQ(rig.create(), 0);
+    rig.server.omx().clearCalls();
+    EXPECT_EQ(rig.session->configureEncoder(&codec), 0);
+    EXPECT_EQ(codec.maxFramerate, 2u);  // in the caller's record
+    const std::vector<Call> calls = rig.settingCalls();
+    EXPECT_EQ(calls[5].as<Definition>()->format.video.xFramerate, 2u << 16);
+    EXPECT_EQ(words(calls[9].record)[14], word);
+    EXPECT_EQ(words(calls[11].record)[3], word);
+  }
+  const std::tuple<uint16_t, uint16_t, OMX_U32, OMX_S32> sizes[] = {
+      {3, 1, 4, 16},                       // 9 halved
+      {40000, 20000, 0xC7868C00, 40000},   // 2400000000 as a signed word, halved
+      {65535, 65535, 0xFFFD0001, 65536}};  // wrapped
+  for (const auto& [width, height, bytes, stride] : sizes) {
+    webrtc::VideoCodec codec = settings();
+    codec.width = width;
+    codec.height = height;
+    rig.server.omx().clearCalls();
+    static_cast<void>(rig.session->configureEncoder(&codec));  // the component may refuse such a size
+    const auto definition = rig.settingCalls().at(5).as<Definition>();
+    EXPECT_EQ(definition->nBufferSize, bytes);
+    EXPECT_EQ(definition->format.video.nStride, stride);
+  }
+}
+
+TEST(TiWrapper, ChoosesTheDecodersOwnOutputLayout) {
+  ScriptedMediaServer server("omap4");
+  server.decoder().editPort(0, [](Definition& definition) { definition.nBufferCountActual = 9; });
+  OmxInterfaceDecoder* session = nullptr;
+  ASSERT_EQ(OmxInterfaceDecoder::Create(&session, nullptr), 0);
+  const std::unique_ptr<OmxInterfaceDecoder> owner(session);
+  const std::vector<Call> calls = server.omx().calls();  // behind those that found the component
+  ASSERT_EQ(calls.size(), 9U);
+  EXPECT_EQ(calls[4].record, calls[3].record) << "the second format of the list is the one looked for";
+  EXPECT_EQ(calls[4].as<OMX_VIDEO_PARAM_PORTFORMATTYPE>()->eColorFormat, kTiSemiPlanar);
+  EXPECT_EQ(calls[6].record, edited<Definition>(calls[5], [](Definition& definition) {
+              definition.nBufferCountActual = 4;
+              definition.format.video.eCompressionFormat = OMX_VIDEO_CodingAVC;
+            }));
+  EXPECT_EQ(calls[8].record, edited<Definition>(calls[7], [](Definition& definition) {
+              definition.format.video.eCompressionFormat = OMX_VIDEO_CodingUnused;
+              definition.format.video.eColorFormat = kTiSemiPlanar;
+            }));
+  EXPECT_EQ(session->setInputPackingFormat(1), 0);  // without a call
+  EXPECT_EQ(server.omx().count(), 9U);
+}
+
+struct Item {
+  CONFIGTYPE type;
+  unsigned long value;
+  OMX_U32 index;
+  Words record;
+};
+
+const std::vector<Item> kQcomItems = {
+    {CONFIG_BITRATE, 500000, 0x06000011, {16, kVersion, 1, 500000}},
+    // The size word is the rate as a float.
+    {CONFIG_FRAMERATE, 15, 0x06000012, {0x41700000, kVersion, 1, 0x000F0000}},
+    {CONFIG_FRAMERATE, 0, 0x06000012, {0, kVersion, 1, 0}},
+    {CONFIG_FRAMERATE, 65536, 0x06000012, {0x47800000, kVersion, 1, 0}},
+    {CONFIG_FRAMERATE, 0xFFFFFFFF, 0x06000012, {0x4F800000, kVersion, 1, 0xFFFF8000}},  // saturates
+    {CONFIG_INTRA_PERIOD, 30, 0x7F000007, {24, kVersion, 1, 1, 29, 0}},
+    {CONFIG_INTRA_PERIOD, 0, 0x7F000007, {24, kVersion, 1, 1, 0xFFFFFFFF, 0}},
+    {CONFIG_REQUEST_IFRAME, 77, 0x06000013, {16, kVersion, 1, 1}},
+    {CONFIG_ROTATION, ~0UL, 0x0700000B, {16, kVersion, 1, 0xFFFFFFFF}},
+};
+
+const std::vector<Item> kTiItems = {
+    {CONFIG_BITRATE, 500000, 0x06000011, {16, kVersion, 1, 500000}},
+    // The input port.
+    {CONFIG_FRAMERATE, 15, 0x06000012, {16, kVersion, 0, 0x000F0000}},
+    {CONFIG_FRAMERATE, 1, 0x06000012, {16, kVersion, 0, 0x00020000}},
+    {CONFIG_FRAMERATE, 65537, 0x06000012, {16, kVersion, 0, 0x00010000}},
+    {CONFIG_REQUEST_IFRAME, 77, 0x06000013, {16, kVersion, 1, 1}},
+    {CONFIG_ROTATION, 270, 0x0700000B, {16, kVersion, 1, 270}},
+};
+
+class RuntimeItems : public ::testing::TestWithParam<const char*> {};
+
+TEST_P(RuntimeItems, AreOneRecordEach) {
+  EncoderRig rig(GetParam());
+  ASSERT_EQ(rig.create(), 0);
+  const bool isTi = GetParam() == std::string("omap4");
+  for (const Item& item : isTi ? kTiItems : kQcomItems) {
+    SCOPED_TRACE(testing::Message() << "item " << item.type << " value " << item.value);
+    rig.server.omx().clearCalls();
+    EXPECT_EQ(rig.session->setConfig(item.type, item.value), 0);
+    EXPECT_EQ(logLines(rig.log), LogLines());
+    const std::vector<Call> calls = rig.server.omx().calls();
+    ASSERT_EQ(calls.size(), 1U);
+    EXPECT_EQ(calls[0].method, Method::SetConfig);
+    EXPECT_EQ(static_cast<OMX_U32>(calls[0].index), item.index);
+    EXPECT_EQ(words(calls[0].record), item.record);
+  }
+  rig.server.omx().clearCalls();
+  for (const int type : {5, 6, 0x7FFFFFFF}) {
+    EXPECT_EQ(rig.session->setConfig(static_cast<CONFIGTYPE>(type), 1), OMXI_ERR_SET_CONFIG);
+  }
+  if (isTi) {
+    EXPECT_EQ(rig.session->setConfig(CONFIG_INTRA_PERIOD, 30), 0);  // without a call
+    EXPECT_EQ(rig.server.omx().count(), 0U);
+  }
+  EXPECT_EQ(logLines(rig.log), LogLines());
+}
+
+INSTANTIATE_TEST_SUITE_P(Vendors, RuntimeItems, ::testing::Values("msm8960", "omap4"));
+
+}  // namespace
+}  // namespace omxtest
