@@ -46,32 +46,6 @@ TEST_F(Commands, EveryPairOfStatesIsLegalOrRefused) {
   EXPECT_EQ(decoder.starts(), decoder.stops());
 }
 
-TEST_F(Commands, StatesCommandedInARowAreReachedInThatOrderAndAWayToIdleCanBeGivenUp) {
-  const auto node = client();
-  node->command(OMX_CommandStateSet, OMX_StateIdle);
-  ASSERT_EQ(node->give(kInputPort), android::OK);
-  node->command(OMX_CommandStateSet, OMX_StateLoaded);
-  EXPECT_EQ(node->give(kInputPort), kUnknownError);
-  settle(node.get());
-  EXPECT_EQ(node->messages().count(commandComplete(OMX_CommandStateSet)), 0u);
-  node->freeBuffers(kInputPort);
-  node->expectComplete(OMX_CommandStateSet, OMX_StateLoaded);
-
-  node->messages().clear();
-  for (const OMX_STATETYPE state : {OMX_StateIdle, OMX_StateExecuting}) {
-    node->command(OMX_CommandStateSet, state);
-  }
-  for (OMX_U32 port = 0; port < kPortCount; ++port) node->populate(port);
-  node->expectComplete(OMX_CommandStateSet, OMX_StateExecuting);
-  for (const OMX_STATETYPE state : {OMX_StateIdle, OMX_StateLoaded}) {
-    node->command(OMX_CommandStateSet, state);
-  }
-  for (OMX_U32 port = 0; port < kPortCount; ++port) node->freeBuffers(port);
-  node->expectComplete(OMX_CommandStateSet, OMX_StateLoaded);
-  EXPECT_EQ(node->heard(),
-            (Words{"complete state 2", "complete state 3", "complete state 2", "complete state 1"}));
-}
-
 TEST_F(Commands, ACodecThatDoesNotStartKeepsTheNodeInIdle) {
   const auto node = client();
   node->toIdle();
@@ -176,32 +150,6 @@ TEST_F(Commands, PortsAreClosedAndOpenedInEveryStateWhenTheirBuffersAreGoneAndTh
       EXPECT_EQ(node->outputs().back().text(), "on it goes");
     }
   }
-}
-
-TEST_F(Commands, DisabledPortsDoNotCountAndChangesOfAPortComeOneAfterTheOther) {
-  const auto node = client();
-  node->complete(OMX_CommandPortDisable, kOutputPort);
-  node->command(OMX_CommandStateSet, OMX_StateIdle);
-  node->populate(kInputPort);
-  node->expectComplete(OMX_CommandStateSet, OMX_StateIdle);
-  node->idleToLoaded();
-  node->complete(OMX_CommandPortEnable, kOutputPort);
-
-  node->toExecuting();
-  node->fillAll();
-  node->command(OMX_CommandPortDisable, kOutputPort);
-  node->command(OMX_CommandPortEnable, kOutputPort);
-  node->command(OMX_CommandPortDisable, OMX_ALL);
-  node->expect(fillBufferDone(), 2);
-  node->freeBuffers(kOutputPort);
-  node->expectComplete(OMX_CommandPortDisable, kOutputPort);
-  settle(node.get());
-  node->populate(kOutputPort);
-  node->expectComplete(OMX_CommandPortEnable, kOutputPort);
-  for (OMX_U32 port = 0; port < kPortCount; ++port) node->freeBuffers(port);
-  node->expectComplete(OMX_CommandPortDisable, kInputPort);
-  node->expect(commandComplete(OMX_CommandPortDisable, kOutputPort), 2);
-  EXPECT_EQ(node->messages().count(errorIs(OMX_ErrorPortUnpopulated)), 0u);
 }
 
 TEST_F(Commands, BuffersAreTakenWhereTheyAreDueAndAnUnexpectedFreeIsReported) {

@@ -49,25 +49,11 @@ TEST_F(Parameters, FormatsAndRolesAreEnumeratedToTheirEndAndChosen) {
     EXPECT_EQ(node->definition(kOutputPort).format.video.eColorFormat, kTiFormat);
   }
 
-  OMX_PORT_PARAM_TYPE ports{};
-  EXPECT_EQ(get(OMX_IndexParamVideoInit, &ports), kOk);
-  EXPECT_EQ(ports.nPorts, 2u);
   OMX_PARAM_COMPONENTROLETYPE role{};
   EXPECT_EQ(get(OMX_IndexParamStandardComponentRole, &role), kOk);
   EXPECT_STREQ(reinterpret_cast<const char*>(role.cRole), "video_decoder.avc");
-  EXPECT_EQ(set(OMX_IndexParamStandardComponentRole, role), kOk);
   std::memset(role.cRole, 'x', sizeof(role.cRole));  // without an end
   EXPECT_EQ(set(OMX_IndexParamStandardComponentRole, role), kUnsupported);
-  OMX_PARAM_BUFFERSUPPLIERTYPE supplier{};
-  supplier.eBufferSupplier = OMX_BufferSupplyOutput;
-  EXPECT_EQ(set(OMX_IndexParamCompBufferSupplier, supplier), kOk);
-  supplier.eBufferSupplier = static_cast<OMX_BUFFERSUPPLIERTYPE>(3);
-  EXPECT_EQ(set(OMX_IndexParamCompBufferSupplier, supplier), kUnknownError);
-  EXPECT_EQ(get(OMX_IndexParamCompBufferSupplier, &supplier), kOk);
-  EXPECT_EQ(supplier.eBufferSupplier, OMX_BufferSupplyOutput);
-  OMX_INDEXTYPE index{};
-  EXPECT_EQ(server->getExtensionIndex(node->node(), "OMX.google.android.index.other", &index), kUnknownError);
-  EXPECT_EQ(server->storeMetaDataInBuffers(node->node(), kInputPort, OMX_FALSE), kOk);
 }
 
 TEST_F(Parameters, ADefinitionTakesWhatClientsMayWriteAndKeepsTheRest) {
@@ -143,8 +129,6 @@ TEST_F(Parameters, TheSizeArgumentCountsAndNotTheRecordsOwn) {
   const std::pair<OMX_INDEXTYPE, size_t> records[] = {
       {OMX_IndexParamPortDefinition, sizeof(PortDefinition)},
       {OMX_IndexParamVideoPortFormat, sizeof(OMX_VIDEO_PARAM_PORTFORMATTYPE)},
-      {OMX_IndexParamCompBufferSupplier, sizeof(OMX_PARAM_BUFFERSUPPLIERTYPE)},
-      {OMX_IndexParamVideoInit, sizeof(OMX_PORT_PARAM_TYPE)},
       {OMX_IndexParamStandardComponentRole, sizeof(OMX_PARAM_COMPONENTROLETYPE)},
       {OMX_IndexParamVideoAvc, sizeof(OMX_VIDEO_PARAM_AVCTYPE)},
   };
