@@ -75,17 +75,6 @@ TEST(EncoderSettings, RefuseWhatTheComponentCannotDo) {
   for (const Change change : refused) EXPECT_EQ(run.setAvc(change), kUnsupported);
   const OMX_VIDEO_PARAM_AVCTYPE after = run.avc();
   EXPECT_EQ(memcmp(&before, &after, sizeof(before)), 0) << "nothing of it was taken";
-
-  for (const auto& [device, count] : {std::pair{"msm7x30", 1U}, {"msm8960", 3U}, {"omap4", 3U}}) {
-    EncoderRun each(device);
-    for (const auto profile : {OMX_VIDEO_AVCProfileMain, OMX_VIDEO_AVCProfileHigh}) {
-      EXPECT_EQ(each.setAvc([&](auto& avc) { avc.eProfile = profile; }), count == 1 ? kUnsupported : kOk);
-    }
-    auto entry = makeRecord<OMX_VIDEO_PARAM_PROFILELEVELTYPE>(kOutputPort);
-    const auto index = OMX_IndexParamVideoProfileLevelQuerySupported;
-    while (each.get(index, &entry) == kOk) ++entry.nProfileIndex;
-    EXPECT_EQ(entry.nProfileIndex, count) << device;
-  }
 }
 
 // A client that knows no profile writes 0 and gets the component's own.
