@@ -54,17 +54,8 @@ const Route kToI420[] = {
     {kI420, -90, [](In s, Out d) { return ConvertToI420AndRotateAntiClockwise(s, w, h, d, h, w, kI420); }},
     {kI420, 180, [](In s, Out d) { return ConvertToI420AndMirrorUpDown(s, d, w, h, kI420); }},
     {kYV12, 0, [](In s, Out d) { return ConvertYV12ToI420(s, w, h, d); }},
-    {kYV12, 90, [](In s, Out d) { return ConvertToI420AndRotateClockwise(s, w, h, d, h, w, kYV12); }},
-    {kYV12, -90, [](In s, Out d) { return ConvertToI420AndRotateAntiClockwise(s, w, h, d, h, w, kYV12); }},
-    {kYV12, 180, [](In s, Out d) { return ConvertToI420AndMirrorUpDown(s, d, w, h, kYV12); }},
     {kNV12, 0, [](In s, Out d) { return ConvertNV12ToI420(s, d, w, h); }},
-    {kNV12, 90, [](In s, Out d) { return ConvertNV12ToI420AndRotateClockwise(s, d, w, h); }},
-    {kNV12, -90, [](In s, Out d) { return ConvertNV12ToI420AndRotateAntiClockwise(s, d, w, h); }},
-    {kNV12, 180, [](In s, Out d) { return ConvertNV12ToI420AndRotate180(s, d, w, h); }},
     {kNV21, 0, [](In s, Out d) { return ConvertNV21ToI420(s, d, w, h); }},
-    {kNV21, 90, [](In s, Out d) { return ConvertNV21ToI420AndRotateClockwise(s, d, w, h); }},
-    {kNV21, -90, [](In s, Out d) { return ConvertNV21ToI420AndRotateAntiClockwise(s, d, w, h); }},
-    {kNV21, 180, [](In s, Out d) { return ConvertNV21ToI420AndRotate180(s, d, w, h); }},
     {kYUY2, 0, [](In s, Out d) { return ConvertYUY2ToI420(s, w, h, d, w, h); }},
     {kYUY2, 1, [](In s, Out d) { return ConvertYUY2ToI420interlaced(s, w, h, d, w, h); }},
     {kUYVY, 0, [](In s, Out d) { return ConvertUYVYToI420(w, h, s, d); }},
@@ -99,6 +90,16 @@ TEST(Dispatch, CallsTheConversionOfEachTypeAndRotation) {
   };
   for (const Route& route : kToI420) expectRoute(route, ConvertToI420);
   for (const Route& route : kFromI420) expectRoute(route, ConvertFromI420);
+  // Turning while converting is turning what was converted.
+  for (const VideoType planar : {kYV12, kNV12, kNV21}) {
+    for (const auto mode : {kRotateClockwise, kRotateAntiClockwise, kRotate180}) {
+      Bytes upright(w * h * 3 / 2), expected = upright, turned = upright;
+      ConvertToI420(planar, src.data(), w, h, upright.data(), false, kRotateNone);
+      ConvertToI420(kI420, upright.data(), w, h, expected.data(), false, mode);
+      EXPECT_EQ(ConvertToI420(planar, src.data(), w, h, turned.data(), false, mode), w * h * 3 / 2);
+      EXPECT_EQ(turned, expected) << planar << " turned by " << mode;
+    }
+  }
 }
 
 TEST(Dispatch, RefusesSizesTypesAndRotations) {

@@ -96,26 +96,6 @@ TEST_F(Lifetime, WrongNamesIdsAndArgumentsAreRefusedByEveryCall) {
   expectAllRefused(freed, buffer);
 }
 
-TEST_F(Lifetime, FreeingWorksFromEveryStateWithBuffersOnEitherSide) {
-  decoder.holdInput();
-  for (const OMX_STATETYPE state :
-       {OMX_StateLoaded, OMX_StateIdle, OMX_StateExecuting, OMX_StatePause, OMX_StateWaitForResources}) {
-    const auto node = client();
-    reach(node.get(), state);
-    if (state == OMX_StateExecuting || state == OMX_StatePause) {
-      node->fillAll();
-      node->empty(0, "never seen");
-    }
-    if (state == OMX_StateLoaded) {
-      node->command(OMX_CommandStateSet, OMX_StateIdle);
-      node->give(kInputPort);  // and not all
-    }
-    EXPECT_EQ(node->free(), android::OK);
-    EXPECT_EQ(decoder.liveCodecs(), 0u);
-    EXPECT_EQ(decoder.starts(), decoder.stops());
-  }
-}
-
 // A client that ends without a word: its nodes go, whatever they were doing, and nobody else's.
 TEST_F(Lifetime, NodesGoWithTheClientThatLetsGoOfItsObserver) {
   const auto other = running(kEncoder);

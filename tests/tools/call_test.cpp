@@ -115,23 +115,6 @@ TEST(Call, RecoversFromLossesTheSameWayEveryTimeAndReportsThem) {
   EXPECT_TRUE(contentOf(snapshot).starts_with("\x89PNG"));
 }
 
-TEST(Call, TakesItsOwnOutputBackInEveryForm) {
-  const TemporaryDirectory directory;
-  const std::string y4m = directory.file("a.y4m");
-  const std::string raw = directory.file("a.yuv");
-  report({"call", "-s", "64x48", "-n", "9", "--fps", "29.97", "-o", y4m});
-  const json fromFile = report({"call", y4m, "-o", raw});
-  EXPECT_EQ(fromFile["frames_decoded"], 9);
-  EXPECT_EQ(fromFile["fps"], 29.97);
-  const json fromRaw = report({"call", raw, "-s", "64x48", "-n", "7", "--fps", "12"});
-  EXPECT_EQ(fromRaw["frames_in"], 7);
-
-  const Ended piped = runTool({"call", "-", "-o", "-"}, {.in = y4m});
-  EXPECT_EQ(piped.exitCode, 0) << piped.err;
-  EXPECT_EQ(picturesIn(directory.write("piped.y4m", piped.out), 64 * 48 * 3 / 2), 9);
-  EXPECT_TRUE(contains(piped.err, "Decoded        9")) << piped.err;
-}
-
 TEST(Call, GoesOnWithACutInputAndSaysSo) {
   const TemporaryDirectory directory;
   report({"call", "-s", "64x48", "-n", "9", "-o", directory.file("a.y4m")});

