@@ -84,7 +84,7 @@ inline void pairs(bool join, bool vFirst, const Bytes& src, Bytes& dst, Size s) 
 }
 
 inline void cropNv12(const Bytes& src, Size s, std::array<int, 4> ltrb, Bytes& dst) {
-  const auto [left, top, right, bottom] = ltrb;
+  const int left = ltrb[0], top = ltrb[1], right = ltrb[2], bottom = ltrb[3];
   const int width = static_cast<int>(s.width), height = static_cast<int>(s.height);
   std::size_t to = 0;
   const auto take = [&](int row) {
