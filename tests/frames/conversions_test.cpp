@@ -140,18 +140,21 @@ std::vector<Function> functions() {
   Function copy = strided("I420ToI420", ConvertI420ToI420, 3, i420ToI420);
   copy.result = [](Size s, unsigned stride) { return std::size_t{s.height / 2} * stride * 3; };
   copy.zeroSize = 0;
+  Function rgbToArgb = strided("RGB24ToARGB", ConvertRGB24ToARGB, 8, rgb24ToArgb);
+  rgbToArgb.srcHalves = 6;
   return {
       tight("YV12ToI420", sizeBetween<ConvertYV12ToI420>, 3, exchangeChroma),
-      tight("I420ToNV12", ConvertI420ToNV12, 3, std::bind(interleave, false, _1, _2, _3)),
-      tight("I420ToNV21", ConvertI420ToNV21, 3, std::bind(interleave, true, _1, _2, _3)),
-      tight("NV12ToI420", ConvertNV12ToI420, 3, std::bind(split, false, _1, _2, _3)),
-      tight("NV21ToI420", ConvertNV21ToI420, 3, std::bind(split, true, _1, _2, _3)),
+      tight("I420ToNV12", ConvertI420ToNV12, 3, std::bind(pairs, true, false, _1, _2, _3)),
+      tight("I420ToNV21", ConvertI420ToNV21, 3, std::bind(pairs, true, true, _1, _2, _3)),
+      tight("NV12ToI420", ConvertNV12ToI420, 3, std::bind(pairs, false, false, _1, _2, _3)),
+      tight("NV21ToI420", ConvertNV21ToI420, 3, std::bind(pairs, false, true, _1, _2, _3)),
       tight("YUY2ToI420", sizeFirst<ConvertYUY2ToI420>, 4, std::bind(unpack, kYuy2, true, _1, _2, _3),
             evenRows),
       tight("UYVYToI420", sizeFirst<ConvertUYVYToI420>, 4, std::bind(unpack, kUyvy, false, _1, _2, _3),
             evenRows),
       strided("I420ToYV12", ConvertI420ToYV12, 3, i420ToYv12),
       copy,
+      rgbToArgb,
       strided("I420ToYUY2", ConvertI420ToYUY2, 4, std::bind(pack, kYuy2, _1, _2, _3, _4)),
       strided("I420ToUYVY", ConvertI420ToUYVY, 4, std::bind(pack, kUyvy, _1, _2, _3, _4)),
       centred("I420Centred", ConvertI420ToI420, 3, i420Centred, evenRows),
@@ -234,12 +237,6 @@ TEST_P(Conversions, EqualReferenceForEverySizeStrideAndMargin) {
     for (const unsigned height : {16u, 31u, 32u, 63u, 64u, 65u, 129u, 140u}) {
       if (!HasFailure()) expectReference({width, height}, {width, height}, width);
     }
-  }
-  // All small differences in both directions, so that each rounding of a margin comes up.
-  for (unsigned k = 0; function.shape == Shape::kCentred && k < 400 && !HasFailure(); ++k) {
-    const Size any{k % 20 + 1, k / 20 + 1};
-    expectReference(any, {10, 10}, 10);
-    for (const Size from : {Size{10, 10}, Size{9, 7}}) expectReference(from, any, any.width);
   }
 }
 

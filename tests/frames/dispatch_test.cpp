@@ -54,17 +54,8 @@ const Route kToI420[] = {
     {kI420, -90, [](In s, Out d) { return ConvertToI420AndRotateAntiClockwise(s, w, h, d, h, w, kI420); }},
     {kI420, 180, [](In s, Out d) { return ConvertToI420AndMirrorUpDown(s, d, w, h, kI420); }},
     {kYV12, 0, [](In s, Out d) { return ConvertYV12ToI420(s, w, h, d); }},
-    {kYV12, 90, [](In s, Out d) { return ConvertToI420AndRotateClockwise(s, w, h, d, h, w, kYV12); }},
-    {kYV12, -90, [](In s, Out d) { return ConvertToI420AndRotateAntiClockwise(s, w, h, d, h, w, kYV12); }},
-    {kYV12, 180, [](In s, Out d) { return ConvertToI420AndMirrorUpDown(s, d, w, h, kYV12); }},
     {kNV12, 0, [](In s, Out d) { return ConvertNV12ToI420(s, d, w, h); }},
-    {kNV12, 90, [](In s, Out d) { return ConvertNV12ToI420AndRotateClockwise(s, d, w, h); }},
-    {kNV12, -90, [](In s, Out d) { return ConvertNV12ToI420AndRotateAntiClockwise(s, d, w, h); }},
-    {kNV12, 180, [](In s, Out d) { return ConvertNV12ToI420AndRotate180(s, d, w, h); }},
     {kNV21, 0, [](In s, Out d) { return ConvertNV21ToI420(s, d, w, h); }},
-    {kNV21, 90, [](In s, Out d) { return ConvertNV21ToI420AndRotateClockwise(s, d, w, h); }},
-    {kNV21, -90, [](In s, Out d) { return ConvertNV21ToI420AndRotateAntiClockwise(s, d, w, h); }},
-    {kNV21, 180, [](In s, Out d) { return ConvertNV21ToI420AndRotate180(s, d, w, h); }},
     {kYUY2, 0, [](In s, Out d) { return ConvertYUY2ToI420(s, w, h, d, w, h); }},
     {kYUY2, 1, [](In s, Out d) { return ConvertYUY2ToI420interlaced(s, w, h, d, w, h); }},
     {kUYVY, 0, [](In s, Out d) { return ConvertUYVYToI420(w, h, s, d); }},
@@ -88,29 +79,31 @@ const Route kFromI420[] = {
 TEST(Dispatch, CallsTheConversionOfEachTypeAndRotation) {
   Content content(61);
   const Bytes src = content.bytes(w * h * 4), dst = content.bytes(w * h * 4);
-  const auto expectRoute = [&](const auto& routes, unsigned wanted, int how, const Conversion& dispatched) {
+  const auto expectRoute = [&](const Route& route, auto dispatcher) {
+    SCOPED_TRACE("type " + std::to_string(route.type) + " how " + std::to_string(route.how));
     Bytes expected = dst;
-    int result = 0;
-    for (const Route& route : routes) {
-      if (route.type == wanted && route.how == how) result = route.call(src.data(), expected.data());
-    }
-    expectConversion(dispatched, src, dst, expected, result);
+    const int result = route.call(src.data(), expected.data());
+    const bool interlaced = route.how == 1;
+    const auto mode = static_cast<VideoRotationMode>(interlaced ? 0 : route.how);
+    expectConversion([&](In s, Out d) { return dispatcher(route.type, s, w, h, d, interlaced, mode); }, src,
+                     dst, expected, result);
   };
-  for (unsigned k = 0; k < 16 * 12; ++k) {
-    const unsigned value = k % 16;
-    const int rotation = std::array{0, 90, -90, 180, 45, 270}[k / 16 % 6];
-    const bool interlaced = k / 16 >= 6, turns = value == kI420 || value == kYV12 || value >= kNV21;
-    const auto mode = static_cast<VideoRotationMode>(rotation);
-    SCOPED_TRACE("type " + std::to_string(value) + " turned by " + std::to_string(rotation));
-    const int how = turns ? rotation : value == kYUY2 || value == kUYVY ? interlaced : 0;
-    expectRoute(kToI420, value, how,
-                [&](In s, Out d) { return ConvertToI420(type(value), s, w, h, d, interlaced, mode); });
-    expectRoute(kFromI420, value, 0,
-                [&](In s, Out d) { return ConvertFromI420(type(value), s, w, h, d, interlaced, mode); });
+  for (const Route& route : kToI420) expectRoute(route, ConvertToI420);
+  for (const Route& route : kFromI420) expectRoute(route, ConvertFromI420);
+  // Turning while converting is turning what was converted.
+  for (const VideoType planar : {kYV12, kNV12, kNV21}) {
+    for (const auto mode : {kRotateClockwise, kRotateAntiClockwise, kRotate180}) {
+      Bytes upright(w * h * 3 / 2), expected = upright, turned = upright;
+      ConvertToI420(planar, src.data(), w, h, upright.data(), false, kRotateNone);
+      ConvertToI420(kI420, upright.data(), w, h, expected.data(), false, mode);
+      EXPECT_EQ(ConvertToI420(planar, src.data(), w, h, turned.data(), false, mode), w * h * 3 / 2);
+      EXPECT_EQ(turned, expected) << planar << " turned by " << mode;
+    }
   }
 }
 
-TEST(Dispatch, RefusesSizesBeforeTheType) {
+TEST(Dispatch, RefusesSizesTypesAndRotations) {
+  std::uint8_t src[24] = {}, dst[24];
   for (unsigned value = 0; value < 16; ++value) {
     for (const auto& [width, height] : {std::pair{0u, 10u}, {10u, 0u}}) {
       EXPECT_EQ(ConvertToI420(type(value), nullptr, width, height, nullptr, false, kRotateNone), -1);
@@ -119,6 +112,9 @@ TEST(Dispatch, RefusesSizesBeforeTheType) {
   }
   EXPECT_EQ(ConvertToI420(kI420, nullptr, 0x10000, 0x10000, nullptr, false, kRotateNone), -1);
   EXPECT_EQ(ConvertFromI420(kI420, nullptr, 0x10000, 0x10000, nullptr, false, kRotateNone), -1);
+  EXPECT_EQ(ConvertToI420(kI420, src, 4, 4, dst, false, static_cast<VideoRotationMode>(45)), 0);
+  EXPECT_EQ(ConvertToI420(type(99), src, 4, 4, dst, false, kRotateNone), 0);
+  EXPECT_EQ(ConvertFromI420(kNV12, src, 4, 4, dst, false, kRotateNone), 0);
 }
 
 }  // namespace

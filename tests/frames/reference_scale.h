@@ -26,15 +26,11 @@ inline void upHalf(Bytes& buffer, Size s) {
 inline void downHalf(Bytes& buffer, Size s) {
   const Bytes in = buffer;
   std::size_t to = 0;
-  for (std::size_t row = 0; row < s.height; ++row) {
-    const std::size_t from = row * (s.width / 2 * 2);
-    for (std::size_t k = 0; k < s.width / 2; ++k)
-      buffer[to++] = average(in[from + 2 * k], in[from + 2 * k + 1]);
-  }
-  for (std::size_t row = 0; row < s.height; ++row) {
-    const std::size_t from = s.area() + row * (s.width / 4 * 2);
-    for (std::size_t k = 0; k < s.width / 4; ++k)
-      buffer[to++] = average(in[from + 2 * k], in[from + 2 * k + 1]);
+  for (const bool chroma : {false, true}) {
+    const std::size_t start = chroma ? s.area() : 0, samples = chroma ? s.width / 4 : s.width / 2;
+    for (std::size_t k = 0; k < s.height * samples; ++k) {
+      buffer[to++] = average(in[start + 2 * k], in[start + 2 * k + 1]);
+    }
   }
 }
 

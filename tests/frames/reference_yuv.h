@@ -74,24 +74,17 @@ inline void i420Centred(const Bytes& src, Size from, Bytes& dst, Size to) {
   }
 }
 
-inline void interleave(bool vFirst, const Bytes& src, Bytes& dst, Size s) {
+// Between planes and pairs of chroma.
+inline void pairs(bool join, bool vFirst, const Bytes& src, Bytes& dst, Size s) {
   copy(src, 0, 0, dst, 0, 0, s.area(), 1);
-  for (std::size_t i = 0; i < s.area() / 4; ++i) {
-    dst[s.area() + 2 * i + (vFirst ? 1 : 0)] = src[s.area() + i];
-    dst[s.area() + 2 * i + (vFirst ? 0 : 1)] = src[vByArea(s) + i];
-  }
-}
-
-inline void split(bool vFirst, const Bytes& src, Bytes& dst, Size s) {
-  copy(src, 0, 0, dst, 0, 0, s.area(), 1);
-  for (std::size_t i = 0; i < s.area() / 4; ++i) {
-    dst[s.area() + i] = src[s.area() + 2 * i + (vFirst ? 1 : 0)];
-    dst[vByArea(s) + i] = src[s.area() + 2 * i + (vFirst ? 0 : 1)];
+  for (std::size_t i = 0; i < s.area() / 4 * 2; ++i) {
+    const std::size_t pair = s.area() + i, plane = i % 2 == (vFirst ? 1 : 0) ? s.area() : vByArea(s);
+    (join ? dst[pair] : dst[plane + i / 2]) = join ? src[plane + i / 2] : src[pair];
   }
 }
 
 inline void cropNv12(const Bytes& src, Size s, std::array<int, 4> ltrb, Bytes& dst) {
-  const auto [left, top, right, bottom] = ltrb;
+  const int left = ltrb[0], top = ltrb[1], right = ltrb[2], bottom = ltrb[3];
   const int width = static_cast<int>(s.width), height = static_cast<int>(s.height);
   std::size_t to = 0;
   const auto take = [&](int row) {

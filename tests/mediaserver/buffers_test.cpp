@@ -124,31 +124,6 @@ TEST_F(Buffers, EndOfStreamComesOutOnceAndLast) {
   }
 }
 
-TEST_F(Buffers, WhatFollowsTheEndWaitsUntilItIsOutOrFlushed) {
-  decoder.onInput([](const Packet& input) {
-    return input.flags != 0 ? std::vector<Packet>{} : std::vector<Packet>{input};
-  });
-  for (const bool flushed : {false, true}) {
-    const auto node = client();
-    node->toExecuting();
-    node->empty(0, "", OMX_BUFFERFLAG_EOS);
-    node->empty(1, "next stream");
-    node->expect(emptyBufferDone());
-    settle(node.get());
-    EXPECT_EQ(node->messages().count(emptyBufferDone()), 1u);
-    if (flushed) {
-      node->command(OMX_CommandFlush, OMX_ALL);
-      node->expectComplete(OMX_CommandFlush, kOutputPort);
-      node->empty(1, "next stream");
-    }
-    node->fillAll();
-    node->expect(fillBufferDone(), flushed ? 1 : 2);
-    ASSERT_FALSE(node->outputs().empty());
-    EXPECT_EQ(node->outputs().back().text(), "next stream");
-    EXPECT_EQ(node->messages().count(eventIs(OMX_EventBufferFlag)), flushed ? 0u : 1u);
-  }
-}
-
 TEST_F(Buffers, FreedWhileTheCodecWorksOnThemHarmNobody) {
   const auto node = running();
   std::atomic<bool> inside{false};

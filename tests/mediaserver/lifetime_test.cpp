@@ -38,8 +38,7 @@ class Lifetime : public NodeTest {
     std::vector<uint8_t> record(sizeof(PortDefinition));
     OMX_STATETYPE state{};
     OMX_INDEXTYPE index{};
-    OMX_U32 usage = 0;
-    BufferId given[3] = {&given, &given, &given};
+    BufferId given = &given;
     void* data = &data;
     const android::sp<android::IMemory> block = (new android::MemoryDealer(4096, "test"))->allocate(4096);
     const auto port = OMX_IndexParamPortDefinition;
@@ -50,19 +49,16 @@ class Lifetime : public NodeTest {
                                          server->getConfig(node, crop, record.data(), record.size()),
                                          server->setConfig(node, crop, record.data(), record.size()),
                                          server->getState(node, &state),
-                                         server->storeMetaDataInBuffers(node, 0, OMX_FALSE),
-                                         server->enableGraphicBuffers(node, 0, OMX_FALSE),
-                                         server->getGraphicBufferUsage(node, 0, &usage),
-                                         server->useBuffer(node, 0, block, &given[0]),
-                                         server->allocateBuffer(node, 0, 4096, &given[1], &data),
-                                         server->allocateBufferWithBackup(node, 0, block, &given[2]),
+                                         server->useBuffer(node, 0, block, &given),
+                                         server->allocateBuffer(node, 0, 4096, &given, &data),
+                                         server->allocateBufferWithBackup(node, 0, block, &given),
                                          server->freeBuffer(node, 0, buffer),
                                          server->fillBuffer(node, buffer),
                                          server->emptyBuffer(node, buffer, 0, 0, 0, 0),
                                          server->getExtensionIndex(node, "x", &index),
                                          server->freeNode(node)};
     for (const android::status_t& result : results) EXPECT_EQ(result, kUnknownError) << &result - results;
-    for (const BufferId each : given) EXPECT_EQ(each, nullptr);
+    EXPECT_EQ(given, nullptr);
     EXPECT_EQ(data, nullptr);
   }
 };
@@ -98,45 +94,6 @@ TEST_F(Lifetime, WrongNamesIdsAndArgumentsAreRefusedByEveryCall) {
   const NodeId freed = node->node();
   EXPECT_EQ(node->free(), android::OK);
   expectAllRefused(freed, buffer);
-
-  // Nothing where something is needed.
-  other->executingToIdle();
-  const NodeId id = other->node();
-  BufferId given = nullptr;
-  void* data = nullptr;
-  const android::sp<android::IMemory> block = (new android::MemoryDealer(64, "test"))->allocate(64);
-  server->sendCommand(id, OMX_CommandPortDisable, kInputPort);
-  other->freeBuffers(kInputPort);
-  for (const android::status_t result :
-       {server->getState(id, nullptr), server->getExtensionIndex(id, nullptr, nullptr),
-        server->useBuffer(id, kInputPort, nullptr, &given), server->useBuffer(id, kInputPort, block, nullptr),
-        server->useBuffer(id, kPortCount, block, &given),
-        server->allocateBufferWithBackup(id, kInputPort, nullptr, &given),
-        server->allocateBuffer(id, kInputPort, 64, nullptr, &data),
-        server->allocateBuffer(id, kInputPort, 64, &given, nullptr),
-        server->allocateBuffer(id, kInputPort, SIZE_MAX, &given, &data)}) {
-    EXPECT_EQ(result, kUnknownError);
-  }
-}
-
-TEST_F(Lifetime, FreeingWorksFromEveryStateWithBuffersOnEitherSide) {
-  decoder.holdInput();
-  for (const OMX_STATETYPE state :
-       {OMX_StateLoaded, OMX_StateIdle, OMX_StateExecuting, OMX_StatePause, OMX_StateWaitForResources}) {
-    const auto node = client();
-    reach(node.get(), state);
-    if (state == OMX_StateExecuting || state == OMX_StatePause) {
-      node->fillAll();
-      node->empty(0, "never seen");
-    }
-    if (state == OMX_StateLoaded) {
-      node->command(OMX_CommandStateSet, OMX_StateIdle);
-      node->give(kInputPort);  // and not all
-    }
-    EXPECT_EQ(node->free(), android::OK);
-    EXPECT_EQ(decoder.liveCodecs(), 0u);
-    EXPECT_EQ(decoder.starts(), decoder.stops());
-  }
 }
 
 // A client that ends without a word: its nodes go, whatever they were doing, and nobody else's.

@@ -31,45 +31,44 @@ class SettingsChange : public NodeTest {
 TEST_F(SettingsChange, GoesThroughDisableAndEnableAndLosesNoPicture) {
   const auto node = running();
   for (const OMX_U32 index : {0u, static_cast<OMX_U32>(OMX_IndexParamPortDefinition)}) {
-    for (const OMX_U32 width : {320u, 64u}) {
-      node->messages().clear();
-      decoder.holdOutput();
-      decoder.produce(Packet("last of the old size"));
-      decoder.announce(
-          [=](PortDefinition& output) {
-            output.nBufferSize = 256;
-            output.nBufferCountActual = 3;
-            output.format.video.nFrameWidth = width;
-          },
-          index);
-      decoder.passOutput();
-      node->expect(fillBufferDone());
-      sendBackAll(node.get());
-      node->expect(changed);
-      // The codec goes on working; what it makes waits.
-      node->empty(0, std::string(64, 'L'));
-      node->empty(1, "second");
-      node->expect(emptyBufferDone(), 2);
-      settle(node.get());
-      ASSERT_EQ(node->outputs().size(), 1u) << "one buffer at least is held back";
-      EXPECT_EQ(node->outputs()[0].text(), "last of the old size");
-      EXPECT_EQ(node->definition(kOutputPort).nBufferSize, 256u);
-      EXPECT_EQ(node->definition(kOutputPort).format.video.nFrameWidth, width);
+    const OMX_U32 width = index == 0 ? 320 : 64;
+    node->messages().clear();
+    decoder.holdOutput();
+    decoder.produce(Packet("last of the old size"));
+    decoder.announce(
+        [=](PortDefinition& output) {
+          output.nBufferSize = 256;
+          output.nBufferCountActual = 3;
+          output.format.video.nFrameWidth = width;
+        },
+        index);
+    decoder.passOutput();
+    node->expect(fillBufferDone());
+    sendBackAll(node.get());
+    node->expect(changed);
+    // The codec goes on working; what it makes waits.
+    node->empty(0, std::string(64, 'L'));
+    node->empty(1, "second");
+    node->expect(emptyBufferDone(), 2);
+    settle(node.get());
+    ASSERT_EQ(node->outputs().size(), 1u) << "one buffer at least is held back";
+    EXPECT_EQ(node->outputs()[0].text(), "last of the old size");
+    EXPECT_EQ(node->definition(kOutputPort).nBufferSize, 256u);
+    EXPECT_EQ(node->definition(kOutputPort).format.video.nFrameWidth, width);
 
-      const size_t held = node->buffers(kOutputPort).size();
-      node->messages().clear();
-      reallocate(node.get(), held);
-      Words heard(held, "filled");
-      heard.insert(heard.end(), {"complete disable 1", "complete enable 1"});
-      EXPECT_EQ(node->heard(), heard);
-      node->messages().clear();
-      node->fillAll();
-      node->expect(fillBufferDone(), 2);
-      EXPECT_EQ(node->outputs()[0].text(), std::string(64, 'L'));
-      EXPECT_EQ(node->outputs()[1].text(), "second");
-      EXPECT_EQ(decoder.configured()->at(kOutputPort).nBufferCountActual, 3u);
-      sendBackAll(node.get());
-    }
+    const size_t held = node->buffers(kOutputPort).size();
+    node->messages().clear();
+    reallocate(node.get(), held);
+    Words heard(held, "filled");
+    heard.insert(heard.end(), {"complete disable 1", "complete enable 1"});
+    EXPECT_EQ(node->heard(), heard);
+    node->messages().clear();
+    node->fillAll();
+    node->expect(fillBufferDone(), 2);
+    EXPECT_EQ(node->outputs()[0].text(), std::string(64, 'L'));
+    EXPECT_EQ(node->outputs()[1].text(), "second");
+    EXPECT_EQ(decoder.configured()->at(kOutputPort).nBufferCountActual, 3u);
+    sendBackAll(node.get());
   }
 }
 
@@ -117,39 +116,6 @@ TEST_F(SettingsChange, IsFollowedByNoEventBeforeTheBuffersAreBack) {
   EXPECT_EQ(node->heard(), (Words{"filled", "filled", corrupt, "complete disable 1", "complete enable 1"}));
   node->fillAll();
   node->expect(eventIs(OMX_EventBufferFlag));
-}
-
-TEST_F(SettingsChange, IsAnnouncedAgainAfterIdleAndSettledByLoadedAlsoHalfWayThroughReallocation) {
-  const auto node = running();
-  decoder.announce(320, 240);
-  node->expect(changed);
-  node->messages().clear();
-  node->executingToIdle();
-  EXPECT_EQ(node->messages().count(fillBufferDone()), 2u);
-  node->complete(OMX_CommandStateSet, OMX_StateExecuting);
-  settle(node.get());
-  EXPECT_EQ(node->messages().count(changed), 0u) << "there is nothing to hold back yet";
-  node->fillAll();
-  node->expect(changed);
-  node->executingToIdle();
-  node->idleToLoaded();
-  node->messages().clear();
-  node->toExecuting();
-  node->fillAll();
-  node->empty(0, "in new buffers");
-  node->expect(fillBufferDone());
-  EXPECT_EQ(node->messages().count(changed), 0u);
-  // A client that stops half-way through the reallocation.
-  sendBackAll(node.get());
-  decoder.announce(64, 48);
-  node->expect(changed);
-  node->command(OMX_CommandPortDisable, kOutputPort);
-  node->freeBuffers(kOutputPort);
-  node->expectComplete(OMX_CommandPortDisable, kOutputPort);
-  node->command(OMX_CommandPortEnable, kOutputPort);
-  EXPECT_EQ(node->give(kOutputPort), android::OK);  // and then no more
-  node->executingToIdle();
-  node->idleToLoaded();
 }
 
 }  // namespace

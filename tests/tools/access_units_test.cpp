@@ -221,16 +221,4 @@ TEST(AccessUnits, AreReadOverTheEdgesOfTheBuffer) {
   EXPECT_EQ(cut(joined(expected)).units, expected);
 }
 
-TEST(AccessUnits, TellPicturesFromParametersAlone) {
-  const auto bytes = [](const std::string& text) { return std::vector<uint8_t>(text.begin(), text.end()); };
-  const auto parameters = bytes(joined(withStartCodes({{sps(false, kHigh), pps()}})));
-  EXPECT_FALSE(holdsPicture(parameters));
-  EXPECT_FALSE(holdsPicture({}));
-  EXPECT_TRUE(holdsPicture(bytes(joined(withStartCodes({{sps(), pps(), slice({.idr = true})}})))));
-  const auto info = findSequenceInfo(parameters);
-  ASSERT_TRUE(info);
-  EXPECT_EQ(toText(*info), "High, level 3.1");
-  EXPECT_FALSE(findSequenceInfo(bytes(joined(withStartCodes({{slice({})}})))));
-}
-
 }  // namespace

@@ -86,12 +86,17 @@ INSTANTIATE_TEST_SUITE_P(Device, CallOn,
                                          DeviceCase{"omap4", 35}),
                          [](const auto& instance) { return std::string(instance.param.name); });
 
-TEST(Call, RecoversFromLossesTheSameWayEveryTime) {
+TEST(Call, RecoversFromLossesTheSameWayEveryTimeAndReportsThem) {
+  const TemporaryDirectory directory;
+  const std::string page = directory.file("call.html");
+  const std::string snapshot = directory.file("first.png");
   const std::vector<std::string> arguments{"call", "-s",     "192x128", "-b",        "600k", "-k",
                                            "0",    "--loss", "1%",      "--delay",   "40ms", "-n",
                                            "200",  "--seed", "3",       "--reorder", "2%"};
-  json first = report(arguments);
-  const json again = report(arguments);
+  const json first = report(arguments);
+  std::vector<std::string> reporting = arguments;
+  reporting.insert(reporting.end(), {"--report", page, "--snapshot", "1s", snapshot});
+  const json again = report(reporting);
   EXPECT_GT(first["network"]["packets_lost"], 0);
   EXPECT_GT(first["network"]["packets_late"], 0);
   EXPECT_EQ(first["network"]["pictures_lost"], first["frames_dropped"]);
@@ -103,47 +108,11 @@ TEST(Call, RecoversFromLossesTheSameWayEveryTime) {
   for (const char* const key : {"network", "key_frames", "psnr_y", "bitrate_reached"}) {
     EXPECT_EQ(first[key], again[key]) << key;
   }
-}
-
-TEST(Call, ReportsOnOnePageThatNeedsNothingElse) {
-  const TemporaryDirectory directory;
-  const std::string page = directory.file("call.html");
-  const std::string snapshot = directory.file("second.png");
-  report({"call",      "-s",       "160x96", "-n",         "90",           "-b",    "300k",
-          "--loss",    "2%",       "--at",   "1s",         "bitrate=150k", "--at",  "2s",
-          "rotate=90", "--report", page,     "--snapshot", "1s",           snapshot});
   const std::string html = contentOf(page);
-  for (const char* const part :
-       {"<h1>Call on msm8960</h1>", "<b>1</b> 1 s: bitrate=150k", "<b>2</b> 2 s: rotate=90", "packets lost",
-        "<tr><th>Input</th><td>built-in scene</td></tr>", "data:image/png;base64,iVBORw0KGgo",
-        "prefers-color-scheme"}) {
-    EXPECT_NE(html.find(part), std::string::npos) << part;
-  }
+  EXPECT_TRUE(contains(html, "packets lost") && contains(html, "data:image/png;base64,iVBORw0KGgo"));
   EXPECT_EQ(html.find("http://"), std::string::npos) << "nothing comes from elsewhere";
-  EXPECT_EQ(html.substr(0, html.find("data:image")).find("nan"), std::string::npos);
   EXPECT_TRUE(html.ends_with("</html>\n"));
   EXPECT_TRUE(contentOf(snapshot).starts_with("\x89PNG"));
-  const Ended late =
-      runTool({"call", "-s", "64x48", "-n", "3", "--snapshot", "9s", directory.file("late.png")});
-  EXPECT_EQ(late.exitCode, kOutput);
-  EXPECT_TRUE(contains(late.err, "late.png: there was no picture at 9 s")) << late.err;
-}
-
-TEST(Call, TakesItsOwnOutputBackInEveryForm) {
-  const TemporaryDirectory directory;
-  const std::string y4m = directory.file("a.y4m");
-  const std::string raw = directory.file("a.yuv");
-  report({"call", "-s", "64x48", "-n", "9", "--fps", "29.97", "-o", y4m});
-  const json fromFile = report({"call", y4m, "-o", raw});
-  EXPECT_EQ(fromFile["frames_decoded"], 9);
-  EXPECT_EQ(fromFile["fps"], 29.97);
-  const json fromRaw = report({"call", raw, "-s", "64x48", "-n", "7", "--fps", "12"});
-  EXPECT_EQ(fromRaw["frames_in"], 7);
-
-  const Ended piped = runTool({"call", "-", "-o", "-"}, {.in = y4m});
-  EXPECT_EQ(piped.exitCode, 0) << piped.err;
-  EXPECT_EQ(picturesIn(directory.write("piped.y4m", piped.out), 64 * 48 * 3 / 2), 9);
-  EXPECT_TRUE(contains(piped.err, "Decoded        9")) << piped.err;
 }
 
 TEST(Call, GoesOnWithACutInputAndSaysSo) {
@@ -183,14 +152,6 @@ TEST(Call, EndsWhenNobodyReadsItsOutput) {
   EXPECT_EQ(run.exitCode, kOutput);
   EXPECT_TRUE(contains(run.err, "standard output: whoever was reading it has gone")) << run.err;
   EXPECT_TRUE(directory.names().empty());
-}
-
-TEST(Call, ShowsProgressOnATerminalOnly) {
-  const Ended terminal =
-      runTool({"call", "-s", "64x48", "-n", "30", "--fps", "100", "-r"}, {.terminal = true});
-  EXPECT_EQ(terminal.exitCode, 0);
-  EXPECT_TRUE(contains(terminal.err, "/30 frames")) << terminal.err;
-  EXPECT_EQ(runTool({"call", "-s", "64x48", "-n", "30"}).err, "");
 }
 
 TEST(Decode, TakesDamageAndReportsPicturesThatChangeTheirSize) {

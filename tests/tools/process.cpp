@@ -26,16 +26,6 @@ std::vector<char*> pointers(std::vector<std::string>& texts) {
   return result;
 }
 
-std::string readAll(int descriptor) {
-  std::string text;
-  std::array<char, 4096> bytes{};
-  for (;;) {
-    const ssize_t count = read(descriptor, bytes.data(), bytes.size());
-    if (count <= 0) return text;
-    text.append(bytes.data(), static_cast<size_t>(count));
-  }
-}
-
 }  // namespace
 
 Process::Process(const std::vector<std::string>& arguments) : Process(arguments, Streams()) {}
@@ -51,15 +41,7 @@ Process::Process(const std::vector<std::string>& arguments, const Streams& strea
 
   int out[2] = {-1, -1};
   EXPECT_EQ(pipe2(out, O_CLOEXEC), 0);
-  std::string err = _directory.file("err");
-  if (streams.terminal) {
-    _terminal = posix_openpt(O_RDWR | O_NOCTTY | O_CLOEXEC);
-    EXPECT_EQ(grantpt(_terminal), 0);
-    EXPECT_EQ(unlockpt(_terminal), 0);
-    const char* const name = ptsname(_terminal);
-    EXPECT_NE(name, nullptr) << "no pseudo terminal: is /dev/pts mounted?";
-    err = name != nullptr ? name : "/dev/null";
-  }
+  const std::string err = _directory.file("err");
 
   posix_spawn_file_actions_t actions;
   posix_spawn_file_actions_init(&actions);
@@ -69,7 +51,7 @@ Process::Process(const std::vector<std::string>& arguments, const Streams& strea
   } else {
     posix_spawn_file_actions_addopen(&actions, STDOUT_FILENO, streams.out.c_str(), O_WRONLY, 0);
   }
-  posix_spawn_file_actions_addopen(&actions, STDERR_FILENO, err.c_str(), O_WRONLY | O_CREAT | O_NOCTTY, 0600);
+  posix_spawn_file_actions_addopen(&actions, STDERR_FILENO, err.c_str(), O_WRONLY | O_CREAT, 0600);
   EXPECT_EQ(posix_spawn(&_pid, OMXBRIDGE_TOOL, &actions, nullptr, pointers(words).data(),
                         pointers(environment).data()),
             0);
@@ -80,7 +62,6 @@ Process::Process(const std::vector<std::string>& arguments, const Streams& strea
 
 Process::~Process() {
   if (_out >= 0) close(_out);
-  if (_terminal >= 0) close(_terminal);
   if (_pid < 0) return;
   kill(_pid, SIGKILL);
   waitpid(_pid, nullptr, 0);
@@ -130,7 +111,7 @@ Ended Process::finish() {
   }
   close(handle);
   run.out = std::move(_collected);
-  run.err = _terminal >= 0 ? readAll(_terminal) : contentOf(_directory.file("err"));
+  run.err = contentOf(_directory.file("err"));
   return run;
 }
 

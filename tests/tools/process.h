@@ -25,7 +25,6 @@ class Process {
   struct Streams {
     std::string in = "/dev/null";            // a file or pipe
     std::string out{};                       // a file or device; empty: collected
-    bool terminal = false;                   // standard error is a terminal
     std::vector<std::string> environment{};  // NAME=VALUE, added to the test's own
   };
 
@@ -49,7 +48,6 @@ class Process {
   const TemporaryDirectory _directory;
   pid_t _pid = -1;
   int _out = -1;  // we read
-  int _terminal = -1;
   std::string _collected;
 };
 

@@ -33,7 +33,6 @@ class GraySource : public FrameSource {
   const VideoTraits& traits() const override { return _traits; }
   std::optional<uint64_t> frameCount() const override { return _count; }
   Result<bool> next(Picture& picture) override {
-    if (_read == failAt) return Failure{ExitCode::Input, "broken off"};
     if (_read == _count) return false;
     picture.resize(kSize);
     std::fill(picture.bytes.begin(), picture.bytes.end(), static_cast<uint8_t>(_read++));
@@ -41,7 +40,6 @@ class GraySource : public FrameSource {
     return true;
   }
 
-  std::optional<uint64_t> failAt;
   std::function<void(uint64_t read)> onRead;
 
  private:
@@ -97,27 +95,6 @@ struct CallRig {
   std::stop_source enough;
 };
 
-TEST(ScriptedCall, BringsEveryPictureToTheOtherEndInOrder) {
-  CallRig rig;
-  rig.settings.streamPath = rig.directory.file("coded.264");
-  rig.settings.picturesPath = rig.directory.file("decoded.yuv");
-  GraySource source(60, FrameRate{1, 300});  // 5 hours; 32 bits hold 71 minutes of time stamps
-  const CallFigures figures = rig.figures(source);
-  EXPECT_EQ(figures.framesIn, 60U);
-  EXPECT_EQ(figures.framesEncoded, 60U);
-  EXPECT_EQ(figures.framesDecoded, 60U);
-  EXPECT_EQ(figures.framesDropped(), 0U);
-  EXPECT_EQ(figures.framesOutOfOrder, 0U);
-  EXPECT_EQ(figures.psnr, 100);
-  EXPECT_GT(figures.latencies.p50, 0);
-  EXPECT_LE(figures.latencies.p50, figures.latencies.p99);
-  EXPECT_EQ(figures.streamBytes, 60 * (pictureBytes(kSize) + kSliceHeader.size()));
-  EXPECT_EQ(contentOf(rig.settings.streamPath).size(), figures.streamBytes);
-  const std::string decoded = contentOf(rig.settings.picturesPath);
-  ASSERT_EQ(decoded.size(), 60 * pictureBytes(kSize));
-  for (size_t i = 0; i < 60; ++i) EXPECT_EQ(decoded[i * pictureBytes(kSize)], static_cast<char>(i));
-}
-
 TEST(ScriptedCall, EndsTheInputOnlyWhenThePicturesAreBack) {
   CallRig rig;
   rig.server.encoder().setDelay(std::chrono::milliseconds(2));
@@ -141,7 +118,7 @@ TEST(ScriptedCall, CountsWhatTheEncoderDropsAndStillEnds) {
     const bool isDropped = !input.bytes.empty() && input.bytes[0] % 5 == 4;  // by its gray; the last one too
     return isDropped ? std::vector<Packet>() : std::vector<Packet>{CallRig::coded(input)};
   });
-  GraySource source(20);
+  GraySource source(20, FrameRate{1, 300});  // 100 minutes; 32 bits hold 71 minutes of time stamps
   const CallFigures figures = rig.figures(source);
   EXPECT_EQ(figures.framesIn, 20U);
   EXPECT_EQ(figures.framesEncoded, 16U);
@@ -193,28 +170,7 @@ TEST(ScriptedCall, DropsInRealTimeWhatFindsNoFreeBuffer) {
   EXPECT_EQ(figures.psnr, 100);
 }
 
-// Told to, by its input, and while it waits for a buffer.
-TEST(ScriptedCall, EndsEarlyWithWhatItHas) {
-  {
-    CallRig rig;
-    rig.settings.picturesPath = rig.directory.file("decoded.yuv");
-    GraySource source(1000);
-    source.onRead = [&rig](uint64_t read) {
-      if (read == 10) rig.enough.request_stop();
-    };
-    EXPECT_EQ(rig.figures(source).framesDecoded, 9U);
-    EXPECT_EQ(contentOf(rig.settings.picturesPath).size(), 9 * pictureBytes(kSize));
-  }
-  {
-    CallRig rig;
-    GraySource source(1000);
-    source.failAt = 7;
-    const auto report = rig.run(source);
-    ASSERT_TRUE(report.ok()) << report.failure().text;
-    EXPECT_EQ(report.value().figures.framesDecoded, 7U);
-    ASSERT_TRUE(report.value().inputFailure);
-    EXPECT_EQ(report.value().inputFailure->text, "broken off");
-  }
+TEST(ScriptedCall, EndsEarlyWhileItWaitsForABuffer) {
   CallRig rig;
   rig.server.encoder().holdInput();
   const std::jthread stopper([&rig] {
@@ -238,7 +194,6 @@ TEST(ScriptedCall, FailsWithAMessageAndLeavesNoFile) {
          rig.server.encoder().refuse(omxtest::Access::SetParameter, OMX_IndexParamVideoBitrate);
        },
        ExitCode::Device, "the encoder of device msm8x55 cannot be created"},
-      {[](CallRig& rig) { rig.server.unregister(); }, ExitCode::Device, "libomxmediaserver.so"},
       {[](CallRig& rig) { rig.server.omx().fail(omxtest::Method::SendCommand); }, ExitCode::Device,
        "the decoder of device msm8x55 cannot be started"},
       {[](CallRig& rig) { rig.server.omx().fail(omxtest::Method::EmptyBuffer, 4); }, ExitCode::Failed,
@@ -259,10 +214,6 @@ TEST(ScriptedCall, FailsWithAMessageAndLeavesNoFile) {
          });
        },
        ExitCode::Failed, "a coded picture of 70000 bytes is larger than the input buffers of the decoder"},
-      {[](CallRig& rig) { rig.settings.picturesPath = "/dev/full"; }, ExitCode::Output,
-       "/dev/full: no space left"},
-      {[](CallRig& rig) { rig.settings.streamPath = "/dev/full"; }, ExitCode::Output,
-       "/dev/full: no space left"},
   };
   for (const auto& each : cases) {
     SCOPED_TRACE(each.text);

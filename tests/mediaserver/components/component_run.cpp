@@ -203,9 +203,9 @@ void EncoderRun::setSize(uint32_t width, uint32_t height, uint32_t framesPerSeco
   }
 }
 
-void EncoderRun::setBitRate(uint32_t bitsPerSecond, OMX_VIDEO_CONTROLRATETYPE mode) {
+void EncoderRun::setBitRate(uint32_t bitsPerSecond) {
   auto record = makeRecord<OMX_VIDEO_PARAM_BITRATETYPE>(kOutputPort);
-  record.eControlRate = mode;
+  record.eControlRate = OMX_Video_ControlRateVariable;
   record.nTargetBitrate = bitsPerSecond;
   EXPECT_EQ(set(OMX_IndexParamVideoBitrate, record), kOk);
 }

@@ -145,12 +145,9 @@ class EncoderRun : public ComponentRun {
 
   // Both ports, as wrappers do it.
   void setSize(uint32_t width, uint32_t height, uint32_t framesPerSecond = 25);
-  void setBitRate(uint32_t bitsPerSecond, OMX_VIDEO_CONTROLRATETYPE mode = OMX_Video_ControlRateVariable);
+  void setBitRate(uint32_t bitsPerSecond);
   // Changes the AVC record as it is.
   android::status_t setAvc(const std::function<void(OMX_VIDEO_PARAM_AVCTYPE&)>& change);
-  void setPFrames(OMX_U32 count) {
-    EXPECT_EQ(setAvc([=](auto& avc) { avc.nPFrames = count; }), kOk);
-  }
   OMX_VIDEO_PARAM_AVCTYPE avc();
 
   // Configurations, on the port that wrappers use.
@@ -163,10 +160,6 @@ class EncoderRun : public ComponentRun {
   }
   android::status_t changeBitRate(uint32_t bitsPerSecond) {
     return change(OMX_IndexConfigVideoBitrate, &OMX_VIDEO_CONFIG_BITRATETYPE::nEncodeBitrate, bitsPerSecond);
-  }
-  android::status_t changeFrameRate(uint32_t framesPerSecond) {
-    return change(OMX_IndexConfigVideoFramerate, &OMX_CONFIG_FRAMERATETYPE::xEncodeFramerate,
-                  framesPerSecond << 16, isTi() ? kInputPort : kOutputPort);
   }
   android::status_t requestKey() {
     const auto field = &OMX_CONFIG_INTRAREFRESHVOPTYPE::IntraRefreshVOP;

@@ -46,13 +46,6 @@ TEST(DecoderGeometry, FollowsTheStreamAndLosesNoPicture) {
       EXPECT_EQ(run.errors, Errors{});
     }
   }
-  // Three sizes in one padded size: the rectangle alone changes, and no buffers.
-  displayed.clear();
-  const std::vector<Unit> alike = changingStream({{96, 78}, {100, 80}, {90, 66}}, 5, &displayed);
-  DecoderRun run("omap4");
-  run.run(alike);
-  expectSame(run.pictures(), displayed);
-  EXPECT_EQ(run.reconfigurations, 1U);
 }
 
 TEST(DecoderGeometry, IsWhatEachDeviceMakesOfASize) {

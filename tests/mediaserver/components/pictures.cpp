@@ -85,21 +85,6 @@ double psnr(const Picture& a, const Picture& b) {
   return error == 0 ? 100 : 10 * std::log10(255.0 * 255.0 * static_cast<double>(count) / error);
 }
 
-Picture turned(const Picture& picture, int quarters) {
-  if (quarters == 0) return picture;
-  Picture out(picture.height, picture.width);
-  for (int plane = 0; plane < 3; ++plane) {
-    const uint32_t width = plane == 0 ? picture.width : picture.chromaWidth();
-    const uint32_t height = plane == 0 ? picture.height : picture.chromaHeight();
-    for (uint32_t y = 0; y < height; ++y) {
-      for (uint32_t x = 0; x < width; ++x) {
-        out.plane(plane)[x * height + height - 1 - y] = picture.plane(plane)[y * width + x];
-      }
-    }
-  }
-  return turned(out, quarters - 1);
-}
-
 std::vector<uint8_t> packInput(const Picture& picture, PictureLayout layout, uint32_t pitch) {
   if (pitch == 0) pitch = picture.width;
   const bool aligned = layout == PictureLayout::SemiPlanarAligned;

@@ -31,9 +31,6 @@ Picture scene(uint32_t width, uint32_t height, uint32_t number);
 // In decibels; 100 for equal pictures. Compares luma.
 double psnr(const Picture& a, const Picture& b);
 
-// Turned clockwise by quarter turns.
-Picture turned(const Picture& picture, int quarters);
-
 // As an encoder's client sends it. `pitch` counts for the TI layout alone.
 std::vector<uint8_t> packInput(const Picture& picture, omxhost::PictureLayout layout, uint32_t pitch = 0);
 

@@ -38,9 +38,9 @@ Picture copyOut(const AVFrame& frame) {
 
 }  // namespace
 
-std::vector<Picture> scenes(uint32_t width, uint32_t height, uint32_t count, uint32_t first) {
+std::vector<Picture> scenes(uint32_t width, uint32_t height, uint32_t count) {
   std::vector<Picture> pictures;
-  for (uint32_t i = 0; i < count; ++i) pictures.push_back(scene(width, height, first + i));
+  for (uint32_t i = 0; i < count; ++i) pictures.push_back(scene(width, height, i));
   return pictures;
 }
 

@@ -29,7 +29,7 @@ struct StreamOptions {
 
 // Units in order of decoding. A failure is the test's.
 std::vector<Unit> encode(const StreamOptions& options, const std::vector<Picture>& pictures);
-std::vector<Picture> scenes(uint32_t width, uint32_t height, uint32_t count, uint32_t first = 0);
+std::vector<Picture> scenes(uint32_t width, uint32_t height, uint32_t count);
 
 // What libavcodec makes of the units, in display order, exactly cropped. `decoder`: "h264", "mpeg4", ...;
 // `extradata`, if any, as libavcodec wants it, and then the size too.

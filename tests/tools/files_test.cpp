@@ -1,4 +1,4 @@
-// Inputs: good, cut short, hostile.
+// Inputs that are cut short, hostile or slow; outputs, and when they get their names.
 #include <fcntl.h>
 #include <gtest/gtest.h>
 #include <sys/stat.h>
@@ -7,12 +7,14 @@
 #include <thread>
 
 #include "tests/tools/temporary_directory.h"
-#include "tools/files/byte_reader.h"
+#include "tools/base/temporary_files.h"
 #include "tools/files/frame_source.h"
+#include "tools/files/output_file.h"
 
 namespace {
 
 using namespace tool;
+using tooltest::contentOf;
 using tooltest::TemporaryDirectory;
 
 constexpr size_t kPicture = 4 * 2 * 3 / 2;  // bytes, of 4x2
@@ -21,62 +23,31 @@ std::string pictureOf(char value) {
   return std::string(kPicture, value);
 }
 
-// Opens the content as a file and reads it to its end. What was read: the first byte of each picture, and
-// what went wrong.
+// Opens the content as a file and reads it to its end.
 struct ReadAll {
-  std::string pictures;
+  std::string pictures;  // the first byte of each
   std::string failure;
   ExitCode code = ExitCode::Done;
-  Size size;
-  VideoTraits traits;
-  std::optional<uint64_t> count;
 };
 
-ReadAll readAll(const std::string& content, std::optional<Size> size = {},
-                std::optional<FrameRate> rate = {}) {
+ReadAll readAll(const std::string& content, std::optional<Size> size) {
   const TemporaryDirectory directory;
   ReadAll result;
   const auto note = [&result](const Failure& failure) {
     result.failure = failure.text;
     result.code = failure.code;
-  };
-  auto source = openFrameSource({directory.write("in", content), size, rate}, {});
-  if (!source.ok()) {
-    note(source.failure());
     return result;
-  }
-  result.size = source.value()->size();
-  result.traits = source.value()->traits();
-  result.count = source.value()->frameCount();
+  };
+  auto source = openFrameSource({directory.write("in", content), size, {}}, {});
+  if (!source.ok()) return note(source.failure());
   Picture picture;
   for (;;) {
     const auto more = source.value()->next(picture);
-    if (!more.ok()) note(more.failure());
-    if (!more.ok() || !more.value()) return result;
+    if (!more.ok()) return note(more.failure());
+    if (!more.value()) return result;
     EXPECT_EQ(picture.bytes.size(), kPicture);
     result.pictures += static_cast<char>(picture.bytes[0]);
   }
-}
-
-TEST(FrameSource, ReadsPicturesAndWhatTheHeaderSays) {
-  const ReadAll read = readAll("YUV4MPEG2 W4 H2 F30000:1001 Ip A4:3 C420paldv XYSCSS=420 \nFRAME\n" +
-                               pictureOf('a') + "FRAME Ip XZ\n" + pictureOf('b'));
-  EXPECT_EQ(read.pictures, "ab");
-  EXPECT_EQ(read.failure, "");
-  EXPECT_EQ(read.size, (Size{4, 2}));
-  EXPECT_EQ(read.traits.rate, (FrameRate{30000, 1001}));
-  EXPECT_EQ(read.traits.chroma, "420paldv");
-  EXPECT_EQ(read.traits.pixelAspect, "4:3");
-
-  const ReadAll plain = readAll("YUV4MPEG2 W4 H2 F0:0\nFRAME\n" + pictureOf('a'), {}, FrameRate{15, 1});
-  EXPECT_EQ(plain.pictures, "a");
-  EXPECT_EQ(plain.traits.rate, (FrameRate{15, 1}));
-  EXPECT_EQ(plain.traits.chroma, "420jpeg");
-  EXPECT_EQ(plain.count, 1U);
-
-  const ReadAll raw = readAll(pictureOf('a') + pictureOf('b'), Size{4, 2});
-  EXPECT_EQ(raw.pictures, "ab");
-  EXPECT_EQ(raw.count, 2U);
 }
 
 TEST(FrameSource, SaysWhatIsWrongWithAnInput) {
@@ -136,21 +107,40 @@ TEST(ByteReader, ReadsAPipeThatComesInDrops) {
   EXPECT_EQ(source.value()->frameCount(), std::nullopt);
 }
 
-TEST(ByteReader, StopsWaitingForAPipeWhenAStopIsRequested) {
+std::span<const uint8_t> bytesOf(std::string_view text) {
+  return {reinterpret_cast<const uint8_t*>(text.data()), text.size()};
+}
+
+// Through a link, which stays one, and with the mode that the file had.
+TEST(OutputFile, HasItsNameOnlyWhenComplete) {
   const TemporaryDirectory directory;
-  const std::string path = directory.file("pipe");
-  ASSERT_EQ(mkfifo(path.c_str(), 0600), 0);
-  const int keptOpen = open(path.c_str(), O_RDWR);
-  std::stop_source stop;
-  auto reader = ByteReader::open(path, stop.get_token());
-  ASSERT_TRUE(reader.ok());
-  const std::jthread stopper([&stop] { stop.request_stop(); });
-  std::vector<uint8_t> bytes(4);
-  const auto count = reader.value()->read(bytes);
-  ASSERT_TRUE(count.ok());
-  EXPECT_EQ(count.value(), 0U);
-  EXPECT_TRUE(reader.value()->stopped());
-  close(keptOpen);
+  const std::string path = directory.write("a", "old");
+  chmod(path.c_str(), 0640);
+  const std::string link = directory.file("link");
+  ASSERT_EQ(symlink("a", link.c_str()), 0);
+  for (const bool abandoned : {true, false}) {
+    const auto file = OutputFile::create(link);
+    ASSERT_TRUE(file.ok());
+    EXPECT_FALSE(file.value()->write(bytesOf("new")));
+    EXPECT_EQ(contentOf(path), "old");
+    EXPECT_EQ(directory.names().size(), 3U);
+    EXPECT_FALSE(!abandoned && file.value()->commit());
+  }
+  EXPECT_EQ(contentOf(path), "new");
+  EXPECT_TRUE(std::filesystem::is_symlink(link));
+  EXPECT_EQ(directory.names().size(), 2U);
+  struct stat status {};
+  EXPECT_EQ(stat(path.c_str(), &status), 0);
+  EXPECT_EQ(status.st_mode & 0777, 0640U);
+}
+
+TEST(OutputFile, AHardEndRemovesWhatIsTemporary) {
+  const TemporaryDirectory directory;
+  const auto open = OutputFile::create(directory.file("a"));
+  const auto done = OutputFile::create(directory.file("b"));
+  EXPECT_FALSE(done.value()->commit());
+  removeTemporaryFiles();
+  EXPECT_EQ(directory.names(), std::vector<std::string>{"b"});
 }
 
 }  // namespace
