@@ -6,7 +6,6 @@
 
 #include <new>
 #include <type_traits>
-#include <utility>
 
 #include "omxbridge/omxbridge.h"
 
