@@ -24,9 +24,9 @@ void require(bool holds) {
   if (!holds) std::abort();
 }
 
-// Beyond all buffers, and yet a result of 0 where an odd row does not count.
-bool isOneLongRow(unsigned width, unsigned height) {
-  return height == 1 && width > kLargestBuffer / 8;
+// Beyond all buffers, and yet a result of 0 where an odd row or column does not count.
+bool isOneLongLine(unsigned width, unsigned height) {
+  return std::min(width, height) == 1 && std::max(width, height) > kLargestBuffer / 8;
 }
 
 // `half` counts half bytes per pixel: 3 for 4:2:0.
@@ -150,7 +150,7 @@ void oneSize(Input& input) {
   const unsigned height = input.size();
   const bool hasStride = std::holds_alternative<SrcDstStride>(chosen.function);
   const unsigned stride = hasStride ? input.stride(width) : 0;
-  if (isOneLongRow(std::max(stride, width), height)) return;
+  if (isOneLongLine(std::max(stride, width), height)) return;
   run(input, frameBytes(width, height, chosen.srcHalf),
       frameBytes(std::max(stride, width), height, chosen.dstHalf), [&](const Byte* src, Byte* dst) {
         if (const auto* plain = std::get_if<SrcDst>(&chosen.function))
@@ -190,7 +190,7 @@ void twoSizes(Input& input) {
   const unsigned height = input.size();
   const unsigned dstWidth = input.size();
   const unsigned dstHeight = input.size();
-  if (isOneLongRow(dstWidth, dstHeight)) return;
+  if (isOneLongLine(dstWidth, dstHeight)) return;
   run(input, frameBytes(width, height, chosen.srcHalf), frameBytes(dstWidth, dstHeight, 3),
       [&](const Byte* src, Byte* dst) {
         return chosen.function(src, width, height, dst, dstWidth, dstHeight);
