@@ -1,6 +1,4 @@
-// A minimal decoder: H.264 byte stream in, raw I420 pictures out.
-//
-//   decoder INPUT.264 OUTPUT.yuv
+// A minimal decoder, H.264 byte stream in, raw I420 pictures out: decoder INPUT.264 OUTPUT.yuv
 #include <omxbridge/frames.h>
 #include <omxbridge/omxbridge.h>
 
@@ -30,8 +28,7 @@ struct Decoder {
 };
 
 int onInput(void*, void* context) {
-  auto& decoder = *static_cast<Decoder*>(context);
-  return decoder.count(decoder.returned);
+  return static_cast<Decoder*>(context)->count(static_cast<Decoder*>(context)->returned);
 }
 
 // What a picture looks like depends on the device; I420 is the same everywhere.

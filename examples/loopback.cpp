@@ -43,8 +43,7 @@ struct Call {
     traffic.moved.wait(held, [&] { return condition() || failed(); });
   }
   struct Buffer {
-    void* handle;
-    void* data;
+    void *handle, *data;
   };
   // A free input buffer, which has to be sent then.
   std::optional<Buffer> reserve(void* session, Traffic& traffic) {
