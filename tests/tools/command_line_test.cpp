@@ -71,7 +71,8 @@ TEST(CommandLine, TellsOfItselfAndOfTheDevices) {
     EXPECT_EQ(run.err, "");
     EXPECT_TRUE(contains(run.out, each.part)) << run.out;
   }
-  for (const auto& device : report({"devices", "-d", "omap4"})["devices"]) {
+  const auto devices = report({"devices", "-d", "omap4"})["devices"];
+  for (const auto& device : devices) {
     EXPECT_EQ(device["chosen"], device["name"] == "omap4");
     EXPECT_TRUE(!device["chosen"] || device["decoder"] == "OMX.TI.DUCATI1.VIDEO.DECODER==");
   }
