@@ -204,9 +204,16 @@ void VideoDecoder::flush(OMX_U32 port) {
   }
 }
 
+void VideoDecoder::releaseWritten() {
+  std::vector<std::shared_ptr<const AVFrame>> pictures;
+  const std::lock_guard<std::mutex> lock(_written->mutex);
+  pictures.swap(_written->pictures);
+}
+
 Sent VideoDecoder::send(const InputView& input) {
   // One in, one out: nothing piles up while the client has no buffer for it.
   if (_decoder->waiting() > 0) return Sent::Busy;
+  releaseWritten();
   const bool config = (input.flags & OMX_BUFFERFLAG_CODECCONFIG) != 0;
   _decoder->push({input.data, input.length}, input.timestamp, config);
   return Sent::Taken;
@@ -235,8 +242,11 @@ Received VideoDecoder::receive(OutputSpace& output) {
     return Received::NewGeometry;
   }
   // Off this thread, which decodes the next picture meanwhile.
-  output.complete = [geometry, picture, memory = _decoder->frontMemory(), data = output.data] {
+  output.complete = [geometry, picture, memory = _decoder->frontMemory(), data = output.data,
+                     written = _written]() mutable {
     writePicture(geometry, picture, data);
+    const std::lock_guard<std::mutex> lock(written->mutex);
+    written->pictures.push_back(std::move(memory));
   };
   output.length = geometry.bytes;
   output.timestamp = _decoder->frontTimestamp();

@@ -7,6 +7,7 @@
 #include <memory>
 #include <mutex>
 #include <optional>
+#include <vector>
 
 #include "host/mediaserver/codec.h"
 #include "host/mediaserver/components/picture_layout.h"
@@ -42,12 +43,22 @@ class VideoDecoder final : public Codec {
   void describe(const OutputGeometry& geometry, PortDefinition* output) const;
   uint32_t neededBuffers() const;
 
+  // Pictures that the delivery thread has written out. It gives them back instead of releasing them: so the
+  // worker alone releases decoder's memory, after a lock that both have held. May outlive the decoder.
+  struct Written {
+    std::mutex mutex;
+    std::vector<std::shared_ptr<const AVFrame>> pictures;
+  };
+  void releaseWritten();
+
   const omxhost::ComponentTraits _traits;
 
   std::mutex _mutex;  // guards the next three
   PictureOrder _order = PictureOrder::Display;
   Packing _packing = Packing::Unit;
   OutputGeometry _crop;  // of the pictures that clients see, for the rectangle inside
+
+  const std::shared_ptr<Written> _written = std::make_shared<Written>();
 
   // The worker's.
   DecoderOptions _options{};
