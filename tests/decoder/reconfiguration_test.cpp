@@ -143,6 +143,7 @@ TEST_F(NewSettingsTest, WaitForThePicturesOfTheOldSize) {
   EXPECT_EQ(log(), LogLines{});
   gate.open();
   require(messages().waitForDelivered(commandComplete(OMX_CommandPortEnable)), "the port's return");
+  waitForEvents();  // the new buffers have been sent, before the component goes idle and refuses them
   EXPECT_EQ(_application.outputTexts(), (std::vector<std::string>{"first", "second", "last"}));
   EXPECT_EQ(deInit(), OMXI_OK);
   destroy();
