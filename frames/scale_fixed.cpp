@@ -111,6 +111,7 @@ int ScaleI420FrameQuarter(unsigned int width, unsigned int height, unsigned char
   std::uint8_t* to = buffer;
   // Kept: the chroma planes count as one of height rows, whose middle pair may be a row of each.
   const auto plane = [&to, height](const std::uint8_t* from, std::size_t pitch, std::size_t columns) {
+    if (columns == 0) return;  // or billions of rows without a byte would be walked over
     for (std::size_t pair = 0; pair < height / 2; ++pair, from += 2 * pitch, to += columns) {
       scaleKernels().quarter(from, from + pitch, to, columns);
     }
