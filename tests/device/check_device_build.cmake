@@ -21,6 +21,10 @@ file(COPY ${headers}/binder ${headers}/media ${headers}/utils DESTINATION ${base
 file(COPY ${headers}/android ${headers}/cutils DESTINATION ${WORK}/tree/system/core/include)
 file(GLOB records ${headers}/OMX_*.h)
 file(COPY ${records} DESTINATION ${openmax})
+# A file that is as old as the one in its place, as in a fresh clone, would not be copied.
+file(GLOB_RECURSE replaced RELATIVE ${TREE} ${TREE}/*)
+list(TRANSFORM replaced PREPEND ${WORK}/tree/)
+file(REMOVE ${replaced})
 file(COPY ${TREE}/ DESTINATION ${WORK}/tree)
 if(POINTER_BYTES EQUAL 4)
   # A device's words are long ones.
