@@ -4,13 +4,7 @@
 # Its libraries are left out, so what the library takes from the platform stays undefined.
 cmake_minimum_required(VERSION 3.25)
 
-function(run)
-  execute_process(COMMAND ${ARGN} RESULT_VARIABLE result OUTPUT_VARIABLE output ERROR_VARIABLE output)
-  if(result)
-    message(FATAL_ERROR "${ARGN}: ${result}\n${output}")
-  endif()
-  set(output "${output}" PARENT_SCOPE)
-endfunction()
+include(${CMAKE_CURRENT_LIST_DIR}/../run.cmake)
 
 # Copies keep their times, so what has not changed since the last run is not built again.
 file(REMOVE_RECURSE ${WORK}/tree)

@@ -3,13 +3,7 @@
 # C++, with pkg-config, runs them, and makes a call with the tool.
 cmake_minimum_required(VERSION 3.25)
 
-function(run)
-  execute_process(COMMAND ${ARGN} RESULT_VARIABLE result OUTPUT_VARIABLE output ERROR_VARIABLE output)
-  if(result)
-    message(FATAL_ERROR "${ARGN}: ${result}\n${output}")
-  endif()
-  set(output "${output}" PARENT_SCOPE)
-endfunction()
+include(${CMAKE_CURRENT_LIST_DIR}/../run.cmake)
 
 cmake_path(GET CMAKE_COMMAND PARENT_PATH cmake_directory)
 run(${CMAKE_COMMAND} -S ${EXAMPLES} -B ${WORK}/cmake -G ${GENERATOR} -DCMAKE_PREFIX_PATH=${PREFIX}
