@@ -56,9 +56,10 @@ int OmxInterface::deInit() {
                   [this] { return _endOfOutputReached || _threadError != OMXI_OK; });
     if (_state->ending) return ended();
     // A reconfiguration that has sent nothing yet is not begun; one that is sending finishes its
-    // calls first, so that no enable follows the command to go Idle.
+    // calls first, so that no enable follows the command to go Idle. Nor does a buffer, which the component
+    // would refuse then.
     _state->tearingDown = true;
-    _state->left.wait(held, [this] { return !_state->reconfigurationStep; });
+    _state->left.wait(held, [this] { return !_state->reconfigurationStep && _state->fills == 0; });
   }
 
   // Where a former call was refused the way on from Idle, the component is there already and would take

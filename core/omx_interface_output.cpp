@@ -73,12 +73,14 @@ int OmxInterface::submitOutputBuffer(IOMX::buffer_id id) {
     record->rangeLength = 0;
     record->eos = false;
     record->busy = true;
+    ++_state->fills;
     use.begin(held);
   }
   const status_t status = _omx->fillBuffer(_node, id);
-  if (status == android::OK) return OMXI_OK;
   {
     const SessionState::Lock held(_state->lock);
+    if (--_state->fills == 0) _state->left.notify_all();
+    if (status == android::OK) return OMXI_OK;
     findRecord(kOmxOutputPort, id)->busy = false;  // the use keeps it in the table
     wakeIfOutputReturned();
   }
@@ -115,9 +117,9 @@ void OmxInterface::onOmxObserverFillBufferDone(const android::omx_message& messa
   if (_mpMemHeap == nullptr) record->outputData = record->data;
   // A buffer that is about to be freed is not delivered any more.
   const bool lost = !port.freeing && !queueForDelivery(filled.buffer);
-  sem_post(&_semOutputDataReady);
   wakeIfOutputReturned();
   held.unlock();
+  sem_post(&_semOutputDataReady);  // outside, so that the thread that wakes need not wait for the lock
 
   if (tooLong) {
     logError("OMXINTERFACE - Output of %u bytes cut to the buffer's %u", length, port.capacity);

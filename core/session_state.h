@@ -88,6 +88,7 @@ struct SessionState {
   // deInit has passed its first wait: nothing goes to the output port any more and no reconfiguration
   // begins a step.
   bool tearingDown = false;
+  int fills = 0;  // calls of fillBuffer in progress, which the command to go Idle must not overtake
 
   // --- Reconfiguration (decoder, event thread) -----------------------------------------------------
   bool handlingEvent = false;          // the event thread is inside onEvent

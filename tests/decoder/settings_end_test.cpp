@@ -33,10 +33,10 @@ TEST_F(SettingsEndTest, AndDeInitAreBothWokenByTheBuffersAlsoOfAFailedComponent)
 }
 
 TEST_F(SettingsEndTest, FinishAStepOfCallsBeforeDeInitGoesOn) {
-  // A command to go Idle while the new buffers are made would have the component take buffers in a state in
-  // which it takes none; and deInit() must not free the port while the event thread does.
-  for (const Method method : {Method::AllocateBufferWithBackup, Method::FreeBuffer}) {
-    const bool enabled = method == Method::AllocateBufferWithBackup;
+  // A command to go Idle while the new buffers are made or filled would have the component take buffers in a
+  // state in which it takes none; and deInit() must not free the port while the event thread does.
+  for (const Method method : {Method::AllocateBufferWithBackup, Method::FillBuffer, Method::FreeBuffer}) {
+    const bool enabled = method != Method::FreeBuffer;
     startDecoder();
     endOfOutput();
     omx().clearCalls();
@@ -53,6 +53,7 @@ TEST_F(SettingsEndTest, FinishAStepOfCallsBeforeDeInitGoesOn) {
     Trace expected{"sendCommand disable 1", "sendCommand state 2", "sendCommand state 1"};
     if (enabled) expected.insert(expected.begin() + 1, "sendCommand enable 1");
     EXPECT_EQ(commands(), expected);
+    for (const std::string& line : log()) EXPECT_EQ(line.find("fillBuffer failed"), line.npos) << line;
     destroy();
     omx().before(method, nullptr);
   }
