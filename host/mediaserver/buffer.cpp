@@ -38,16 +38,6 @@ std::shared_ptr<Buffer> Buffer::onBlock(const android::sp<android::IMemory>& blo
   return buffer;
 }
 
-std::shared_ptr<Buffer> Buffer::withBackup(const android::sp<android::IMemory>& block) {
-  const std::shared_ptr<Buffer> mapped = onBlock(block);
-  if (mapped == nullptr) return nullptr;
-  std::shared_ptr<Buffer> buffer = own(mapped->capacity());
-  if (buffer == nullptr) return nullptr;
-  buffer->_block = block;
-  buffer->_backup = mapped->data();
-  return buffer;
-}
-
 std::shared_ptr<Buffer> Buffer::own(size_t size) {
   if (size > kLargestBuffer) return nullptr;
   auto buffer = std::make_shared<Buffer>();
@@ -60,11 +50,6 @@ std::shared_ptr<Buffer> Buffer::own(size_t size) {
 
 bool Buffer::contains(size_t offset, size_t length) const {
   return offset <= capacity() && length <= capacity() - offset;
-}
-
-void Buffer::copyIn(size_t offset, size_t length) {
-  if (_backup == nullptr || length == 0 || !contains(offset, length)) return;
-  std::memcpy(data() + offset, _backup + offset, length);
 }
 
 }  // namespace mediaserver

@@ -21,18 +21,14 @@ namespace mediaserver {
 
 enum class Holder {
   Client,
-  Transit,  // a client's call is copying into it
-  Node,     // waits in its port's line
-  Codec,    // the worker has it in hand
+  Node,   // waits in its port's line
+  Codec,  // the worker has it in hand
 };
 
 class Buffer {
  public:
   // Works on the client's block directly. Null when there is no block or no memory behind it.
   static std::shared_ptr<Buffer> onBlock(const android::sp<android::IMemory>& block);
-  // Memory of its own, as large as the client's block, and copied from it. Null as above, or when memory is
-  // short.
-  static std::shared_ptr<Buffer> withBackup(const android::sp<android::IMemory>& block);
   // Memory of its own. Null when memory is short.
   static std::shared_ptr<Buffer> own(size_t size);
 
@@ -40,10 +36,6 @@ class Buffer {
   size_t capacity() const { return header.nAllocLen; }
   // True when `length` bytes from `offset` lie inside the buffer.
   bool contains(size_t offset, size_t length) const;
-
-  // Copies a range of the client's block into the own memory; nothing without a backup, and never more than
-  // the buffer has. The caller holds the buffer, and no lock.
-  void copyIn(size_t offset, size_t length);
 
   OMX_BUFFERHEADERTYPE header{};
   android::IOMX::buffer_id id = nullptr;
@@ -59,7 +51,6 @@ class Buffer {
   };
 
   android::sp<android::IMemory> _block;
-  uint8_t* _backup = nullptr;  // the block's bytes, if they are not the buffer itself
   std::unique_ptr<uint8_t, Release> _own;
 };
 

@@ -21,6 +21,7 @@ struct MessageChannel::Queue {
     std::function<void()> before;
   };
   std::deque<Entry> messages;
+  bool untold = false;  // something was queued since the last wake
   bool closed = false;
 };
 
@@ -57,12 +58,20 @@ bool MessageChannel::open() {
   return true;
 }
 
-void MessageChannel::post(const android::omx_message& message, std::function<void()> before) {
+void MessageChannel::queue(const android::omx_message& message, std::function<void()> before) {
+  std::lock_guard<std::mutex> lock(_mutex);
+  if (_queue == nullptr) return;
+  std::lock_guard<std::mutex> queueLock(_queue->mutex);
+  _queue->messages.push_back({message, std::move(before)});
+  _queue->untold = true;
+}
+
+void MessageChannel::wake() {
   std::lock_guard<std::mutex> lock(_mutex);
   if (_queue == nullptr) return;
   {
     std::lock_guard<std::mutex> queueLock(_queue->mutex);
-    _queue->messages.push_back({message, std::move(before)});
+    if (!std::exchange(_queue->untold, false)) return;
   }
   _queue->changed.notify_one();  // outside, so that the thread that wakes need not wait for the lock
 }

@@ -1,6 +1,6 @@
-// One observer's messages: a queue and the thread that delivers it, strictly in the order of post.
-// post may be called under the caller's locks; the observer is called without any lock of ours and never
-// on the poster's thread. The channel does not keep the observer alive, except while it is called.
+// One observer's messages: a queue and the thread that delivers it, strictly in the order in which they were
+// queued. They may be queued under the caller's locks; the observer is called without any lock of ours and
+// never on the caller's thread. The channel does not keep the observer alive, except while it is called.
 #pragma once
 
 #include <functional>
@@ -24,8 +24,15 @@ class MessageChannel {
   [[nodiscard]] bool open();
 
   // Queues a message; drops it unless the channel is open. `before`, if there is one, runs on the delivery
-  // thread before the message is delivered.
-  void post(const android::omx_message& message, std::function<void()> before = nullptr);
+  // thread before the message is delivered. The thread need not see the message before the next wake: where a
+  // processor sleeps, to wake one takes longer than all the rest, so messages that come together wake it
+  // once.
+  void queue(const android::omx_message& message, std::function<void()> before = nullptr);
+  void wake();
+  void post(const android::omx_message& message) {
+    queue(message);
+    wake();
+  }
 
   // Drops what waits and returns when no delivery is in progress; nothing is delivered from then on until
   // the channel is opened again. Called from inside a delivery, it does not wait for that one.

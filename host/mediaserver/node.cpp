@@ -147,13 +147,14 @@ void Node::giveBack(OMX_U32 port, const std::shared_ptr<Buffer>& buffer, std::fu
       buffer->incomplete = false;
     };
   }
-  _channel.post(bufferMessage(_id, port, *buffer), std::move(before));
+  _channel.queue(bufferMessage(_id, port, *buffer), std::move(before));
 }
 
 void Node::giveBackAll(OMX_U32 port) {
   std::deque<std::shared_ptr<Buffer>> line;
   line.swap(_ports[port].line);
   for (const std::shared_ptr<Buffer>& buffer : line) giveBack(port, buffer);
+  _channel.wake();
 }
 
 PortPair Node::definitions() const {

@@ -112,6 +112,7 @@ class Node final : private CodecHost {
   void event(OMX_EVENTTYPE event, OMX_U32 data1, OMX_U32 data2);
   void error(OMX_ERRORTYPE code) { event(OMX_EventError, static_cast<OMX_U32>(code), 0); }
   void completed(OMX_COMMANDTYPE command, OMX_U32 data) { event(OMX_EventCmdComplete, command, data); }
+  // The client hears of it with the next message, or by _channel.wake().
   void giveBack(OMX_U32 port, const std::shared_ptr<Buffer>& buffer,
                 std::function<void()> complete = nullptr);
   void giveBackAll(OMX_U32 port);

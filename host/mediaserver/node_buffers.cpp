@@ -79,41 +79,41 @@ OMX_ERRORTYPE Node::claim(OMX_U32 index, BufferId id, std::shared_ptr<Buffer>* b
   return OMX_ErrorNone;
 }
 
+// The worker hears of a buffer outside of the lock, which it would have to wait for otherwise: this is the
+// way of every picture.
 OMX_ERRORTYPE Node::fillBuffer(BufferId id) {
-  std::lock_guard<std::mutex> lock(_mutex);
-  std::shared_ptr<Buffer> buffer;
-  const OMX_ERRORTYPE result = claim(kOutputPort, id, &buffer);
-  if (result != OMX_ErrorNone) return result;
-  buffer->header.nFilledLen = 0;
-  buffer->header.nOffset = 0;
-  buffer->header.nFlags = 0;
-  _ports[kOutputPort].append(buffer);
-  _lastExchange = std::chrono::steady_clock::now();
-  signal();
+  {
+    std::lock_guard<std::mutex> lock(_mutex);
+    std::shared_ptr<Buffer> buffer;
+    const OMX_ERRORTYPE result = claim(kOutputPort, id, &buffer);
+    if (result != OMX_ErrorNone) return result;
+    buffer->header.nFilledLen = 0;
+    buffer->header.nOffset = 0;
+    buffer->header.nFlags = 0;
+    _ports[kOutputPort].append(buffer);
+    _lastExchange = std::chrono::steady_clock::now();
+    _signalled = true;
+  }
+  _wake.notify_one();
   return OMX_ErrorNone;
 }
 
 OMX_ERRORTYPE Node::emptyBuffer(BufferId id, OMX_U32 offset, OMX_U32 length, OMX_U32 flags,
                                 OMX_TICKS timestamp) {
-  std::shared_ptr<Buffer> buffer;
-  Lock lock(_mutex);
-  OMX_ERRORTYPE result = claim(kInputPort, id, &buffer);
-  if (result != OMX_ErrorNone) return result;
-  if (!buffer->contains(offset, length)) return OMX_ErrorBadParameter;
-  buffer->holder = Holder::Transit;
-  lock.unlock();
-  buffer->copyIn(offset, length);
-  lock.lock();
-
-  buffer->holder = Holder::Client;
-  result = claim(kInputPort, id, &buffer);  // the copy took time: it may have been freed, or the port closed
-  if (result != OMX_ErrorNone) return result;
-  buffer->header.nOffset = offset;
-  buffer->header.nFilledLen = length;
-  buffer->header.nFlags = flags;
-  buffer->header.nTimeStamp = timestamp;
-  _ports[kInputPort].append(buffer);
-  signal();
+  {
+    std::lock_guard<std::mutex> lock(_mutex);
+    std::shared_ptr<Buffer> buffer;
+    const OMX_ERRORTYPE result = claim(kInputPort, id, &buffer);
+    if (result != OMX_ErrorNone) return result;
+    if (!buffer->contains(offset, length)) return OMX_ErrorBadParameter;
+    buffer->header.nOffset = offset;
+    buffer->header.nFilledLen = length;
+    buffer->header.nFlags = flags;
+    buffer->header.nTimeStamp = timestamp;
+    _ports[kInputPort].append(buffer);
+    _signalled = true;
+  }
+  _wake.notify_one();
   return OMX_ErrorNone;
 }
 

@@ -1,5 +1,7 @@
 // The worker thread: commands first, then one step of the codec at a time.
 
+#include <utility>
+
 #include "host/mediaserver/node.h"
 
 namespace mediaserver {
@@ -11,6 +13,7 @@ void Node::work() {
     _signalled = false;
     _awaitsReader = false;
     if (runCommand(lock) || process(lock)) continue;
+    _channel.wake();
     pause(lock);
   }
   stopCodec(lock);
@@ -63,6 +66,13 @@ bool Node::receiveOutput(Lock& lock) {
   lock.unlock();
   const Received received = _codec->receive(space);
   lock.lock();
+  // With nothing to go on with, the rest is written at once: what it is made from is still close to this
+  // processor.
+  if (received == Received::Filled && space.complete && _ports[kInputPort].line.empty()) {
+    lock.unlock();
+    std::exchange(space.complete, nullptr)();
+    lock.lock();
+  }
 
   switch (received) {
     case Received::Filled:
@@ -128,6 +138,7 @@ void Node::finishOutput(const std::shared_ptr<Buffer>& buffer, OutputSpace space
     event(OMX_EventBufferFlag, kOutputPort, space.flags);
   }
   giveBack(kOutputPort, buffer, std::move(space.complete));
+  _channel.wake();
 }
 
 bool Node::sendInput(Lock& lock) {
@@ -138,6 +149,7 @@ bool Node::sendInput(Lock& lock) {
   const OMX_BUFFERHEADERTYPE& header = buffer->header;
   const InputView view{buffer->data() + header.nOffset, header.nFilledLen, header.nTimeStamp, header.nFlags};
   const bool end = (view.flags & OMX_BUFFERFLAG_EOS) != 0;
+  _channel.wake();
   lock.unlock();
   const bool taken = _codec->send(view) == Sent::Taken;
   if (taken && end) _codec->drain(view.timestamp);
@@ -150,7 +162,8 @@ bool Node::sendInput(Lock& lock) {
     _draining = true;
     _drainTime = view.timestamp;
   }
-  giveBack(kInputPort, buffer);
+  giveBack(kInputPort,
+           buffer);  // the client is told with the output, which is next, or at the latest before a pause
   return true;
 }
 

@@ -218,10 +218,9 @@ status_t OmxServer::allocateBuffer(node_id node, OMX_U32 port_index, size_t size
 
 status_t OmxServer::allocateBufferWithBackup(node_id node, OMX_U32 port_index,
                                              const sp<android::IMemory>& params, buffer_id* buffer) {
-  // A backup keeps the client's later writes from what the component reads. What the component only writes
-  // needs none, and a whole picture less is copied.
-  return addBuffer(node, port_index,
-                   port_index == kOutputPort ? Buffer::onBlock(params) : Buffer::withBackup(params), buffer);
+  // Where the component's memory is the client's too, the block can be the buffer itself, and a whole picture
+  // less is copied.
+  return addBuffer(node, port_index, Buffer::onBlock(params), buffer);
 }
 
 status_t OmxServer::freeBuffer(node_id node, OMX_U32 port_index, buffer_id buffer) {

@@ -121,9 +121,10 @@ void StreamDecoder::parse(Bytes bytes, int64_t timestamp) {
 }
 
 void StreamDecoder::decode(Bytes unit, int64_t timestamp) {
-  if (_options.coding == OMX_VIDEO_CodingAVC) lookInside(unit);
   if (av_new_packet(_packet.get(), static_cast<int>(unit.size())) < 0) return;
   std::copy(unit.begin(), unit.end(), _packet->data);
+  // The copy is what is looked at: the client may still write into its own.
+  if (_options.coding == OMX_VIDEO_CodingAVC) lookInside({_packet->data, unit.size()});
   _packet->pts = timestamp;
   // A refusal means damage, and there may be pictures all the same.
   static_cast<void>(avcodec_send_packet(_context.get(), _packet.get()));
