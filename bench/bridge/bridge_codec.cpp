@@ -74,7 +74,7 @@ void BridgeCodec::send(std::span<const uint8_t> input) {
       return;
     }
     std::unique_lock held(_mutex);
-    _moved.wait(held, [&] { return _returned != before; });
+    _inputReturned.wait(held, [&] { return _returned != before; });
   }
 }
 
@@ -86,7 +86,7 @@ void BridgeCodec::requestKey() {
 
 void BridgeCodec::waitForAll() {
   std::unique_lock held(_mutex);
-  _moved.wait(held, [this] { return _outputs >= _sent; });
+  _outputCame.wait(held, [this] { return _outputs >= _sent; });
 }
 
 Clock::time_point BridgeCodec::lastOutput() const {
@@ -98,7 +98,7 @@ int BridgeCodec::onInput(void* /*session*/, void* context) {
   auto& self = *static_cast<BridgeCodec*>(context);
   const std::lock_guard held(self._mutex);
   ++self._returned;
-  self._moved.notify_all();
+  self._inputReturned.notify_all();
   return 0;
 }
 
@@ -110,7 +110,7 @@ int BridgeCodec::onOutput(void* /*session*/, void* data, unsigned int length, vo
   const std::lock_guard held(self._mutex);
   self._lastOutput = now;
   ++self._outputs;
-  self._moved.notify_all();
+  self._outputCame.notify_all();
   return 0;
 }
 

@@ -46,7 +46,8 @@ class BridgeCodec {
   const OutputHandler _handler;
   uint64_t _sent = 0;
   mutable std::mutex _mutex;
-  std::condition_variable _moved;
+  std::condition_variable _inputReturned;
+  std::condition_variable _outputCame;
   uint64_t _returned = 0;
   uint64_t _outputs = 0;
   Clock::time_point _lastOutput;

@@ -81,6 +81,11 @@ std::span<const uint8_t> DirectEncoder::encode(const Frame& frame, bool key) {
   return {_packet->data, static_cast<size_t>(_packet->size)};
 }
 
+std::span<const uint8_t> DirectEncoder::encodeCopied(const Frame& frame, bool key) {
+  _copied = frame;
+  return encode(_copied, key);
+}
+
 DirectDecoder::DirectDecoder()
     : _context(avcodec_alloc_context3(avcodec_find_decoder(AV_CODEC_ID_H264))),
       _frame(av_frame_alloc()),

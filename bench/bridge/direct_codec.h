@@ -31,11 +31,14 @@ class DirectEncoder {
 
   // Encodes a frame where it lies. The unit is valid until the next call.
   std::span<const uint8_t> encode(const Frame& frame, bool key);
+  // Puts it into memory of this object first, as a client of a device has to.
+  std::span<const uint8_t> encodeCopied(const Frame& frame, bool key);
 
  private:
   const std::unique_ptr<AVCodecContext, AvDeleter> _context;
   const std::unique_ptr<AVFrame, AvDeleter> _frame;
   const std::unique_ptr<AVPacket, AvDeleter> _packet;
+  Frame _copied;
   int64_t _count = 0;
 };
 

@@ -1,7 +1,8 @@
 // What a session costs: the same frames through the C interface and through libavcodec directly, in turns.
 //
 // Throughput is of frames fed as fast as they are taken; latency is added time of frames sent one by one,
-// from the call that sends to the callback that delivers. Figures are medians.
+// from the call that sends to the callback that delivers, without the time that libavcodec itself takes.
+// Figures are medians.
 #include <stdio.h>
 #include <stdlib.h>
 #include <string.h>
@@ -15,7 +16,9 @@
 #include <omxhost/device.h>
 
 #include "bench/bridge/allocations.h"
+#include "bench/bridge/awake.h"
 #include "bench/bridge/bridge_codec.h"
+#include "bench/bridge/codec_time.h"
 #include "bench/bridge/direct_codec.h"
 #include "tools/video/device_layout.h"
 #include "tools/video/scene.h"
@@ -67,9 +70,29 @@ struct Cost {
   double directRate;                            // frames per second
   double bridgeRate;                            // frames per second
   double throughput;                            // bridge / direct
-  double addedLatency;                          // microseconds
+  double addedLatency;                          // microseconds, the processors being awake
+  double addedLatencyAsleep;                    // the same when they sleep in between
   std::map<std::string, uint64_t> allocations;  // during as many frames as one round has
 };
+
+// In microseconds. The codec's own time, which varies by more than what is to be measured, is left out on
+// both sides.
+double addedLatency(const Subject& subject) {
+  std::vector<double> direct;
+  std::vector<double> bridge;
+  const auto rest = [](Clock::duration whole) { return Microseconds(whole - takeCodecTime()).count(); };
+  takeCodecTime();
+  for (size_t i = 0; i < 3 * kFrames; ++i) {
+    Clock::time_point begin = Clock::now();
+    subject.direct(i % kFrames);
+    direct.push_back(rest(Clock::now() - begin));
+    begin = Clock::now();
+    subject.sendToBridge(i % kFrames);
+    subject.bridge.waitForAll();
+    bridge.push_back(rest(subject.bridge.lastOutput() - begin));
+  }
+  return median(bridge) - median(direct);
+}
 
 Cost measure(const Subject& subject) {
   std::vector<double> directRates;
@@ -89,19 +112,16 @@ Cost measure(const Subject& subject) {
     ratios.push_back(direct / bridge);
   }
 
-  std::vector<double> added;
-  for (size_t i = 0; i < 3 * kFrames; ++i) {
-    const double direct = 1e6 * seconds([&] { subject.direct(i % kFrames); });
-    const Clock::time_point sent = Clock::now();
-    subject.sendToBridge(i % kFrames);
-    subject.bridge.waitForAll();
-    added.push_back(Microseconds(subject.bridge.lastOutput() - sent).count() - direct);
-  }
+  const double asleep = addedLatency(subject);
+  const double awake = [&] {
+    const Awake keep;
+    return addedLatency(subject);
+  }();
 
   countAllocations();
   for (size_t i = 0; i < kFrames; ++i) subject.sendToBridge(i);
   subject.bridge.waitForAll();
-  return {median(directRates), median(bridgeRates), median(ratios), median(added), takeAllocations()};
+  return {median(directRates), median(bridgeRates), median(ratios), awake, asleep, takeAllocations()};
 }
 
 double perFrame(const Cost& cost, const char* library) {
@@ -113,9 +133,9 @@ double perFrame(const Cost& cost, const char* library) {
 }
 
 void print(const char* device, const char* kind, tool::Size size, const Cost& cost) {
-  printf("| %s | %s | %dx%d | %.0f | %.0f | %.3f | %.0f | %.1f |\n", device, kind, size.width, size.height,
-         cost.directRate, cost.bridgeRate, cost.throughput, cost.addedLatency,
-         perFrame(cost, "libomxbridge"));
+  printf("| %s | %s | %dx%d | %.0f | %.0f | %.3f | %.0f | %.0f | %.1f |\n", device, kind, size.width,
+         size.height, cost.directRate, cost.bridgeRate, cost.throughput, cost.addedLatency,
+         cost.addedLatencyAsleep, perFrame(cost, "libomxbridge"));
   fflush(stdout);
 }
 
@@ -125,18 +145,17 @@ void measureSize(const char* device, tool::Size size) {
   {
     DirectEncoder direct(size, kFrameRate, kBitRate);
     BridgeCodec bridge = BridgeCodec::encoder(size, kFrameRate, kBitRate, nullptr);
-    const Cost cost = measure({
-        [&](size_t i) {
-          const auto unit = direct.encode(frames[i], i == 0);
-          if (units.size() < frames.size()) units.emplace_back(unit.begin(), unit.end());
-        },
-        [&](size_t i) {
-          if (i == 0) bridge.requestKey();
-          bridge.send(frames[i]);
-        },
-        bridge,
-    });
-    print(device, "encode", size, cost);
+    const auto send = [&](size_t i) {
+      if (i == 0) bridge.requestKey();
+      bridge.send(frames[i]);
+    };
+    const auto encode = [&](size_t i) {
+      const auto unit = direct.encodeCopied(frames[i], i == 0);
+      if (units.size() < frames.size()) units.emplace_back(unit.begin(), unit.end());
+    };
+    print(device, "encode", size, measure({encode, send, bridge}));
+    const auto encodeInPlace = [&](size_t i) { direct.encode(frames[i], i == 0); };
+    print(device, "encode, from where it lies", size, measure({encodeInPlace, send, bridge}));
   }
   DirectDecoder direct;
   BridgeCodec bridge = BridgeCodec::decoder(nullptr);
@@ -171,9 +190,10 @@ int main(int argc, char** argv) {
   std::span<const char* const> devices(usual);
   if (argc > 1) devices = std::span<const char* const>(argv, static_cast<size_t>(argc)).subspan(1);
   printf(
-      "| Device | | Size | libavcodec, frames/s | session, frames/s | ratio | added latency, us | "
+      "| Device | | Size | libavcodec, frames/s | session, frames/s | ratio | added latency, us | asleep, us "
+      "| "
       "allocations per frame |\n");
-  printf("| --- | --- | --- | ---: | ---: | ---: | ---: | ---: |\n");
+  printf("| --- | --- | --- | ---: | ---: | ---: | ---: | ---: | ---: |\n");
   fflush(stdout);
   for (const char* const device : devices) {
     const pid_t child = fork();
