@@ -49,4 +49,11 @@ set(CPACK_COMPONENT_DEVELOPMENT_DESCRIPTION "H.264 sessions for video calls: hea
 What it takes to build applications with omxbridge, by CMake or pkg-config:
 headers, guides, and programs to start from.")
 
+# Debian wants one in every package.
+foreach(component IN LISTS CPACK_COMPONENTS_ALL)
+  string(TOUPPER ${component} name)
+  install(FILES LICENSE DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/${CPACK_DEBIAN_${name}_PACKAGE_NAME}
+    RENAME copyright COMPONENT ${component})
+endforeach()
+
 include(CPack)
