@@ -5,18 +5,17 @@
 
 #include <algorithm>
 #include <chrono>
-#include <condition_variable>
 #include <cstdint>
 #include <cstdlib>
 #include <cstring>
-#include <mutex>
+#include <future>
 #include <span>
-#include <thread>
 #include <vector>
 
 #include <omxhost/log.h>
 
 #include "omxbridge/omxbridge.h"
+#include "tests/core/application.h"
 #include "tools/video/device_layout.h"
 
 namespace {
@@ -39,93 +38,31 @@ size_t nextUnit(std::span<const uint8_t> stream) {
   return static_cast<size_t>(next - stream.begin());
 }
 
-class Application {
- public:
-  explicit Application(void* session) : _session(session) {
-    omx_interface_register_input_callback(session, onInput, this);
-    omx_interface_register_output_callback(session, onOutput, this);
+// False where the session does not take anything any more.
+bool send(void* session, const omxtest::Application& application, std::span<const uint8_t> unit,
+          int timestamp) {
+  void* buffer = nullptr;
+  void* memory = nullptr;
+  for (;;) {
+    const size_t seen = application.inputCallbacks().size();
+    const int result = omx_interface_reserve_input_buffer(session, &buffer, &memory);
+    if (result == 0) break;
+    const bool over = result != -1 || omx_interface_error(session) != 0;
+    if (over || !application.waitForCalls(seen + 1, 0, kPatience)) return false;
   }
-
-  // False where the session does not take anything any more.
-  bool send(std::span<const uint8_t> unit) {
-    void* buffer = nullptr;
-    void* memory = nullptr;
-    for (;;) {
-      const uint64_t seen = moves();
-      const int result = omx_interface_reserve_input_buffer(_session, &buffer, &memory);
-      if (result == 0) break;
-      if (result != -1 || omx_interface_error(_session) != 0 || !waitForMove(seen)) return false;
-    }
-    // The input port is made for 640x480 at least.
-    const size_t length = std::min<size_t>(unit.size(), 64 << 10);
-    std::memcpy(memory, unit.data(), length);
-    ++_sent;
-    return omx_interface_send_input_buffer(_session, buffer, static_cast<int>(length), ++_time) == 0;
-  }
-  bool waitForInput() {
-    std::unique_lock<std::mutex> lock(_mutex);
-    return _moved.wait_for(lock, kPatience, [this] { return _returned >= _sent; });
-  }
-
- private:
-  uint64_t moves() {
-    const std::lock_guard<std::mutex> lock(_mutex);
-    return _returned + _pictures;
-  }
-  bool waitForMove(uint64_t seen) {
-    std::unique_lock<std::mutex> lock(_mutex);
-    return _moved.wait_for(lock, kPatience, [&] { return _returned + _pictures > seen; });
-  }
-  static int onInput(void* /*session*/, void* context) {
-    auto& self = *static_cast<Application*>(context);
-    const std::lock_guard<std::mutex> lock(self._mutex);
-    ++self._returned;
-    self._moved.notify_all();
-    return 0;
-  }
-  static int onOutput(void* info, void* data, unsigned int length, void* /*buffer*/, void* context,
-                      unsigned int /*timestamp*/) {
-    auto& self = *static_cast<Application*>(context);
-    require(data != nullptr && length > 0);
-    tool::Picture picture;
-    static_cast<void>(self._reader.read(*static_cast<DECODEDDATAINFO*>(info),
-                                        {static_cast<const uint8_t*>(data), length}, picture));
-    const std::lock_guard<std::mutex> lock(self._mutex);
-    ++self._pictures;
-    self._moved.notify_all();
-    return 0;
-  }
-
-  void* const _session;
-  uint64_t _sent = 0;
-  int _time = 0;
-  tool::DecodedPictureReader _reader;  // the output thread's
-  std::mutex _mutex;                   // guards the next three
-  std::condition_variable _moved;
-  uint64_t _returned = 0;
-  uint64_t _pictures = 0;
-};
+  // The input port is made for 640x480 at least.
+  const size_t length = std::min<size_t>(unit.size(), 64 << 10);
+  std::memcpy(memory, unit.data(), length);
+  return omx_interface_send_input_buffer(session, buffer, static_cast<int>(length), timestamp) == 0;
+}
 
 // Runs one of the calls that may wait without a limit. Where it takes too long the session is destroyed under
 // it, which ends it; then false.
 template <typename Call>
 bool ends(void* session, Call call) {
-  std::mutex mutex;
-  std::condition_variable changed;
-  bool ended = false;
-  std::thread owner([&] {
-    call();
-    const std::lock_guard<std::mutex> lock(mutex);
-    ended = true;
-    changed.notify_all();
-  });
-  bool inTime = false;
-  {
-    std::unique_lock<std::mutex> lock(mutex);
-    inTime = changed.wait_for(lock, kPatience, [&] { return ended; });
-  }
+  const std::future<void> end = std::async(std::launch::async, call);  // waited for at the end
+  const bool inTime = end.wait_for(kPatience) == std::future_status::ready;
   if (!inTime) omx_interface_destroy(session);
-  owner.join();
   return inTime;
 }
 
@@ -146,15 +83,26 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* bytes, size_t size) {
   require(session != nullptr && result == 0);
   omx_decoder_set_input_compression_format(session, format);
   omx_decoder_set_input_packing_format(session, packing);
-  Application application(session);
+  omxtest::Application application;
+  tool::DecodedPictureReader reader;  // the output thread's
+  application.leaveDataAlone();
+  application.onOutput([&reader](const omxtest::Output& output) {
+    require(output.data != nullptr && output.length > 0);
+    tool::Picture picture;
+    const std::span<const uint8_t> seen(static_cast<const uint8_t*>(output.data), output.length);
+    static_cast<void>(reader.read(output.info, seen, picture));
+    return 0;
+  });
+  application.attach(*static_cast<OmxInterface*>(session));
   require(omx_interface_init(session) == 0);
   std::span<const uint8_t> rest(stream);
-  for (size_t i = 0; i < kMostUnits && !rest.empty(); ++i) {
+  size_t sent = 0;
+  for (; sent < kMostUnits && !rest.empty(); ++sent) {
     const size_t length = pieces == 0 ? nextUnit(rest) : std::min(rest.size(), pieces * pieces * 97);
-    if (!application.send(rest.first(length))) break;
+    if (!send(session, application, rest.first(length), static_cast<int>(sent))) break;
     rest = rest.subspan(length);
   }
-  if (inOrder && application.waitForInput()) {
+  if (inOrder && application.waitForCalls(sent, 0, kPatience)) {
     // Pictures that have yet to be delivered may hold all output buffers by now: how many will come of
     // damaged data nobody knows, so either call may wait for ever.
     if (!ends(session, [&] { omx_interface_send_end_of_input_flag(session, 0); }) ||

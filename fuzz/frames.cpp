@@ -13,7 +13,11 @@
 
 namespace {
 
+using namespace webrtc;
 using Byte = unsigned char;
+struct Size {
+  unsigned width, height;
+};
 
 // Buffers above this are not made; a call that needs more than the library can do has to be refused.
 constexpr uint64_t kLargestBuffer = 1U << 22;
@@ -25,13 +29,13 @@ void require(bool holds) {
 }
 
 // Beyond all buffers, and yet a result of 0 where an odd row or column does not count.
-bool isOneLongLine(unsigned width, unsigned height) {
-  return std::min(width, height) == 1 && std::max(width, height) > kLargestBuffer / 8;
+bool isOneLongLine(Size s) {
+  return std::min(s.width, s.height) == 1 && std::max(s.width, s.height) > kLargestBuffer / 8;
 }
 
 // `half` counts half bytes per pixel: 3 for 4:2:0.
-uint64_t frameBytes(uint64_t width, uint64_t height, unsigned half) {
-  return width * height * half / 2;
+uint64_t frameBytes(Size s, unsigned half = 3) {
+  return uint64_t{s.width} * s.height * half / 2;
 }
 
 class Input {
@@ -46,17 +50,12 @@ class Input {
                : _data.ConsumeIntegralInRange<unsigned>(0, 160);
   }
   unsigned stride(unsigned width) {
-    switch (_data.ConsumeIntegralInRange<unsigned>(0, 3)) {
-      case 0:
-        return 0;
-      case 1:
-        return width;
-      case 2:
-        return width + _data.ConsumeIntegralInRange<unsigned>(0, 40);
-      default:
-        return size();
-    }
+    const unsigned kind = _data.ConsumeIntegralInRange<unsigned>(0, 3);
+    if (kind == 3) return size();
+    if (kind == 2) return width + _data.ConsumeIntegralInRange<unsigned>(0, 40);
+    return kind == 1 ? width : 0;
   }
+  Size frame() { return {size(), size()}; }
   Byte fill() { return _data.ConsumeIntegral<Byte>(); }
 
  private:
@@ -98,249 +97,185 @@ using SrcDstStride = int (*)(const Byte*, Byte*, unsigned, unsigned, unsigned);
 using SizeSrcDst = int (*)(unsigned, unsigned, const Byte*, Byte*);
 using SrcSizeDst = int (*)(const Byte*, unsigned, unsigned, Byte*);
 
+using Function = std::variant<SrcDst, SrcDstStride, SizeSrcDst, SrcSizeDst>;
+
 struct OneSize {
-  std::variant<SrcDst, SrcDstStride, SizeSrcDst, SrcSizeDst> function;
-  unsigned srcHalf;  // half bytes per pixel
-  unsigned dstHalf;
+  Function function;
+  unsigned srcHalf, dstHalf;  // half bytes per pixel
 };
 
-const OneSize kOneSize[] = {
-    {webrtc::ConvertI420ToRGB24, 3, 6},
-    {webrtc::ConvertI420ToRGB24_EX, 3, 6},
-    {webrtc::ConvertI420ToARGB, 3, 8},
-    {webrtc::ConvertI420ToARGBMac, 3, 8},
-    {webrtc::ConvertI420ToRGBAMac, 3, 8},
-    {webrtc::ConvertI420ToRGBAIPhone, 3, 8},
-    {webrtc::ConvertI420ToARGB4444, 3, 4},
-    {webrtc::ConvertI420ToARGB4444_EX, 3, 4},
-    {webrtc::ConvertI420ToRGB565, 3, 4},
-    {webrtc::ConvertI420ToRGB565_EX, 3, 4},
-    {webrtc::ConvertI420ToRGB565Android, 3, 4},
-    {webrtc::ConvertI420ToARGB1555, 3, 4},
-    {webrtc::ConvertI420ToARGB1555_EX, 3, 4},
-    {webrtc::ConvertNV12ToRGB565, 3, 4},
-    {webrtc::ConvertRGB24ToARGB, 6, 8},
-    {webrtc::ConvertYV12ToI420, 3, 3},
-    {webrtc::ConvertI420ToYV12, 3, 3},
-    {SrcDstStride{webrtc::ConvertI420ToI420}, 3, 3},
-    {webrtc::ConvertI420ToNV12, 3, 3},
-    {webrtc::ConvertI420ToNV21, 3, 3},
-    {webrtc::ConvertNV12ToI420, 3, 3},
-    {webrtc::ConvertNV21ToI420, 3, 3},
-    {webrtc::ConvertI420ToYUY2, 3, 4},
-    {webrtc::ConvertI420ToUYVY, 3, 4},
-    {SizeSrcDst{webrtc::ConvertYUY2ToI420}, 4, 3},
-    {SizeSrcDst{webrtc::ConvertUYVYToI420}, 4, 3},
-    {SizeSrcDst{webrtc::ConvertRGB24ToI420}, 6, 3},
-    {webrtc::ConvertARGBMacToI420, 8, 3},
-    {webrtc::ConvertRGB565ToI420, 4, 3},
-    {webrtc::ConvertNV12ToI420AndRotateClockwise, 3, 3},
-    {webrtc::ConvertNV12ToI420AndRotateAntiClockwise, 3, 3},
-    {webrtc::ConvertNV12ToI420AndRotate180, 3, 3},
-    {webrtc::ConvertNV21ToI420AndRotateClockwise, 3, 3},
-    {webrtc::ConvertNV21ToI420AndRotateAntiClockwise, 3, 3},
-    {webrtc::ConvertNV21ToI420AndRotate180, 3, 3},
-    {webrtc::MirrorI420UpDown, 3, 3},
-    {webrtc::MirrorI420LeftRight, 3, 3},
-};
+const std::vector<OneSize> kOneSize = [] {
+  std::vector<OneSize> all;
+  const auto add = [&](unsigned srcHalf, unsigned dstHalf, std::initializer_list<Function> functions) {
+    for (const Function& function : functions) all.push_back({function, srcHalf, dstHalf});
+  };
+  add(3, 6, {ConvertI420ToRGB24, ConvertI420ToRGB24_EX});
+  add(3, 8, {ConvertI420ToARGB, ConvertI420ToARGBMac, ConvertI420ToRGBAMac, ConvertI420ToRGBAIPhone});
+  add(3, 4,
+      {ConvertI420ToARGB4444, ConvertI420ToARGB4444_EX, ConvertI420ToRGB565, ConvertI420ToRGB565_EX,
+       ConvertI420ToRGB565Android, ConvertI420ToARGB1555, ConvertI420ToARGB1555_EX, ConvertNV12ToRGB565});
+  add(6, 8, {ConvertRGB24ToARGB});
+  add(3, 3,
+      {ConvertYV12ToI420, ConvertI420ToYV12, SrcDstStride{ConvertI420ToI420}, ConvertI420ToNV12,
+       ConvertI420ToNV21, ConvertNV12ToI420, ConvertNV21ToI420});
+  add(3, 4, {ConvertI420ToYUY2, ConvertI420ToUYVY});
+  add(4, 3, {SizeSrcDst{ConvertYUY2ToI420}, SizeSrcDst{ConvertUYVYToI420}});
+  add(6, 3, {SizeSrcDst{ConvertRGB24ToI420}});
+  add(8, 3, {ConvertARGBMacToI420});
+  add(4, 3, {ConvertRGB565ToI420});
+  add(3, 3,
+      {ConvertNV12ToI420AndRotateClockwise, ConvertNV12ToI420AndRotateAntiClockwise,
+       ConvertNV12ToI420AndRotate180, ConvertNV21ToI420AndRotateClockwise,
+       ConvertNV21ToI420AndRotateAntiClockwise, ConvertNV21ToI420AndRotate180, MirrorI420UpDown,
+       MirrorI420LeftRight});
+  return all;
+}();
 
 void oneSize(Input& input) {
-  const OneSize& chosen = input.data().PickValueInArray(kOneSize);
-  const unsigned width = input.size();
-  const unsigned height = input.size();
+  const OneSize& chosen = kOneSize[input.data().ConsumeIntegralInRange<size_t>(0, kOneSize.size() - 1)];
+  const Size s = input.frame();
   const bool hasStride = std::holds_alternative<SrcDstStride>(chosen.function);
-  const unsigned stride = hasStride ? input.stride(width) : 0;
-  if (isOneLongLine(std::max(stride, width), height)) return;
-  run(input, frameBytes(width, height, chosen.srcHalf),
-      frameBytes(std::max(stride, width), height, chosen.dstHalf), [&](const Byte* src, Byte* dst) {
+  const unsigned stride = hasStride ? input.stride(s.width) : 0;
+  const Size result{std::max(stride, s.width), s.height};
+  if (isOneLongLine(result)) return;
+  run(input, frameBytes(s, chosen.srcHalf), frameBytes(result, chosen.dstHalf),
+      [&](const Byte* src, Byte* dst) {
         if (const auto* plain = std::get_if<SrcDst>(&chosen.function))
-          return (*plain)(src, dst, width, height);
+          return (*plain)(src, dst, s.width, s.height);
         if (const auto* first = std::get_if<SizeSrcDst>(&chosen.function))
-          return (*first)(width, height, src, dst);
+          return (*first)(s.width, s.height, src, dst);
         if (const auto* middle = std::get_if<SrcSizeDst>(&chosen.function))
-          return (*middle)(src, width, height, dst);
-        return std::get<SrcDstStride>(chosen.function)(src, dst, width, height, stride);
+          return (*middle)(src, s.width, s.height, dst);
+        return std::get<SrcDstStride>(chosen.function)(src, dst, s.width, s.height, stride);
       });
 }
 
 // --- Two sizes --------------------------------------------------------------------------------------------
 
-using Centred = int (*)(const Byte*, unsigned, unsigned, Byte*, unsigned, unsigned);
 struct TwoSizes {
-  Centred function;
+  int (*function)(const Byte* src, unsigned width, unsigned height, Byte* dst, unsigned toWidth,
+                  unsigned toHeight);
   unsigned srcHalf;
 };
 const TwoSizes kTwoSizes[] = {
-    {webrtc::ConvertI420ToI420, 3},
-    {webrtc::ConvertYUY2ToI420, 4},
-    {webrtc::ConvertUYVYToI420, 4},
-    {webrtc::ConvertYUY2ToI420interlaced, 4},
-    {webrtc::ConvertUYVYToI420interlaced, 4},
-    {webrtc::ConvertRGB24ToI420, 6},
-    {[](const Byte* src, unsigned srcWidth, unsigned srcHeight, Byte* dst, unsigned dstWidth,
-        unsigned dstHeight) {
-       return webrtc::PadI420Frame(src, dst, srcWidth, srcHeight, dstWidth, dstHeight);
+    {ConvertI420ToI420, 3},
+    {ConvertYUY2ToI420, 4},
+    {ConvertUYVYToI420, 4},
+    {ConvertYUY2ToI420interlaced, 4},
+    {ConvertUYVYToI420interlaced, 4},
+    {ConvertRGB24ToI420, 6},
+    {[](const Byte* src, unsigned width, unsigned height, Byte* dst, unsigned toWidth, unsigned toHeight) {
+       return PadI420Frame(src, dst, width, height, toWidth, toHeight);
      },
-     3},
-};
+     3}};
 
 void twoSizes(Input& input) {
   const TwoSizes& chosen = input.data().PickValueInArray(kTwoSizes);
-  const unsigned width = input.size();
-  const unsigned height = input.size();
-  const unsigned dstWidth = input.size();
-  const unsigned dstHeight = input.size();
-  if (isOneLongLine(dstWidth, dstHeight)) return;
-  run(input, frameBytes(width, height, chosen.srcHalf), frameBytes(dstWidth, dstHeight, 3),
-      [&](const Byte* src, Byte* dst) {
-        return chosen.function(src, width, height, dst, dstWidth, dstHeight);
-      });
+  const Size from = input.frame();
+  const Size to = input.frame();
+  if (isOneLongLine(to)) return;
+  run(input, frameBytes(from, chosen.srcHalf), frameBytes(to), [&](const Byte* src, Byte* dst) {
+    return chosen.function(src, from.width, from.height, dst, to.width, to.height);
+  });
 }
 
 // --- The rest ---------------------------------------------------------------------------------------------
 
 void turn(Input& input) {
-  const unsigned width = input.size();
-  const unsigned height = input.size();
+  const Size s = input.frame();
   const bool fits = input.data().ConsumeIntegralInRange(0, 7) != 0;
-  const unsigned dstWidth = fits ? height : input.size();
-  const unsigned dstHeight = fits ? width : input.size();
-  const auto type = static_cast<webrtc::VideoType>(input.data().ConsumeIntegralInRange(0, 15));
+  const Size to = fits ? Size{s.height, s.width} : input.frame();
+  const auto type = static_cast<VideoType>(input.data().ConsumeIntegralInRange(0, 15));
   const unsigned which = input.data().ConsumeIntegralInRange<unsigned>(0, 2);
-  const uint64_t bytes = frameBytes(width, height, 3);
-  run(input, bytes, bytes, [&](const Byte* src, Byte* dst) {
-    if (which == 0) return webrtc::ConvertToI420AndMirrorUpDown(src, dst, width, height, type);
-    const auto function =
-        which == 1 ? webrtc::ConvertToI420AndRotateClockwise : webrtc::ConvertToI420AndRotateAntiClockwise;
-    return function(src, width, height, dst, dstWidth, dstHeight, type);
+  run(input, frameBytes(s), frameBytes(s), [&](const Byte* src, Byte* dst) {
+    if (which == 0) return ConvertToI420AndMirrorUpDown(src, dst, s.width, s.height, type);
+    const auto function = which == 1 ? ConvertToI420AndRotateClockwise : ConvertToI420AndRotateAntiClockwise;
+    return function(src, s.width, s.height, dst, to.width, to.height, type);
   });
 }
 
-unsigned halfBytes(uint32_t type) {
-  switch (type) {
-    case webrtc::kRGB24:
-      return 6;
-    case webrtc::kARGB:
-    case webrtc::kUnsupported32:
-      return 8;
-    case webrtc::kARGB4444:
-    case webrtc::kRGB565:
-    case webrtc::kARGB1555:
-    case webrtc::kYUY2:
-    case webrtc::kUYVY:
-      return 4;
-    default:
-      return 3;
-  }
-}
-
 void dispatch(Input& input) {
-  const uint32_t type = input.data().ConsumeIntegralInRange<uint32_t>(0, 15);
-  const unsigned width = input.size();
-  const unsigned height = input.size();
+  static constexpr unsigned kHalfBytes[] = {3, 3, 3, 6, 8, 4, 4, 4, 4, 3, 4, 8, 3, 3, 3, 3};  // by type
+  const auto type = static_cast<VideoType>(input.data().ConsumeIntegralInRange<uint32_t>(0, 15));
+  const Size s = input.frame();
   const bool interlaced = input.data().ConsumeBool();
   const int turns[] = {0, 90, -90, 180, 45};
-  const auto rotation = static_cast<webrtc::VideoRotationMode>(input.data().PickValueInArray(turns));
-  const auto kind = static_cast<webrtc::VideoType>(type);
-  const uint64_t other = frameBytes(width, height, halfBytes(type));
-  const uint64_t planar = frameBytes(width, height, 3);
-  if (input.data().ConsumeBool()) {
-    run(input, other, planar, [&](const Byte* src, Byte* dst) {
-      return webrtc::ConvertToI420(kind, src, width, height, dst, interlaced, rotation);
-    });
-  } else {
-    run(input, planar, other, [&](const Byte* src, Byte* dst) {
-      return webrtc::ConvertFromI420(kind, src, width, height, dst, interlaced, rotation);
-    });
-  }
+  const auto rotation = static_cast<VideoRotationMode>(input.data().PickValueInArray(turns));
+  const bool toPlanar = input.data().ConsumeBool();
+  const auto function = toPlanar ? ConvertToI420 : ConvertFromI420;
+  const uint64_t bytes[] = {frameBytes(s), frameBytes(s, kHalfBytes[type])};
+  run(input, bytes[toPlanar ? 1 : 0], bytes[toPlanar ? 0 : 1], [&](const Byte* src, Byte* dst) {
+    return function(type, src, s.width, s.height, dst, interlaced, rotation);
+  });
 }
 
 void crop(Input& input) {
-  const auto number = [&] { return static_cast<int>(input.size()); };
-  const int stride = number();
-  const int height = number();
-  const int left = number();
-  const int top = number();
-  const int right = number();
-  const int bottom = number();
+  int numbers[6];
+  for (int& number : numbers) number = static_cast<int>(input.size());
+  const int64_t stride = numbers[0], height = numbers[1], left = numbers[2], top = numbers[3];
+  const int64_t right = numbers[4], bottom = numbers[5];
   const bool inside = stride > 0 && height > 0 && left >= 0 && top >= 0 && left <= right && top <= bottom &&
                       right < stride && bottom < height;
-  const uint64_t columns = inside ? static_cast<uint64_t>(right) - static_cast<uint64_t>(left) + 1 : 0;
-  const uint64_t rows = inside ? static_cast<uint64_t>(bottom) - static_cast<uint64_t>(top) + 1 : 0;
-  const uint64_t chromaRows = inside ? static_cast<uint64_t>(bottom / 2 - top / 2 + 1) : 0;
-  const uint64_t source = inside ? static_cast<uint64_t>(stride) *
-                                       (static_cast<uint64_t>(height) + static_cast<uint64_t>(height) / 2)
-                                 : 0;
-  run(input, source, columns * (rows + chromaRows), [&](const Byte* src, Byte* dst) {
-    return webrtc::ConvertNV12ToNV12(src, stride, height, left, top, right, bottom, dst);
+  const int64_t rows = bottom - top + 1 + bottom / 2 - top / 2 + 1;
+  const int64_t source = inside ? stride * (height + height / 2) : 0;
+  const int64_t result = inside ? (right - left + 1) * rows : 0;
+  run(input, static_cast<uint64_t>(source), static_cast<uint64_t>(result), [&](const Byte* src, Byte* dst) {
+    return ConvertNV12ToNV12(src, numbers[0], numbers[1], numbers[2], numbers[3], numbers[4], numbers[5],
+                             dst);
   });
 }
 
 void inPlace(Input& input) {
+  using Scaler = int (*)(unsigned width, unsigned height, Byte* buffer);
+  static constexpr Scaler kScalers[] = {ScaleI420UpHalfFrame, ScaleI420DownHalfFrame, ScaleI420FrameQuarter};
   const unsigned which = input.data().ConsumeIntegralInRange<unsigned>(0, 4);
-  const unsigned width = input.size();
-  const unsigned height = input.size();
-  const unsigned toWidth = input.size();
-  const unsigned toHeight = input.size();
+  const Size s = input.frame();
+  const Size to = input.frame();
   const int rows = static_cast<int>(input.size());
-  const uint64_t frame = frameBytes(width, height, 3);
+  const uint64_t frame = frameBytes(s);
   if (which == 3 && frame > kLargestBuffer) return;  // what is cut out may be small
   const uint64_t capacity =
       which == 4 ? input.data().ConsumeIntegralInRange<uint64_t>(0, kLargestBuffer) : frame;
   run(input, 1, capacity, [&](const Byte* /*src*/, Byte* buffer) {
     unsigned outSize = 0;
-    switch (which) {
-      case 0:
-        return webrtc::ScaleI420UpHalfFrame(width, height, buffer);
-      case 1:
-        return webrtc::ScaleI420DownHalfFrame(width, height, buffer);
-      case 2:
-        return webrtc::ScaleI420FrameQuarter(width, height, buffer);
-      case 3:
-        return webrtc::CutI420Frame(buffer, width, height, toWidth, toHeight);
-      default:
-        if (frame > capacity) return -1;  // the caller's error
-        return webrtc::PadI420BottomRows(buffer, static_cast<unsigned>(capacity), width, height, rows,
-                                         outSize);
-    }
+    if (which < 3) return kScalers[which](s.width, s.height, buffer);
+    if (which == 3) return CutI420Frame(buffer, s.width, s.height, to.width, to.height);
+    if (frame > capacity) return -1;  // the caller's error
+    return PadI420BottomRows(buffer, static_cast<unsigned>(capacity), s.width, s.height, rows, outSize);
   });
 }
 
 void growing(Input& input) {
   using Growing = int (*)(unsigned, unsigned, Byte*&, unsigned, unsigned&, unsigned&);
-  const Growing functions[] = {webrtc::ScaleI420Down1_3, webrtc::ScaleI420Up3_2, webrtc::ScaleI420Up2};
+  const Growing functions[] = {ScaleI420Down1_3, ScaleI420Up3_2, ScaleI420Up2};
   const Growing function = input.data().PickValueInArray(functions);
-  const unsigned width = input.size();
-  const unsigned height = input.size();
-  const uint64_t frame = frameBytes(width, height, 3);
+  const Size s = input.frame();
+  const uint64_t frame = frameBytes(s);
   const uint64_t size =
       frame <= kLargestBuffer ? frame + input.data().ConsumeIntegralInRange<unsigned>(0, 64) : 1;
   Byte* buffer = new Byte[size]();
-  unsigned outWidth = 0;
-  unsigned outHeight = 0;
-  const int result = function(width, height, buffer, static_cast<unsigned>(size), outWidth, outHeight);
+  Size out{};
+  const int result = function(s.width, s.height, buffer, static_cast<unsigned>(size), out.width, out.height);
   if (result > 0) {
     const auto made = static_cast<unsigned>(result);
-    require(made <= std::max<uint64_t>(size, frameBytes(outWidth, outHeight, 3)));
+    require(made <= std::max<uint64_t>(size, frameBytes(out)));
     require(std::count(buffer, buffer + made, 1) <= result);  // reads them all
   }
   delete[] buffer;
 }
 
 void bilinear(Input& input) {
-  const unsigned width = input.size();
-  const unsigned height = input.size();
-  const unsigned dstWidth = input.size();
-  const unsigned dstHeight = input.size();
-  const uint64_t frame = frameBytes(width, height, 3) + (width % 2 != 0 ? height : 0);
-  if (frame > kLargestBuffer || uint64_t{dstWidth} * dstHeight > kLargestBuffer) return;
+  const Size from = input.frame();
+  const Size to = input.frame();
+  const uint64_t frame = frameBytes(from) + (from.width % 2 != 0 ? from.height : 0);
+  if (frame > kLargestBuffer || uint64_t{to.width} * to.height > kLargestBuffer) return;
   Buffer source(frame, input.fill());
   unsigned size = input.data().ConsumeIntegralInRange<unsigned>(0, 40000);
   Byte* destination = input.data().ConsumeBool() ? new Byte[size] : nullptr;
-  webrtc::interpolator scaler;
-  if (scaler.Set(width, height, dstWidth, dstHeight, webrtc::kI420, webrtc::kRGB24, webrtc::kBilinear) == 0) {
+  interpolator scaler;
+  if (scaler.Set(from.width, from.height, to.width, to.height, kI420, kRGB24, kBilinear) == 0) {
     const int result = scaler.Interpolate(source.get(), destination, size);
-    require(result == -1 || (result == static_cast<int>(dstHeight) && destination != nullptr));
+    require(result == -1 || (result == static_cast<int>(to.height) && destination != nullptr));
   }
   delete[] destination;
 }
@@ -350,7 +285,7 @@ void padByBytes(Input& input) {
   const unsigned size = input.data().PickValueInArray(sizes);
   const bool block = input.data().ConsumeBool();
   run(input, size, size == 115200 ? 152064 : 38016,
-      [&](const Byte* src, Byte* dst) { return webrtc::PadI420Frame(size, src, dst, block); });
+      [&](const Byte* src, Byte* dst) { return PadI420Frame(size, src, dst, block); });
 }
 
 }  // namespace

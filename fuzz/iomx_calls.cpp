@@ -108,42 +108,16 @@ class Client {
   Client& operator=(const Client&) = delete;
 
   void act() {
-    switch (_data.ConsumeIntegralInRange(0, 15)) {
-      case 0:
-        return allocateNode();
-      case 1:
-        return _data.ConsumeIntegralInRange(0, 3) == 0 ? freeNode() : nothing();
-      case 2:
-      case 3:
-        return command();
-      case 4:
-        return start();
-      case 5:
-      case 6:
-        return record();
-      case 7:
-        return definePort();
-      case 8:
-        return give(anyPort(), 0);
-      case 9:
-        return freeBuffer();
-      case 10:
-      case 11:
-        static_cast<void>(_omx->fillBuffer(_node, anyBuffer().id));
-        return;
-      case 12:
-      case 13:
-        return emptyBuffer();
-      case 14:
-        return _observer == nullptr ? nothing() : _observer->waitForMore();
-      default:
-        return oddCalls();
-    }
+    using Act = void (Client::*)();
+    static constexpr Act kActs[] = {
+        &Client::allocateNode, &Client::freeSometimes, &Client::command,     &Client::command,
+        &Client::start,        &Client::record,        &Client::record,      &Client::definePort,
+        &Client::giveAny,      &Client::freeBuffer,    &Client::fillBuffer,  &Client::fillBuffer,
+        &Client::emptyBuffer,  &Client::emptyBuffer,   &Client::waitForMore, &Client::oddCalls};
+    (this->*_data.PickValueInArray(kActs))();
   }
 
  private:
-  void nothing() {}
-
   void allocateNode() {
     if (_observer != nullptr) return;
     const std::string other = _data.ConsumeRandomLengthString(24);
@@ -161,6 +135,14 @@ class Client {
     _observer.clear();
     require(_omx->freeNode(_node) != android::OK);
     for (auto& buffers : _buffers) buffers.clear();
+  }
+
+  void freeSometimes() {
+    if (_data.ConsumeIntegralInRange(0, 3) == 0) freeNode();
+  }
+
+  void waitForMore() {
+    if (_observer != nullptr) _observer->waitForMore();
   }
 
   OMX_U32 anyPort() { return _data.ConsumeIntegralInRange<OMX_U32>(0, kPortCount); }
@@ -191,9 +173,9 @@ class Client {
         if (_buffers[port].size() == before) break;
       }
     }
-    if (_observer != nullptr) _observer->waitForMore();
+    waitForMore();
     static_cast<void>(_omx->sendCommand(_node, OMX_CommandStateSet, OMX_StateExecuting));
-    if (_observer != nullptr) _observer->waitForMore();
+    waitForMore();
     for (const Given& buffer : _buffers[mediaserver::kOutputPort])
       static_cast<void>(_omx->fillBuffer(_node, buffer.id));
   }
@@ -246,6 +228,8 @@ class Client {
     if (status == android::OK) _buffers.at(port).push_back(given);
   }
 
+  void giveAny() { give(anyPort(), 0); }
+
   // One of the client's own, mostly.
   Given anyBuffer() {
     const auto& buffers = _buffers[_data.ConsumeIntegralInRange<size_t>(0, kPortCount - 1)];
@@ -254,6 +238,8 @@ class Client {
               nullptr, 0};
     return buffers[_data.ConsumeIntegralInRange<size_t>(0, buffers.size() - 1)];
   }
+
+  void fillBuffer() { static_cast<void>(_omx->fillBuffer(_node, anyBuffer().id)); }
 
   void freeBuffer() {
     const OMX_U32 port = anyPort();

@@ -91,36 +91,33 @@ int slot(Function Class::*operation) {
   return isVirtual ? static_cast<int>(offset / static_cast<ptrdiff_t>(sizeof(void*))) : -1;
 }
 
+// The slots of these, one after the other, begin with `first`.
+template <typename... Operations>
+void expectSlots(int first, Operations... operations) {
+  const int slots[] = {slot(operations)...};
+  for (const int found : slots) EXPECT_EQ(found, first++);
+}
+
 TEST(VirtualSlots, AreWhereBinariesCallThem) {
   using Base = OmxInterface;
+  using Decoder = OmxInterfaceDecoder;
   using Wrapper = CBoardPlatformWrapper;
   // 0 and 1 are the destructor's two forms.
-  const std::pair<int, int> slots[] = {{slot(&OmxCodecObserverDelegate::setObserver), 2},
-                                       {slot(&Base::setObserver), 2},
-                                       {slot(&Base::setMPmemInfo), 3},
-                                       {slot(&Base::onOmxObserverEvent), 4},
-                                       {slot(&Base::onOmxObserverFillBufferDone), 5},
-                                       {slot(&Base::onOmxObserverEmptyBufferDone), 6},
-                                       {slot(&OmxCodecObserverDelegate::onOmxObserverEmptyBufferDone), 6},
-                                       {slot(&Base::onEvent), 7},
-                                       {slot(&Base::init), 8},
-                                       {slot(&Base::deInit), 9},
-                                       {slot(&Base::callOutputCallbackFunction), 10},
-                                       {slot(&OmxInterfaceDecoder::onOmxObserverEvent), 4},
-                                       {slot(&OmxInterfaceDecoder::onEvent), 7},
-                                       {slot(&OmxInterfaceDecoder::init), 8},
-                                       {slot(&OmxInterfaceDecoder::callOutputCallbackFunction), 10},
-                                       {slot(&Base::setupIOMXConnections), -1},
-                                       {slot(&OmxInterfaceEncoder::setConfig), -1},
-                                       {slot(&OmxInterfaceDecoder::getBufferNum), -1},
-                                       {slot(&Wrapper::configureEncoder), 0},
-                                       {slot(&Wrapper::setConfig), 1},
-                                       {slot(&Wrapper::setPictureOrder), 2},
-                                       {slot(&Wrapper::setInputPackingFormat), 3},
-                                       {slot(&Wrapper::setOutputColorFormat), 4},
-                                       {slot(&CQcomBoardPlatformWrapper::setInputPackingFormat), 3},
-                                       {slot(&CTIBoardPlatformWrapper::setOutputColorFormat), 4}};
-  for (const auto& [found, expected] : slots) EXPECT_EQ(found, expected) << &found - &slots[0].first;
+  expectSlots(2, &Base::setObserver, &Base::setMPmemInfo, &Base::onOmxObserverEvent,
+              &Base::onOmxObserverFillBufferDone, &Base::onOmxObserverEmptyBufferDone, &Base::onEvent,
+              &Base::init, &Base::deInit, &Base::callOutputCallbackFunction);
+  expectSlots(2, &OmxCodecObserverDelegate::setObserver);
+  expectSlots(6, &OmxCodecObserverDelegate::onOmxObserverEmptyBufferDone);
+  expectSlots(4, &Decoder::onOmxObserverEvent);
+  expectSlots(7, &Decoder::onEvent, &Decoder::init);
+  expectSlots(10, &Decoder::callOutputCallbackFunction);
+  expectSlots(-1, &Base::setupIOMXConnections);
+  expectSlots(-1, &OmxInterfaceEncoder::setConfig);
+  expectSlots(-1, &Decoder::getBufferNum);
+  expectSlots(0, &Wrapper::configureEncoder, &Wrapper::setConfig, &Wrapper::setPictureOrder,
+              &Wrapper::setInputPackingFormat, &Wrapper::setOutputColorFormat);
+  expectSlots(3, &CQcomBoardPlatformWrapper::setInputPackingFormat);
+  expectSlots(4, &CTIBoardPlatformWrapper::setOutputColorFormat);
 }
 
 // Records: places that C and C++ and their readers go by.

@@ -1,16 +1,127 @@
-// Each function of the C interface: its guard, and that it reaches the operation it names.
-#include <gtest/gtest.h>
-
+// The C interface. Creation: what is set up, what is reported, and what stays of a failure. Each function:
+// its guard, and that it reaches the operation it names.
 #include <atomic>
+#include <regex>
 
-#include "core/omx_interface.h"
 #include "omxbridge/omxbridge.h"
-#include "tests/encoder/encoder_rig.h"
-#include "tests/support/eventually.h"
+#include "tests/core/session_fixture.h"
 
 namespace {
 
 using namespace omxtest;
+
+TEST(BuildTime, IsADateAndATime) {
+  const std::regex format("[A-Z][a-z]{2} [ 1-3][0-9] [0-9]{4}, [0-9]{2}:[0-9]{2}:[0-9]{2}");
+  EXPECT_TRUE(std::regex_match(g_strPrgCreatTime, format)) << g_strPrgCreatTime;
+}
+
+struct Generation {
+  const char* device;
+  OMX_U32 width;  // of a decoder's input
+  OMX_U32 height;
+  bool native;  // delivers pictures as the component made them
+};
+
+void PrintTo(const Generation& generation, std::ostream* stream) {
+  *stream << generation.device;
+}
+
+class GenerationTest : public ::testing::TestWithParam<Generation> {};
+
+TEST_P(GenerationTest, HasDecodersOfItsOwn) {
+  const Generation& generation = GetParam();
+  ScriptedMediaServer server(generation.device);
+  int result = -1;
+  void* const decoder = decoder_create(&result, "a name that does not matter");
+  EXPECT_EQ(result, 0);
+  ASSERT_NE(decoder, nullptr);
+  const Call call = server.omx().calls(Method::SetParameter).back();  // the last that creation writes
+  EXPECT_EQ(call.index, OMX_IndexParamPortDefinition);
+  const auto definition = call.as<OMX_PARAM_PORTDEFINITIONTYPE>();
+  EXPECT_EQ(definition->nPortIndex, 0U);
+  EXPECT_EQ(definition->format.video.nFrameWidth, generation.width);
+  EXPECT_EQ(definition->format.video.nFrameHeight, generation.height);
+  EXPECT_EQ(definition->format.video.xFramerate, 24U << 16);
+  auto& session = *static_cast<OmxInterface*>(decoder);
+  EXPECT_STREQ(session._componentName, "a name that does not matter");
+  Application application;
+  if (generation.native) {
+    application.attach(session);
+    EXPECT_EQ(omx_interface_init(decoder), 0);
+    char unit[] = "abc";
+    EXPECT_EQ(omx_interface_send_input_data(decoder, unit, 3, 0), 0);
+    application.waitForOutputs(1);
+    EXPECT_EQ(application.outputs()[0].bytes, "abc");
+    EXPECT_EQ(application.outputs()[0].info.dataType, DECODED_DATA_NATIVE);
+    EXPECT_EQ(application.outputs()[0].info.width, generation.width);
+  }
+  EXPECT_EQ(omx_interface_destroy(decoder), 0);
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Devices, GenerationTest,
+    ::testing::Values(Generation{"msm7x30", 640, 480, true}, Generation{"msm8x55", 640, 480, true},
+                      Generation{"msm8x60", 1920, 1088, false}, Generation{"msm8960", 1920, 1088, true},
+                      Generation{"msm-unknown", 1920, 1088, true}, Generation{"omap4", 1920, 1088, false}));
+
+// What is missing or refused.
+enum class Missing { Nothing, Server, Omx, Settings };
+
+struct Failure {
+  const char* device;
+  bool encoder;
+  Missing missing;
+  int code;
+  std::string line;  // in front of the last ones; empty: none
+};
+
+class FailureTest : public ::testing::TestWithParam<Failure> {};
+
+TEST_P(FailureTest, IsReportedAndLeavesNothing) {
+  const Failure& failure = GetParam();
+  omxhost::LogCapture log;
+  ScriptedMediaServer server(failure.device);
+  if (failure.missing == Missing::Server) server.unregister();
+  if (failure.missing == Missing::Omx) server.serveWithoutOmx();
+  int result = -77;
+  webrtc::VideoCodec codec = settings();
+  webrtc::VideoCodec* const given = failure.missing != Missing::Settings ? &codec : nullptr;
+  EXPECT_EQ(failure.encoder ? encoder_create(&result, given) : decoder_create(&result, nullptr), nullptr);
+  EXPECT_EQ(result, failure.code);
+  LogLines lines;
+  if (failure.encoder) {
+    lines.push_back(std::string("4/zol-video enter hardCodec encoder_create: build time:") +
+                    g_strPrgCreatTime + " ");
+  }
+  if (!failure.line.empty()) lines.push_back("E " + failure.line);
+  lines.push_back(std::string("E OMXINTERFACE - ERROR creating ") +
+                  (failure.encoder ? "encoder: " : "decoder: ") + std::to_string(failure.code) + " (" +
+                  resultDescription(failure.code) + ")");
+  EXPECT_EQ(logLines(log), lines);
+  EXPECT_EQ(server.leaks(), "");
+}
+
+const std::string kNoServer = "OMXINTERFACE: CANNOT ACQUIRE MEDIA PLAYER SERVICE";
+const std::string kNoOmx = "OMXINTERFACE: MEDIA PLAYER SERVICE CANNOT GET IOMX INTERFACE";
+
+INSTANTIATE_TEST_SUITE_P(Reasons, FailureTest,
+                         ::testing::Values(Failure{"msm8960", false, Missing::Server, 3, kNoServer},
+                                           Failure{"msm8960", false, Missing::Omx, 3, kNoOmx},
+                                           Failure{"exynos4", false, Missing::Nothing, 36, ""},
+                                           Failure{"msm8960", true, Missing::Server, 3, kNoServer},
+                                           Failure{"msm8960", true, Missing::Settings, 28, ""}));
+
+TEST(Create, WorksWithoutAPlaceForTheResult) {
+  ScriptedMediaServer server("msm8960");
+  webrtc::VideoCodec codec = settings();
+  for (void* session : {encoder_create(nullptr, &codec), decoder_create(nullptr, nullptr)}) {
+    EXPECT_NE(session, nullptr);
+    omx_interface_destroy(session);
+  }
+  EXPECT_EQ(encoder_create(nullptr, nullptr), nullptr);
+  EXPECT_EQ(omx_component_is_available("OMX.qcom.video.encoder.avc"), 1);
+  EXPECT_EQ(omx_component_is_available("OMX.qcom.video.encoder"), 0);
+}
 
 TEST(Functions, RefuseANullHandle) {
   omxhost::LogCapture log;
@@ -41,13 +152,7 @@ TEST(Functions, ReachTheirOperations) {
   ScriptedMediaServer server("msm8960");
   void* const handle = decoder_create(nullptr, nullptr);
   ASSERT_NE(handle, nullptr);
-  const auto lastWritten = [&] { return server.omx().calls(Method::SetParameter).back(); };
   EXPECT_EQ(omx_interface_get_buffer_number(handle), 4);
-  EXPECT_EQ(omx_decoder_set_input_compression_format(handle, 1), 0);
-  EXPECT_EQ(lastWritten().as<OMX_PARAM_PORTDEFINITIONTYPE>()->format.video.eCompressionFormat,
-            OMX_VIDEO_CodingMPEG4);
-  EXPECT_EQ(omx_decoder_set_input_packing_format(handle, 2), 0);
-  EXPECT_EQ(words(lastWritten().record), (Words{24, kVersion, 0, 0, 0, 1}));
   static std::atomic<void*> told{nullptr};
   EXPECT_EQ(omx_interface_register_input_callback(
                 handle,

@@ -2,7 +2,6 @@
 // for semaphores check that a semaphore exists when it is used, which neither the library nor a sanitizer
 // notices, and pass the call on.
 #include <dlfcn.h>
-#include <gtest/gtest.h>
 #include <semaphore.h>
 
 #include <atomic>
@@ -10,9 +9,8 @@
 #include <set>
 #include <thread>
 
-#include "core/omx_interface.h"
 #include "omxbridge/omxbridge.h"
-#include "tests/encoder/encoder_rig.h"
+#include "tests/core/session_fixture.h"
 
 namespace {
 
@@ -77,12 +75,10 @@ TEST(InputSemaphore, MayBeUsedInAnyOrder) {
 
 TEST(InputSemaphore, MayBePostedWhileItComesAndGoes) {
   std::atomic<bool> done{false};
-  std::thread posters[2];
-  for (std::thread& poster : posters) {
-    poster = std::thread([&] {
-      while (!done) semaphoreEmptyBufferPost(nullptr, nullptr);
-    });
-  }
+  const auto post = [&] {
+    while (!done) semaphoreEmptyBufferPost(nullptr, nullptr);
+  };
+  std::thread posters[] = {std::thread(post), std::thread(post)};
   for (int i = 0; i < 2000; ++i) {
     omx_setup_input_semaphore(nullptr);
     if (i % 3 == 0) omx_setup_input_semaphore(nullptr);
@@ -93,32 +89,25 @@ TEST(InputSemaphore, MayBePostedWhileItComesAndGoes) {
   EXPECT_EQ(misuses, 0);
 }
 
-TEST(InputSemaphore, TakesThePlaceOfTheInputCallback) {
-  EncoderRig rig("msm8960");
-  ASSERT_EQ(rig.create(), 0);
-  OmxInterface* handle = rig.session.get();
-  int context = 0;
-  omx_interface_register_input_callback(
-      handle,
-      [](void* /*session*/, void* calls) {
-        ++*static_cast<int*>(calls);
-        return 0;
-      },
-      &context);
+using InputSemaphoreTest = SessionTest;
+
+TEST_F(InputSemaphoreTest, TakesThePlaceOfTheInputCallback) {
+  ASSERT_EQ(createEncoder(), 0);
+  OmxInterface* handle = _session.get();
   EXPECT_EQ(omx_setup_input_semaphore(handle), 0);
-  EXPECT_EQ(rig.session->_inputCallback, semaphoreEmptyBufferPost);
-  EXPECT_EQ(rig.session->_inputCallbackContext, nullptr);
+  EXPECT_EQ(_session->_inputCallback, semaphoreEmptyBufferPost);
+  EXPECT_EQ(_session->_inputCallbackContext, nullptr);
 
   // Buffers come back before and after the teardown.
   ASSERT_EQ(omx_interface_init(handle), 0);
   const unsigned char frame[38016] = {};
   for (const size_t sent : {1U, 2U}) {
     EXPECT_EQ(omx_send_data_frame_to_encoder(handle, frame, 176, 144, 0), 0);
-    EXPECT_TRUE(rig.server.messages().waitForDelivered(emptyBufferDone(), sent));
+    EXPECT_TRUE(messages().waitForDelivered(emptyBufferDone(), sent));
     EXPECT_EQ(omx_teardown_input_semaphore(), 0);
   }
-  EXPECT_EQ(context, 0);
-  rig.session.reset();
+  EXPECT_EQ(_application.inputCallbacks().size(), 0u);
+  destroy();
   EXPECT_EQ(misuses, 0);
 }
 

@@ -10,13 +10,15 @@
 #include <vector>
 
 #include "core/omx_interface.h"
+#include "omxbridge/decoded_picture.h"
 #include "tests/core/bounded.h"
 
 namespace omxtest {
 
 // One call of the output callback.
 struct Output {
-  void* first = nullptr;  // the session, or a decoder's description of the picture
+  void* first = nullptr;   // the session, or a decoder's description of the picture
+  DECODEDDATAINFO info{};  // ... as it was during the call
   void* data = nullptr;
   std::string bytes;  // what lay there during the call; nothing for a null address
   unsigned int length = 0;
@@ -30,6 +32,7 @@ class Application {
 
   // Registers both callbacks with this object as their context.
   void attach(OmxInterface& session) {
+    _session = &session;
     session.registerInputCallback(&Application::inputCallback, this);
     session.registerOutputCallback(&Application::outputCallback, this);
   }
@@ -61,15 +64,21 @@ class Application {
     const std::lock_guard<std::mutex> lock(_mutex);
     return _inputs;
   }
-  void waitForOutputs(size_t count) const {
-    requireEventually([&] { return outputs().size() >= count; }, "an output");
+  // Until the callbacks have been called that often.
+  [[nodiscard]] bool waitForCalls(size_t inputs, size_t outputs,
+                                  std::chrono::milliseconds limit = kWaitLimit) const {
+    std::unique_lock<std::mutex> lock(_mutex);
+    return _changed.wait_for(lock, limit,
+                             [&] { return _inputs.size() >= inputs && _outputs.size() >= outputs; });
   }
+  void waitForOutputs(size_t count) const { require(waitForCalls(0, count), "an output"); }
 
  private:
   static int inputCallback(void* session, void* context) {
     auto& self = *static_cast<Application*>(context);
     std::unique_lock<std::mutex> lock(self._mutex);
     self._inputs.push_back(session);
+    self._changed.notify_all();
     const auto handler = self._inputHandler;
     lock.unlock();
     if (handler) handler();
@@ -78,17 +87,21 @@ class Application {
   static int outputCallback(void* first, void* data, unsigned int length, void* bufferId, void* context,
                             unsigned int timestamp) {
     auto& self = *static_cast<Application*>(context);
-    Output output{first, data, {}, length, bufferId, timestamp};
+    Output output{first, {}, data, {}, length, bufferId, timestamp};
+    if (first != self._session) output.info = *static_cast<const DECODEDDATAINFO*>(first);
     if (data != nullptr && self._readsData) output.bytes.assign(static_cast<const char*>(data), length);
     std::unique_lock<std::mutex> lock(self._mutex);
     self._outputs.push_back(output);
+    self._changed.notify_all();
     const OutputHandler handler = self._outputHandler;
     lock.unlock();
     return handler ? handler(output) : 0;
   }
 
+  std::atomic<void*> _session{nullptr};
   std::atomic<bool> _readsData{true};
   mutable std::mutex _mutex;  // guards everything below; not held in handlers
+  mutable std::condition_variable _changed;
   OutputHandler _outputHandler;
   std::function<void()> _inputHandler;
   std::vector<Output> _outputs;

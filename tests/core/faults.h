@@ -19,7 +19,6 @@ class Fault {
   Fault(const Fault&) = delete;
   Fault& operator=(const Fault&) = delete;
 
-  bool happened() const { return left() == 0; }
   // Threads that can be made up to the one that fails; of an allocation, its bytes until it has failed.
   size_t left() const;
 

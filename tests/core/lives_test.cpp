@@ -1,8 +1,6 @@
 // The whole life of a session call by call: encoders and decoders of each vendor, and decoders whose
 // component's output is native, tiled, or padded.
-#include "decoder/omx_interface_decoder.h"
 #include "tests/core/session_fixture.h"
-#include "tests/encoder/encoder_rig.h"
 
 namespace omxtest {
 namespace {
@@ -13,7 +11,7 @@ struct Life {
   const char* inputs;  // how they are made
   const char* outputs;
   size_t outputCount;
-  Trace settings;  // made at creation
+  Trace settings;  // calls at creation; a record alone is read and written
   Trace delivery;  // calls for each picture
   int dataType;    // of a decoder; -1: an encoder
 
@@ -31,28 +29,15 @@ class LifeTest : public SessionTest, public ::testing::WithParamInterface<Life> 
   LifeTest() : SessionTest(GetParam().device) {}
 
   void create() {
-    webrtc::VideoCodec codec = settings();
-    OmxInterfaceEncoder* encoder = nullptr;
-    OmxInterfaceDecoder* decoder = nullptr;
     if (GetParam().encoding()) {
-      ASSERT_EQ(OmxInterfaceEncoder::Create(&encoder, &codec), OMXI_OK);
-      _session.reset(encoder);
-    } else {
-      _decoding = true;
-      // A tiled picture fits.
-      script().editPort(1, [](mediaserver::PortDefinition& port) { port.nBufferSize = 65536; });
-      ASSERT_EQ(OmxInterfaceDecoder::Create(&decoder, "nobody looks at it"), OMXI_OK);
-      _session.reset(decoder);
-      EXPECT_EQ(decoder->setInputCompressionFormat(0), 0);
-      EXPECT_EQ(_session->setupPortParameters(0, 176, 144, 24), OMXI_OK);
-      _application.onOutput([](const Output& output) {
-        const auto& info = *static_cast<const DECODEDDATAINFO*>(output.first);
-        EXPECT_EQ(info.dataType, GetParam().dataType);
-        EXPECT_EQ(output.length, info.dataType == DECODED_DATA_RGB565 ? 50688u : 11u);
-        return 1;  // of no effect: a decoder lets nobody keep a buffer
-      });
+      ASSERT_EQ(createEncoder(), OMXI_OK);
+      return;
     }
-    _application.attach(*_session);
+    // A tiled picture fits.
+    _server.decoder().editPort(1, [](mediaserver::PortDefinition& port) { port.nBufferSize = 65536; });
+    ASSERT_EQ(createDecoder(), OMXI_OK);
+    EXPECT_EQ(decoder().setInputCompressionFormat(0), 0);
+    EXPECT_EQ(_session->setupPortParameters(0, 176, 144, 24), OMXI_OK);
   }
 
   static Trace wholeLife() {
@@ -63,7 +48,11 @@ class LifeTest : public SessionTest, public ::testing::WithParamInterface<Life> 
     const auto each = [&calls](size_t count, const std::string& before, const std::string& after = "") {
       for (size_t i = 0; i < count; ++i) calls.push_back(before + std::to_string(i) + after);
     };
-    append(life.settings);
+    for (const std::string& line : life.settings) {
+      const bool exchange = isdigit(line[0]) != 0;
+      if (exchange) calls.push_back("getParameter " + line);
+      calls.push_back(exchange ? "setParameter " + line : line);
+    }
     if (!life.encoding()) {
       append({"getParameter 2000001 port 0 size word 0", "setParameter 2000001 port 0 size word 0",
               "getParameter 2000001 port 0", "setParameter 2000001 port 0"});
@@ -103,6 +92,8 @@ TEST_P(LifeTest, TakesTheseCalls) {
     EXPECT_EQ(output.timestamp, static_cast<unsigned>(100 + i));
     EXPECT_EQ(output.bufferId, outputs[static_cast<size_t>(i)].bufferId);
     EXPECT_EQ(output.bytes == "access unit", GetParam().dataType != DECODED_DATA_RGB565);
+    EXPECT_EQ(output.length, GetParam().dataType == DECODED_DATA_RGB565 ? 50688u : 11u);
+    EXPECT_TRUE(GetParam().encoding() || output.info.dataType == GetParam().dataType);
   }
   endOfStream(200);
   if (!GetParam().encoding()) {
@@ -117,60 +108,32 @@ TEST_P(LifeTest, TakesTheseCalls) {
   EXPECT_EQ(log().size(), GetParam().encoding() ? 1u : 2u);  // with the output thread's end
 }
 
-const Trace kOrder{"setParameter 7f000010 port 0 version 0"};
+const std::string kInput = "2000001 port 0";
+const std::string kOutput = "2000001 port 1";
 const Trace kSize{"getParameter 2000001 port 1"};
 constexpr const char* kBackup = "allocateBufferWithBackup";
 constexpr const char* kQcomDecoder = "OMX.qcom.video.decoder.avc";
+
+const Trace kOrder{"setParameter 7f000010 port 0 version 0"};
+const Trace kPacking{kOrder[0], "setParameter 7f000002 port 0"};
+const Trace kTiOutput{"getParameter 6000001 port 1", "6000001 port 1", kInput, kOutput};
+const Trace kCrop{kSize[0], "getConfig 700000f port 1"};
+// Geometry, H.264, the port's bit rate, rate control.
+const Trace kQcomEncoder{kInput, kOutput, "600000d port 1", kOutput, "6000004 port 1"};
+// Formats, ports, H.264, profile and level, rate control.
+const Trace kTiEncoder{
+    "6000001 port 0", "6000001 port 1", kInput,           kOutput,
+    "600000d port 1", "6000010 port 1", "6000004 port 1", "storeMetaDataInBuffers 0 port 0"};
 
 INSTANTIATE_TEST_SUITE_P(
     Vendors, LifeTest,
     ::testing::Values(
         Life{"msm8960", kQcomDecoder, "useBuffer", kBackup, 8, kOrder, kSize, DECODED_DATA_NATIVE},
-        Life{"msm8x60",
-             kQcomDecoder,
-             "useBuffer",
-             kBackup,
-             8,
-             {kOrder[0], "setParameter 7f000002 port 0"},
-             kSize,
-             DECODED_DATA_RGB565},
-        Life{"omap4",
-             "OMX.TI.DUCATI1.VIDEO.DECODER==",
-             kBackup,
-             kBackup,
-             8,
-             {"getParameter 6000001 port 1", "getParameter 6000001 port 1", "setParameter 6000001 port 1",
-              "getParameter 2000001 port 0", "setParameter 2000001 port 0", "getParameter 2000001 port 1",
-              "setParameter 2000001 port 1"},
-             {kSize[0], "getConfig 700000f port 1"},
+        Life{"msm8x60", kQcomDecoder, "useBuffer", kBackup, 8, kPacking, kSize, DECODED_DATA_RGB565},
+        Life{"omap4", "OMX.TI.DUCATI1.VIDEO.DECODER==", kBackup, kBackup, 8, kTiOutput, kCrop,
              DECODED_DATA_CROPPED},
-        Life{"msm8960",
-             "OMX.qcom.video.encoder.avc",
-             "useBuffer",
-             "useBuffer",
-             6,
-             {"getParameter 2000001 port 0", "setParameter 2000001 port 0",   // geometry of the input
-              "getParameter 2000001 port 1", "setParameter 2000001 port 1",   // geometry of the output
-              "getParameter 600000d port 1", "setParameter 600000d port 1",   // H.264
-              "getParameter 2000001 port 1", "setParameter 2000001 port 1",   // bit rate of the port
-              "getParameter 6000004 port 1", "setParameter 6000004 port 1"},  // rate control
-             {},
-             -1},
-        Life{"omap4",
-             "OMX.TI.DUCATI1.VIDEO.H264E",
-             kBackup,
-             kBackup,
-             4,
-             {"getParameter 6000001 port 0", "setParameter 6000001 port 0",  // format of the input
-              "getParameter 6000001 port 1", "setParameter 6000001 port 1",  // format of the output
-              "getParameter 2000001 port 0", "setParameter 2000001 port 0",  // the input
-              "getParameter 2000001 port 1", "setParameter 2000001 port 1",  // the output
-              "getParameter 600000d port 1", "setParameter 600000d port 1",  // H.264
-              "getParameter 6000010 port 1", "setParameter 6000010 port 1",  // profile and level
-              "getParameter 6000004 port 1", "setParameter 6000004 port 1",  // rate control
-              "storeMetaDataInBuffers 0 port 0"},
-             {},
-             -1}));
+        Life{"msm8960", "OMX.qcom.video.encoder.avc", "useBuffer", "useBuffer", 6, kQcomEncoder, {}, -1},
+        Life{"omap4", "OMX.TI.DUCATI1.VIDEO.H264E", kBackup, kBackup, 4, kTiEncoder, {}, -1}));
 
 }  // namespace
 }  // namespace omxtest

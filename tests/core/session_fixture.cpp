@@ -7,53 +7,60 @@
 
 #include <utils/String8.h>
 
-#include "tests/core/records.h"
-
 namespace omxtest {
 
 namespace {
 
 using android::String8;
 
+bool makesABuffer(const Call& call) {
+  return call.method >= Method::UseBuffer && call.method <= Method::AllocateBufferWithBackup;
+}
+
 std::string detailsOf(const Call& call, const std::string& buffer) {
   static constexpr const char* kCommands[] = {"state", "flush", "disable", "enable", "mark"};
-  switch (call.method) {
-    case Method::AllocateNode:
-      return " " + call.text;
-    case Method::SendCommand:
-      return String8::format(" %s %d", kCommands[call.command], call.param).string();
-    case Method::GetParameter:
-    case Method::SetParameter:
-    case Method::GetConfig:
-    case Method::SetConfig: {
-      // The record's port, and what is unusual about its size and version.
-      const Words record = words(call.record);
-      std::string text =
-          String8::format(" %x port %u", static_cast<unsigned>(call.index), record.at(2)).string();
-      if (record[0] != call.size) text += " size word " + std::to_string(record[0]);
-      if (record[1] != kVersion) text += " version " + std::to_string(record[1]);
-      return text;
-    }
-    case Method::StoreMetaDataInBuffers:
-      return " " + std::to_string(call.enable) + " port " + std::to_string(call.port);
-    case Method::UseBuffer:
-    case Method::AllocateBuffer:
-    case Method::AllocateBufferWithBackup:
-      return " " + buffer + " of " + std::to_string(call.size);
-    case Method::FreeBuffer:
-      return " " + std::to_string(call.port) + " " + buffer;
-    case Method::FillBuffer:
-      return " " + buffer;
-    case Method::EmptyBuffer:
-      return String8::format(" %s %u+%u flags 0x%x time %lld", buffer.c_str(), call.offset, call.length,
-                             call.flags, static_cast<long long>(call.timestamp))
-          .string();
-    default:
-      return "";
+  const Method method = call.method;
+  if (method == Method::AllocateNode) return " " + call.text;
+  if (method == Method::SendCommand) {
+    return String8::format(" %s %d", kCommands[call.command], call.param).string();
   }
+  if (method >= Method::GetParameter && method <= Method::SetConfig) {
+    // The record's port, and what is unusual about its size and version.
+    const Words record = words(call.record);
+    std::string text =
+        String8::format(" %x port %u", static_cast<unsigned>(call.index), record.at(2)).string();
+    if (record[0] != call.size) text += " size word " + std::to_string(record[0]);
+    if (record[1] != kVersion) text += " version " + std::to_string(record[1]);
+    return text;
+  }
+  if (method == Method::StoreMetaDataInBuffers) {
+    return " " + std::to_string(call.enable) + " port " + std::to_string(call.port);
+  }
+  if (makesABuffer(call)) return " " + buffer + " of " + std::to_string(call.size);
+  if (method == Method::FreeBuffer) return " " + std::to_string(call.port) + " " + buffer;
+  if (method == Method::FillBuffer) return " " + buffer;
+  if (method != Method::EmptyBuffer) return "";
+  return String8::format(" %s %u+%u flags 0x%x time %lld", buffer.c_str(), call.offset, call.length,
+                         call.flags, static_cast<long long>(call.timestamp))
+      .string();
 }
 
 }  // namespace
+
+webrtc::VideoCodec settings() {
+  webrtc::VideoCodec codec = {};
+  codec.codecType = webrtc::kVideoCodecH264;
+  codec.width = 176;
+  codec.height = 144;
+  codec.startBitrate = 500;
+  codec.maxFramerate = 30;
+  codec.codecSpecific.H264.profile = 77;
+  codec.codecSpecific.H264.keyFrameInterval = 60;
+  codec.codecSpecific.H264.referenceFrames = 2;
+  codec.codecSpecific.H264.entropyCoding = 1;
+  codec.codecSpecific.H264.transform8x8 = 1;
+  return codec;
+}
 
 Trace SessionTest::trace(size_t from) {
   Trace lines;
@@ -61,8 +68,7 @@ Trace SessionTest::trace(size_t from) {
   size_t made[2] = {0, 0};
   for (const Call& call : omx().calls()) {
     if (call.method == Method::AllocateNode) made[0] = made[1] = 0;
-    if (call.method == Method::UseBuffer || call.method == Method::AllocateBuffer ||
-        call.method == Method::AllocateBufferWithBackup) {
+    if (makesABuffer(call)) {
       names[call.buffer] = (call.port == 0 ? "in" : "out") + std::to_string(made[call.port]++);
     }
     lines.push_back(name(call.method) + detailsOf(call, names[call.buffer]) +
@@ -102,6 +108,35 @@ void SessionTest::start() {
   ASSERT_EQ(init(), OMXI_OK);
 }
 
+int SessionTest::createEncoder(webrtc::VideoCodec codec) {
+  if (_session != nullptr) destroy();
+  omx().clearCalls();
+  _log.clear();
+  OmxInterfaceEncoder* created = nullptr;
+  const int result = OmxInterfaceEncoder::Create(&created, &codec);
+  _session.reset(created);
+  if (created != nullptr) _application.attach(*created);
+  return result;
+}
+
+int SessionTest::createDecoder() {
+  _decoding = true;
+  OmxInterfaceDecoder* created = nullptr;
+  const int result = OmxInterfaceDecoder::Create(&created, "nobody looks at it");
+  _session.reset(created);
+  if (created != nullptr) _application.attach(*created);
+  _application.onOutput([](const Output&) { return 1; });  // of no effect: nobody keeps a decoder's buffer
+  return result;
+}
+
+std::vector<Call> SessionTest::settingCalls() {
+  std::vector<Call> calls = omx().calls();
+  std::erase_if(calls, [](const Call& call) {
+    return call.method < Method::GetParameter || call.method > Method::StoreMetaDataInBuffers;
+  });
+  return calls;
+}
+
 void SessionTest::endOfStream(int timestamp) {
   ASSERT_EQ(beginEndOfInput(timestamp).result(), 0);
   requireEventually([this]() -> bool { return _session->_endOfOutputReached; }, "the end of output");
@@ -117,12 +152,8 @@ Later<bool> SessionTest::beginDestroy() {
 Later<bool> SessionTest::beginDestroyOfBusySession() {
   SessionState& state = *_session->_state;
   Later<bool> destroyed = beginDestroy();
-  requireEventually(
-      [&] {
-        const SessionState::Lock held(state.lock);
-        return state.ending;
-      },
-      "the beginning of the destruction");
+  requireUnderLock(
+      state, [](SessionState& busy) { return busy.ending; }, "the destruction");
   EXPECT_FALSE(destroyed.isDone());
   return destroyed;
 }

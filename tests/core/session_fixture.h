@@ -4,14 +4,18 @@
 
 #include <gtest/gtest.h>
 
+#include <array>
+#include <cstring>
 #include <deque>
+#include <functional>
 #include <memory>
 #include <vector>
 
 #include <omxhost/log.h>
 
-#include "core/omx_interface.h"
 #include "core/session_state.h"
+#include "decoder/omx_interface_decoder.h"
+#include "encoder/omx_interface_encoder.h"
 #include "tests/core/application.h"
 #include "tests/core/bounded.h"
 #include "tests/core/log_lines.h"
@@ -22,6 +26,45 @@ namespace omxtest {
 using Trace = std::vector<std::string>;
 
 inline constexpr const char* kDecoderOver = "W OMXINTERFACE - ===DataOutputThread over! dec thread!\n";
+
+// --- Records that a session sends to its component ---
+
+using Words = std::vector<OMX_U32>;
+
+constexpr OMX_U32 kVersion = 0x00000101;  // 1.1.0.0
+
+inline Words words(const std::vector<uint8_t>& bytes) {
+  Words result(bytes.size() / sizeof(OMX_U32));
+  if (!result.empty()) std::memcpy(result.data(), bytes.data(), result.size() * sizeof(OMX_U32));
+  return result;
+}
+
+// What has to be written after `read`: its record with some fields changed, everything else, padding too,
+// as the component had it.
+template <typename Record>
+std::vector<uint8_t> edited(const Call& read, const std::function<void(Record&)>& edit) {
+  std::vector<uint8_t> bytes = read.record;
+  bytes.resize(sizeof(Record));
+  Record record;
+  std::memcpy(&record, bytes.data(), sizeof(record));
+  edit(record);
+  std::memcpy(bytes.data(), &record, sizeof(record));
+  return bytes;
+}
+
+// A record of `size` bytes for `port` with another value in every word, to tell what a client leaves alone.
+template <size_t size>
+std::array<OMX_U32, size / sizeof(OMX_U32)> patternRecord(OMX_U32 port) {
+  std::array<OMX_U32, size / sizeof(OMX_U32)> result;
+  for (size_t i = 0; i < result.size(); ++i) result[i] = 0x0A0B0C00 + static_cast<OMX_U32>(i);
+  result[2] = port;
+  return result;
+}
+
+// --- Sessions ---
+
+// Settings with a value of its own in every field that is read.
+webrtc::VideoCodec settings();
 
 class SessionTest : public ::testing::Test {
  protected:
@@ -37,6 +80,12 @@ class SessionTest : public ::testing::Test {
   void connect();
   // ... brings it to Executing.
   void start();
+  // A session of a vendor's, in place of the former one; Create()'s result. An encoder's calls and log lines
+  // are the first ones.
+  int createEncoder(webrtc::VideoCodec codec = settings());
+  int createDecoder();
+  OmxInterfaceEncoder& encoder() { return static_cast<OmxInterfaceEncoder&>(*_session); }
+  OmxInterfaceDecoder& decoder() { return static_cast<OmxInterfaceDecoder&>(*_session); }
   Later<int> beginInit() {
     return {"init()", [session = _session.get()] { return session->init(); }};
   }
@@ -87,17 +136,22 @@ class SessionTest : public ::testing::Test {
   size_t busyCount(int port) const;
   // The calls as text, buffers by their place: "fillBuffer out0"; without the first `from` of them.
   Trace trace(size_t from = 0);
+  // Calls that read and write settings, in order.
+  std::vector<Call> settingCalls();
   static int valueOf(sem_t& semaphore);
   LogLines log() const { return logLines(_log); }
   // Wait until the condition holds, which is tested with the session's lock held.
   template <typename Condition>
+  static void requireUnderLock(SessionState& state, Condition condition, const char* what) {
+    const auto holds = [&] {
+      const SessionState::Lock held(state.lock);
+      return condition(state);
+    };
+    requireEventually(holds, what);
+  }
+  template <typename Condition>
   void requireUnderLock(Condition condition, const char* what) {
-    requireEventually(
-        [&, &state = *_session->_state] {
-          const SessionState::Lock held(state.lock);
-          return condition(state);
-        },
-        what);
+    requireUnderLock(*_session->_state, condition, what);
   }
   // ... that many threads sleep in the session's wait for ...
   void waitForSleeper(int SessionState::*waiters, int count = 1) {

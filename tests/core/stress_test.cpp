@@ -9,7 +9,6 @@
 #include <random>
 #include <thread>
 
-#include "decoder/omx_interface_decoder.h"
 #include "tests/core/session_fixture.h"
 
 namespace omxtest {

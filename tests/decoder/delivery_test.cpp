@@ -12,7 +12,6 @@
 #include <utils/String8.h>
 
 #include "tests/core/faults.h"
-#include "tests/core/records.h"
 #include "tests/decoder/decoder_session.h"
 
 namespace omxtest {
@@ -27,15 +26,15 @@ class DeliveryTest : public DecoderSessionTest {
 
   // Has the component produce one buffer and waits until it has it back. How many pictures came of it.
   size_t produce(const std::string& bytes) {
-    const size_t before = pictures().size();
+    const size_t before = _application.outputs().size();
     const size_t fills = omx().count(Method::FillBuffer);
     componentProduces(bytes);
     waitForFills(fills + 1);
-    return pictures().size() - before;
+    return _application.outputs().size() - before;
   }
   void expectDelivered(const std::string& bytes, const std::array<OMX_U32, 7>& fields) {
     ASSERT_EQ(produce(bytes), 1u);
-    const DECODEDDATAINFO info = pictures().back().info;
+    const DECODEDDATAINFO info = _application.outputs().back().info;
     EXPECT_EQ(fields, (std::array<OMX_U32, 7>{info.width, info.height, static_cast<OMX_U32>(info.dataType),
                                               info.cropWidth, info.cropHeight, info.cropLeft, info.cropTop}));
   }
@@ -138,8 +137,8 @@ TEST_F(ConversionTest, ConvertsAPictureWhereverItIs) {
   // By its address, and by its id alone when the component has a heap of its own.
   for (const size_t index : {0u, 1u}) {
     expectDelivered(source, {176, 144, DECODED_DATA_RGB565, 0, 0, 0, 0});
-    EXPECT_EQ(pictures()[index].output.bufferId, bufferId(1, index));
-    EXPECT_TRUE(pictures()[index].output.bytes == expected);
+    EXPECT_EQ(_application.outputs()[index].bufferId, bufferId(1, index));
+    EXPECT_TRUE(_application.outputs()[index].bytes == expected);
     _session->setMPmemInfo(new android::MemoryHeapBase(4096));
   }
 }

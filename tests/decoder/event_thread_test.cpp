@@ -53,7 +53,7 @@ TEST_F(EventThreadTest, ARefusedDisableLeavesTheOutputDrainingUntilTheNextAnnoun
   handleEvent(OMX_EventPortSettingsChanged, 1, 0);
   waitForFills(2 * kOutputBuffers);
   feedThrough("delivered");
-  EXPECT_EQ(pictures().back().info.width, 320u);
+  EXPECT_EQ(_application.outputs().back().info.width, 320u);
 }
 
 TEST_F(EventThreadTest, PortCompletionsInAWrongStateAreFailures) {
@@ -83,7 +83,6 @@ TEST_F(EventThreadTest, AnErrorEventEndsTheSession) {
   startDecoder();
   handleEvent(OMX_EventError, 0x80001009, 3);
   EXPECT_TRUE(_session->_endOfOutputReached);
-  EXPECT_EQ(_application.inputCallbacks().size(), 1u);
   waitForEndOfEventThread();
   EXPECT_EQ(deInit(), OMXI_ERR_EVENT_ERROR);  // and waits for no end of stream
 }
@@ -119,7 +118,7 @@ TEST_F(EventThreadTest, AThreadFindsItsQueueGoneWhereverItIs) {
   Later<bool> destroyed = beginDestroyOfBusySession();
   gate.open();
   destroyed.result();
-  EXPECT_EQ(sortedLog(), sorted({queueGone(290), kDecoderOver}));
+  EXPECT_EQ(sortedLog(), (LogLines{queueGone(290), kDecoderOver}));
 }
 
 TEST_F(EventThreadTest, ThreadsThatStartAfterTheEndHasBegunEndToo) {
@@ -134,12 +133,10 @@ TEST_F(EventThreadTest, ThreadsThatStartAfterTheEndHasBegunEndToo) {
   Later<int> busy("setPictureOrder()", [=] { return session->setPictureOrder(0); });
   gate.waitForArrival();
   Later<bool> destroyed = beginDestroyOfBusySession();
-  requireEventually(
-      [=] {
-        const SessionState::Lock held(session->_state->lock);
-        return !session->_state->outputThread.running && !session->_state->eventThread.running;
-      },
-      "the threads' end");
+  const auto ended = [](SessionState& state) {
+    return !state.outputThread.running && !state.eventThread.running;
+  };
+  requireUnderLock(*session->_state, ended, "the threads' end");
   Later<int> second("init()", [=] { return session->init(); });
   EXPECT_NE(second.result(), OMXI_OK);
   gate.open();

@@ -1,26 +1,29 @@
 // Encoders without settings, the records that one writes by itself, and the way of one raw frame into the
 // component: its layout, what is refused, and what happens after the end.
-#include <future>
-
-#include "core/session_state.h"
 #include "tests/core/faults.h"
-#include "tests/encoder/encoder_rig.h"
+#include "tests/core/session_fixture.h"
 
 namespace omxtest {
 namespace {
 
-// A session that runs on `device`, with input buffers of `capacity` bytes, and a frame of its size.
-struct RunningRig : EncoderRig {
-  RunningRig(const char* device, OMX_U32 capacity) : EncoderRig(device), frame(capacity + 1) {
-    for (size_t i = 0; i < frame.size(); ++i) frame[i] = static_cast<uint8_t>(1 + i % 251);  // never 0
-    server.encoder().editPort(0, [=](auto& definition) { definition.nBufferSize = capacity; });
-    EXPECT_EQ(create(), 0);
-    EXPECT_EQ(session->init(), 0);
-    log.clear();
-  }
-  int send() { return session->sendDataFrame(frame.data(), 176, 144, 0); }
+class EncoderTest : public SessionTest {
+ protected:
+  explicit EncoderTest(const char* device = "msm8960") : SessionTest(device) {}
 
-  std::vector<uint8_t> frame;
+  // A session that runs, with input buffers of `capacity` bytes, and a frame of that size.
+  void startEncoder(OMX_U32 capacity) {
+    _frame.resize(capacity + 1);
+    for (size_t i = 0; i < _frame.size(); ++i) _frame[i] = static_cast<uint8_t>(1 + i % 251);  // never 0
+    script().editPort(0, [=](auto& definition) { definition.nBufferSize = capacity; });
+    ASSERT_EQ(createEncoder(), 0);
+    ASSERT_EQ(init(), 0);
+    _log.clear();
+  }
+  int send(int width = 176, int height = 144, int timestamp = 0) {
+    return encoder().sendDataFrame(_frame.data(), width, height, timestamp);
+  }
+
+  std::vector<uint8_t> _frame;
 };
 
 struct Layout {
@@ -36,23 +39,26 @@ void PrintTo(const Layout& layout, std::ostream* stream) {
   *stream << layout.device << " " << layout.width << "x" << layout.height;
 }
 
-class FrameLayouts : public ::testing::TestWithParam<Layout> {};
+class FrameLayouts : public EncoderTest, public ::testing::WithParamInterface<Layout> {
+ protected:
+  FrameLayouts() : EncoderTest(GetParam().device) {}
+};
 
 TEST_P(FrameLayouts, PlaceTheChromaWhereTheHardwareLooksForIt) {
   const auto& [device, width, height, luma, chromaOffset, chroma] = GetParam();
   const size_t length = chromaOffset + chroma;
-  RunningRig rig(device, static_cast<OMX_U32>(length + 100));
-  auto* const memory = static_cast<uint8_t*>(rig.session->_portBuffers[kOmxInputPort][0].data);
+  startEncoder(static_cast<OMX_U32>(length + 100));
+  auto* const memory = static_cast<uint8_t*>(_session->_portBuffers[0][0].data);
   memset(memory, 0xEE, length + 100);  // what an earlier frame left
-  ASSERT_EQ(rig.session->sendDataFrame(rig.frame.data(), width, height, -7), 0);
-  const Call sent = rig.server.omx().calls(Method::EmptyBuffer).at(0);
+  ASSERT_EQ(send(width, height, -7), 0);
+  const Call sent = omx().calls(Method::EmptyBuffer).at(0);
   EXPECT_EQ(sent.length, length);
   EXPECT_EQ(sent.timestamp, -7);
   std::vector<uint8_t> expected(length, 0);
-  memcpy(expected.data(), rig.frame.data(), luma);
-  memcpy(expected.data() + chromaOffset, rig.frame.data() + luma, chroma);
-  ASSERT_TRUE(rig.server.encoder().waitForInputs(1));
-  EXPECT_EQ(rig.server.encoder().inputs()[0].bytes, expected);
+  memcpy(expected.data(), _frame.data(), luma);
+  memcpy(expected.data() + chromaOffset, _frame.data() + luma, chroma);
+  ASSERT_TRUE(script().waitForInputs(1));
+  EXPECT_EQ(script().inputs()[0].bytes, expected);
   EXPECT_EQ(memory[length], 0xEE) << "nothing behind the frame is written";
 }
 
@@ -60,10 +66,12 @@ INSTANTIATE_TEST_SUITE_P(Devices, FrameLayouts,
                          ::testing::Values(Layout{"msm8x60", 176, 144, 25344, 26624, 12672},
                                            Layout{"msm8x60", 64, 32, 2048, 2048, 1024},  // already aligned
                                            Layout{"msm8x60", 3, 3, 9, 2048, 4},
+                                           Layout{"msm7x30", 176, 144, 25344, 25344, 12672},
+                                           Layout{"msm8x55", 3, 3, 9, 9, 4}, Layout{"omap4", 3, 3, 9, 9, 4},
                                            Layout{"msm8960", 1, 1, 1, 1, 0}));
 
-TEST(SendDataFrame, RefusesWhatDoesNotFitAndKeepsTheBufferFree) {
-  RunningRig rig("msm8960", 38016);
+TEST_F(EncoderTest, RefusesAFrameThatDoesNotFitAndKeepsTheBufferFree) {
+  startEncoder(38016);
   const struct {
     int width;
     int height;
@@ -76,48 +84,48 @@ TEST(SendDataFrame, RefusesWhatDoesNotFitAndKeepsTheBufferFree) {
       {65536, 65536, "E OMXINTERFACE - Frame of 65536x65536 does not fit "},
   };
   for (const auto& [width, height, line] : refusals) {
-    rig.log.clear();
-    EXPECT_EQ(rig.session->sendDataFrame(rig.frame.data(), width, height, 0), -1) << line;
-    EXPECT_EQ(logLines(rig.log).at(0).substr(0, strlen(line)), line);
-    EXPECT_TRUE(rig.session->portBuffersHaveBeenReturned(kOmxInputPort));
+    _log.clear();
+    EXPECT_EQ(send(width, height), -1) << line;
+    EXPECT_EQ(log().at(0).substr(0, strlen(line)), line);
+    EXPECT_EQ(busyCount(0), 0u);
   }
-  EXPECT_EQ(rig.session->sendDataFrame(nullptr, 176, 144, 0), -1);
-  EXPECT_EQ(rig.server.omx().count(Method::EmptyBuffer), 0U);
+  EXPECT_EQ(encoder().sendDataFrame(nullptr, 176, 144, 0), -1);
+  EXPECT_EQ(omx().count(Method::EmptyBuffer), 0U);
 
-  rig.server.encoder().holdInput();
-  rig.session->setThreadError(OMXI_ERR_EVENT_ERROR);
-  EXPECT_EQ(rig.send(), OMXI_ERR_EVENT_ERROR);  // it is sent all the same
-  EXPECT_EQ(rig.server.omx().count(Method::EmptyBuffer), 1U);
-  rig.session->_threadError = OMXI_OK;
-  for (size_t i = 0; i < 4; ++i) EXPECT_EQ(rig.send(), 0);  // the last is dropped: no buffer is free
-  EXPECT_EQ(rig.server.omx().count(Method::EmptyBuffer), 4U);
-  rig.session->setThreadError(OMXI_ERR_EVENT_ERROR);
-  EXPECT_EQ(rig.send(), OMXI_ERR_EVENT_ERROR);
+  script().holdInput();
+  _session->setThreadError(OMXI_ERR_EVENT_ERROR);
+  EXPECT_EQ(send(), OMXI_ERR_EVENT_ERROR);  // it is sent all the same
+  EXPECT_EQ(omx().count(Method::EmptyBuffer), 1U);
+  _session->_threadError = OMXI_OK;
+  for (size_t i = 0; i < 4; ++i) EXPECT_EQ(send(), 0);  // the last is dropped: no buffer is free
+  EXPECT_EQ(omx().count(Method::EmptyBuffer), 4U);
+  _session->setThreadError(OMXI_ERR_EVENT_ERROR);
+  EXPECT_EQ(send(), OMXI_ERR_EVENT_ERROR);
 }
 
-TEST(SendDataFrame, KeepsTryingAfterTheEndUntilAFailureOrTheSessionsEnd) {
+TEST_F(EncoderTest, KeepsTryingAfterTheEndUntilAFailureOrTheSessionsEnd) {
   for (const bool failing : {true, false}) {
-    RunningRig rig("msm8960", 38016);
-    EXPECT_EQ(rig.session->sendEndOfInputFlag(0), 0);
-    std::future<int> feeder = std::async(std::launch::async, [&, session = rig.session.get()] {
-      return session->sendDataFrame(rig.frame.data(), 176, 144, 0);
+    startEncoder(38016);
+    EXPECT_EQ(_session->sendEndOfInputFlag(0), 0);
+    Later<int> feeder("sendDataFrame()", [this, session = &encoder()] {
+      return session->sendDataFrame(_frame.data(), 176, 144, 0);
     });
-    EXPECT_TRUE(rig.log.waitFor("OMXINTERFACE - Client Shutting Down: Input Data ignored"));
-    EXPECT_EQ(feeder.wait_for(std::chrono::seconds(0)), std::future_status::timeout);
-    if (failing) rig.session->setThreadError(OMXI_ERR_BUFFER_NOT_FOUND);
+    EXPECT_TRUE(_log.waitFor("OMXINTERFACE - Client Shutting Down: Input Data ignored"));
+    EXPECT_FALSE(feeder.isDone());
+    if (failing) _session->setThreadError(OMXI_ERR_BUFFER_NOT_FOUND);
     // It would hold up the release of its port if it kept that in use.
-    EXPECT_EQ(rig.session->deInit(), failing ? OMXI_ERR_BUFFER_NOT_FOUND : 0);
-    rig.session.reset();
-    EXPECT_EQ(feeder.get(), failing ? OMXI_ERR_BUFFER_NOT_FOUND : -1);
+    EXPECT_EQ(deInit(), failing ? OMXI_ERR_BUFFER_NOT_FOUND : 0);
+    destroy();
+    EXPECT_EQ(feeder.result(), failing ? OMXI_ERR_BUFFER_NOT_FOUND : -1);
   }
 }
 
-TEST(EncoderCreation, LeavesAnUnconnectedSessionWithoutSettings) {
-  ScriptedMediaServer server("msm8960");
+TEST_F(EncoderTest, IsLeftUnconnectedWithoutSettings) {
   OmxInterfaceEncoder* session = nullptr;
   EXPECT_EQ(OmxInterfaceEncoder::Create(&session, nullptr), OMXI_ERR_INVALID_ENCODING_PARAMS);
   ASSERT_NE(session, nullptr);
-  EXPECT_EQ(server.omx().count(), 0u);
+  _session.reset(session);
+  EXPECT_EQ(omx().count(), 0u);
   // Everything fails as if refused, and nothing crashes.
   EXPECT_EQ(session->setConfig(CONFIG_BITRATE, 1), OMXI_ERR_NO_PLATFORM_WRAPPER);
   EXPECT_EQ(session->updateBitRate(1), OMXI_ERR_GET_BITRATE);
@@ -125,34 +133,33 @@ TEST(EncoderCreation, LeavesAnUnconnectedSessionWithoutSettings) {
   EXPECT_EQ(session->requestIFrame(), OMXI_ERR_REQUEST_IFRAME);
   EXPECT_EQ(session->setupIOMXConnections(), 0);
   EXPECT_EQ(session->configureEncoder(nullptr), OMXI_ERR_INVALID_ENCODING_PARAMS);
-  server.omx().fail(Method::SetConfig);
+  omx().fail(Method::SetConfig);
   EXPECT_EQ(session->updateBitRate(1), OMXI_ERR_SET_BITRATE);
-  delete session;
+  destroy();
   webrtc::VideoCodec codec = settings();
   const faults::Fault failed(faults::Failing::New, sizeof(SessionState));
   EXPECT_EQ(OmxInterfaceEncoder::Create(&session, &codec), OMXI_ERR_CREATE_INTERFACE);
   EXPECT_EQ(session, nullptr);
 }
 
-TEST(EncoderUpdates, WriteOneRecordEach) {
-  EncoderRig rig("msm8960");
-  ASSERT_EQ(rig.create(), 0);
+TEST_F(EncoderTest, WritesOneRecordForEachUpdate) {
+  ASSERT_EQ(createEncoder(), 0);
   const auto expectWritten = [&](const Words& record, size_t calls) {
-    EXPECT_EQ(rig.settingCalls().size(), calls);
-    EXPECT_EQ(words(rig.settingCalls().back().record), record);
-    rig.server.omx().clearCalls();
+    EXPECT_EQ(settingCalls().size(), calls);
+    EXPECT_EQ(words(settingCalls().back().record), record);
+    omx().clearCalls();
   };
-  rig.server.omx().clearCalls();
-  EXPECT_EQ(rig.session->updateBitRate(300000), 0);
-  EXPECT_EQ(words(rig.settingCalls()[0].record)[2], 0u);  // asked of the input, set on the output
+  omx().clearCalls();
+  EXPECT_EQ(encoder().updateBitRate(300000), 0);
+  EXPECT_EQ(words(settingCalls()[0].record)[2], 0u);  // asked of the input, set on the output
   expectWritten({16, kVersion, 1, 300000}, 2);
-  EXPECT_EQ(rig.session->updateAVCIntraPeriod(30), 0);
+  EXPECT_EQ(encoder().updateAVCIntraPeriod(30), 0);
   expectWritten({20, kVersion, 1, 30, 29}, 1);
-  EXPECT_EQ(rig.session->updateAVCIntraPeriod(INT32_MIN), 0);
+  EXPECT_EQ(encoder().updateAVCIntraPeriod(INT32_MIN), 0);
   expectWritten({20, kVersion, 1, 0x80000000, 0x7FFFFFFF}, 1);
-  EXPECT_EQ(rig.session->requestIFrame(), 0);
+  EXPECT_EQ(encoder().requestIFrame(), 0);
   expectWritten({16, kVersion, 1, 1}, 1);
-  EXPECT_EQ(rig.session->setupRateControl(2, -1), 0);
+  EXPECT_EQ(encoder().setupRateControl(2, -1), 0);
   expectWritten({20, kVersion, 1, 2, 0xFFFFFFFF}, 2);
 }
 

@@ -6,7 +6,6 @@
 #include <utils/String8.h>
 
 #include "omxbridge/omxbridge.h"
-#include "tests/faults/rules.h"
 
 namespace omxtest {
 
@@ -20,23 +19,25 @@ std::string replaced(std::string text, const std::string& what, const std::strin
 
 // A rule's line, with what it says of the call filled in.
 std::string filledIn(std::string line, const Subject& subject, const Hit& hit, OMX_U32 port, size_t buffer) {
-  char index[16];
-  snprintf(index, sizeof(index), "%x", static_cast<unsigned int>(hit.call.index));
-  line = replaced(line, "$status", "-2147483648");
-  line = replaced(line, "$hex", "80000000");
-  line = replaced(line, "$index", index);
-  line = replaced(line, "$name", subject.component());
-  line = replaced(line, "$port", std::to_string(port));
-  return replaced(line, "$buffer", std::to_string(buffer));
+  const std::pair<const char*, std::string> values[] = {
+      {"$status", "-2147483648"},
+      {"$hex", "80000000"},
+      {"$index", android::String8::format("%x", static_cast<unsigned int>(hit.call.index)).string()},
+      {"$name", subject.component()},
+      {"$port", std::to_string(port)},
+      {"$buffer", std::to_string(buffer)},
+      {"$get", hit.call.method == Method::SetParameter ? "set" : "get"},
+      {"$side", port == 0 ? "In" : "Out"}};
+  for (const auto& [what, by] : values) line = replaced(line, what, by);
+  return line;
 }
 
 // No session: the last line says so, and why in words.
 void addCreationLines(const Subject& subject, const Hit& hit, Expected* result) {
   const auto code = result->results.find(Step::Create);
   if (code == result->results.end()) return;
-  const bool configuring = hit.call.method == Method::GetParameter ||
-                           hit.call.method == Method::SetParameter ||
-                           hit.call.method == Method::StoreMetaDataInBuffers;
+  const bool configuring =
+      hit.call.method >= Method::GetParameter && hit.call.method <= Method::StoreMetaDataInBuffers;
   if (subject.encoding && configuring) {
     result->lines.emplace_back("E OMXINTERFACE - [ENC] Init: failed to setup params!");
   }
@@ -67,7 +68,7 @@ Expected refusedCall(const Subject& subject, const Hit& hit) {
     result.lines.emplace_back("no rule for this call");
     return result;
   }
-  if (rule->code != 0) result.results[resultStep(hit)] = rule->code;
+  if (rule->code != 0) result.results[resultStep(hit)] = codeOf(*rule, hit.call);
   if (!rule->line.empty()) {
     result.lines.push_back("E " + filledIn(rule->line, subject, hit, hit.port, hit.nth - 1));
   }
@@ -109,21 +110,14 @@ Expected refusedThread(const Subject& subject, const Hit& hit) {
 Expected missing(const Subject& subject, const Fault& fault, const Hit& hit) {
   Expected result;
   result.picturesLost.reset();
-  switch (hit.message.type) {
-    case android::omx_message::EMPTY_BUFFER_DONE:
-      runOutOfInput(subject, hit, &result);
-      break;
-    case android::omx_message::FILL_BUFFER_DONE:
-      result.stuck = Step::DeInit;
-      break;
-    case android::omx_message::EVENT:
-      if (eventIs(OMX_EventBufferFlag)(hit.message)) {
-        result.endMarkEvents = 0;
-      } else {
-        // A state's completion is waited for where it was asked for, the rest of a reconfiguration where the
-        // end of the output is.
-        result.stuck = commandComplete(OMX_CommandStateSet)(hit.message) ? hit.step : Step::DeInit;
-      }
+  if (emptyBufferDone()(hit.message)) {
+    runOutOfInput(subject, hit, &result);
+  } else if (eventIs(OMX_EventBufferFlag)(hit.message)) {
+    result.endMarkEvents = 0;
+  } else {
+    // A state's completion is waited for where it was asked for; a filled buffer, or the rest of a
+    // reconfiguration, where the end of the output is.
+    result.stuck = commandComplete(OMX_CommandStateSet)(hit.message) ? hit.step : Step::DeInit;
   }
   if (fault.kind == Kind::Withheld) result.endMarkEvents = 1;
   return result;
@@ -131,7 +125,7 @@ Expected missing(const Subject& subject, const Fault& fault, const Hit& hit) {
 
 Expected doubled(const Subject& subject, const Hit& hit) {
   Expected result;
-  if (hit.message.type == android::omx_message::EMPTY_BUFFER_DONE) {
+  if (emptyBufferDone()(hit.message)) {
     result.lines.emplace_back(
         android::String8::format("W OMXINTERFACE - We already own input buffer %p, yet received an "
                                  "EMPTY_BUFFER_DONE.",
@@ -149,19 +143,15 @@ Expected doubled(const Subject& subject, const Hit& hit) {
   return result;
 }
 
+// Nobody goes by the node of an event, and what is in a buffer that there is not is not looked at.
 Expected forged(const Subject& subject, const Fault& fault, const Hit& hit) {
-  switch (hit.message.type) {
-    case android::omx_message::EMPTY_BUFFER_DONE: {
-      Expected result;
-      result.results[Step::DeInit] = OMXI_ERR_BUFFER_NOT_FOUND;
-      result.lines.emplace_back("E OMXINTERFACE - Buffer not found in buffer vector.\n");
-      return result;
-    }
-    case android::omx_message::FILL_BUFFER_DONE:
-      return missing(subject, fault, hit);  // is not looked at
-    default:
-      return {};  // nobody goes by the node
+  if (fillBufferDone()(hit.message)) return missing(subject, fault, hit);
+  Expected result;
+  if (emptyBufferDone()(hit.message)) {
+    result.results[Step::DeInit] = OMXI_ERR_BUFFER_NOT_FOUND;
+    result.lines.emplace_back("E OMXINTERFACE - Buffer not found in buffer vector.\n");
   }
+  return result;
 }
 
 // What a call returns whose session is destroyed while it waits.
@@ -186,21 +176,13 @@ size_t take(LogLines* log, const std::string& begin) {
 }  // namespace
 
 Expected expected(const Subject& subject, const Fault& fault, const Hit& hit) {
-  switch (fault.kind) {
-    case Kind::Refused:
-      if (fault.place == Place::Memory) return refusedMemory(subject, hit);
-      return fault.place == Place::Thread ? refusedThread(subject, hit) : refusedCall(subject, hit);
-    case Kind::Lost:
-    case Kind::Withheld:
-    case Kind::Late:
-      return missing(subject, fault, hit);
-    case Kind::Doubled:
-      return doubled(subject, hit);
-    case Kind::Forged:
-      return forged(subject, fault, hit);
-    default:
-      return {};  // a delay changes nothing
+  if (fault.kind == Kind::Refused) {
+    if (fault.place == Place::Memory) return refusedMemory(subject, hit);
+    return fault.place == Place::Thread ? refusedThread(subject, hit) : refusedCall(subject, hit);
   }
+  if (fault.kind == Kind::Doubled) return doubled(subject, hit);
+  if (fault.kind == Kind::Forged) return forged(subject, fault, hit);
+  return fault.kind == Kind::Delayed ? Expected() : missing(subject, fault, hit);  // a delay changes nothing
 }
 
 std::string differences(const Subject& subject, const Fault& fault, const std::optional<Hit>& hit,

@@ -18,8 +18,8 @@ namespace {
 // What a process has when no session and no server is there.
 struct Belongings {
   int64_t objects = omxhost::liveObjects();
-  size_t threads = threadCount();
-  size_t files = openFileCount();  // each heap of shared memory is one
+  size_t threads = entryCount("/proc/self/task");
+  size_t files = entryCount("/proc/self/fd");  // each heap of shared memory is one
   auto operator<=>(const Belongings&) const = default;
 };
 

@@ -67,20 +67,13 @@ Fate Injector::fate(android::omx_message& message) {
   if (++_messages != _fault.number || _fault.place != Place::Message) return Fate::Pass;
   _hit = {_step, nth, {}, 0, message};
   _happened = true;
-  switch (_fault.kind) {
-    case Kind::Lost:
-      return Fate::Drop;
-    case Kind::Doubled:
-      return Fate::Repeat;
-    case Kind::Forged:
-      if (message.type == android::omx_message::EVENT) message.node = kNobody;
-      if (message.type == android::omx_message::EMPTY_BUFFER_DONE) message.u.buffer_data.buffer = kNobody;
-      if (message.type == android::omx_message::FILL_BUFFER_DONE)
-        message.u.extended_buffer_data.buffer = kNobody;
-      return Fate::Pass;
-    default:
-      return Fate::Hold;
-  }
+  if (_fault.kind == Kind::Lost) return Fate::Drop;
+  if (_fault.kind == Kind::Doubled) return Fate::Repeat;
+  if (_fault.kind != Kind::Forged) return Fate::Hold;
+  if (message.type == android::omx_message::EVENT) message.node = kNobody;
+  if (message.type == android::omx_message::EMPTY_BUFFER_DONE) message.u.buffer_data.buffer = kNobody;
+  if (message.type == android::omx_message::FILL_BUFFER_DONE) message.u.extended_buffer_data.buffer = kNobody;
+  return Fate::Pass;
 }
 
 bool Injector::release(Kind kind) {

@@ -1,10 +1,12 @@
 #include "tests/faults/life.h"
 
+#include <algorithm>
 #include <utility>
 #include <vector>
 
 #include "omxbridge/omxbridge.h"
 #include "tests/core/bounded.h"
+#include "tests/core/session_fixture.h"
 #include "tests/faults/standstill.h"
 
 namespace omxtest {
@@ -45,10 +47,6 @@ void Life::help(Step step) {
     if (ends([this] { return _owner.isDone(); })) return;
   }
   if (again || _session == nullptr) _outcome.hang = name(step);
-  destroyBesides();
-}
-
-void Life::destroyBesides() {
   _injector.enter(Step::Destroy);
   void* const session = std::exchange(_session, nullptr);
   _other.start([session] { return omx_interface_destroy(session); });
@@ -69,13 +67,7 @@ Outcome Life::live() {
 bool Life::create() {
   return take(Step::Create, [this] {
     int result = -1;
-    OmxVideoCodec codec = {};
-    codec.codecType = webrtc::kVideoCodecH264;
-    codec.width = kWidth;
-    codec.height = kHeight;
-    codec.startBitrate = 500;
-    codec.maxFramerate = 30;
-    codec.codecSpecific.H264.profile = 66;
+    OmxVideoCodec codec = settings();
     _session = _encoding ? encoder_create(&result, &codec) : decoder_create(&result, nullptr);
     return result;
   });
@@ -84,22 +76,21 @@ bool Life::create() {
 int Life::configure() {
   omx_interface_register_input_callback(_session, onInput, this);
   omx_interface_register_output_callback(_session, onOutput, this);
-  std::vector<int> results;
+  int failure = 0;  // the first one
+  const auto note = [&failure](int result) {
+    if (failure == 0) failure = result;
+  };
   if (_encoding) {
     for (const CONFIGTYPE item :
          {CONFIG_BITRATE, CONFIG_FRAMERATE, CONFIG_INTRA_PERIOD, CONFIG_REQUEST_IFRAME, CONFIG_ROTATION}) {
-      results.push_back(omx_interface_set_config(_session, item, 15));
+      note(omx_interface_set_config(_session, item, 15));
     }
   } else {
-    results.push_back(omx_decoder_set_input_compression_format(_session, 0));
-    results.push_back(omx_decoder_set_input_packing_format(_session, 1));
-    const int buffers = omx_interface_get_buffer_number(_session);
-    results.push_back(buffers > 0 ? 0 : buffers);
+    note(omx_decoder_set_input_compression_format(_session, 0));
+    note(omx_decoder_set_input_packing_format(_session, 1));
+    note(std::min(0, omx_interface_get_buffer_number(_session)));
   }
-  for (const int result : results) {
-    if (result != 0) return result;
-  }
-  return 0;
+  return failure;
 }
 
 // False when the session is gone.

@@ -37,7 +37,6 @@ class Life {
   bool feed(Step step);
   bool run();
   void help(Step step);
-  void destroyBesides();
   bool ends(const std::function<bool()>& ended);
   void settle();
 

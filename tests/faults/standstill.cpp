@@ -41,12 +41,6 @@ Sleepers sleepers() {
   return result;
 }
 
-size_t entries(const char* directory) {
-  size_t count = 0;
-  for (const auto& entry : std::filesystem::directory_iterator(directory)) count += entry.exists() ? 1u : 0u;
-  return count;
-}
-
 }  // namespace
 
 // Seen asleep twice, with no switch in between, a thread has slept all the time between the two looks at it.
@@ -56,12 +50,10 @@ bool atStandstill() {
   return !before.empty() && before == sleepers();
 }
 
-size_t threadCount() {
-  return entries("/proc/self/task");
-}
-
-size_t openFileCount() {
-  return entries("/proc/self/fd");
+size_t entryCount(const char* directory) {
+  size_t count = 0;
+  for (const auto& entry : std::filesystem::directory_iterator(directory)) count += entry.exists() ? 1u : 0u;
+  return count;
 }
 
 }  // namespace omxtest

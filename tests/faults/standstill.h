@@ -11,8 +11,7 @@ namespace omxtest {
 // counts as sleep: what runs has none, or one that is longer than a test may take.
 bool atStandstill();
 
-// What the process holds of the system, for comparison.
-size_t threadCount();
-size_t openFileCount();
+// Of a directory, for instance of those in which the system shows what a process holds.
+size_t entryCount(const char* directory);
 
 }  // namespace omxtest

@@ -2,6 +2,8 @@
 
 #include <gtest/gtest.h>
 
+#include <climits>
+
 #include "omxbridge/frames/rgb.h"
 #include "omxbridge/frames/rotate.h"
 #include "omxbridge/frames/yuv.h"
@@ -26,9 +28,9 @@ struct Function {
   std::string name;
   Shape shape;
   unsigned srcHalves, dstHalves;  // bytes per two pixels
-  std::function<int(In src, Out dst, Size from, Size to, unsigned stride)> call;
-  std::function<void(const Bytes& src, Bytes& dst, Size from, Size to, unsigned stride)> reference;
-  std::function<std::size_t(Size to, unsigned stride)> result;
+  std::function<int(In src, Out dst, Size from, Size to, unsigned stride)> call{};
+  std::function<void(const Bytes& src, Bytes& dst, Size from, Size to, unsigned stride)> reference{};
+  std::function<std::size_t(Size to, unsigned stride)> result{};
   bool evenWhereStrided = false;  // odd widths come without a stride
   int zeroSize = -1;
 };
@@ -51,41 +53,41 @@ using TightCall = int (*)(In, Out, unsigned, unsigned);
 using StridedCall = int (*)(In, Out, unsigned, unsigned, unsigned);
 using CentredCall = int (*)(In, unsigned, unsigned, Out, unsigned, unsigned);
 
-Function tight(const char* name, TightCall call, unsigned srcHalves,
-               const std::function<void(const Bytes&, Bytes&, Size)>& reference,
+Function tight(const char* name, const std::function<int(In, Out, unsigned, unsigned)>& call,
+               unsigned srcHalves, const std::function<void(const Bytes&, Bytes&, Size)>& reference,
                std::size_t (*result)(Size, unsigned) = frame) {
-  return {name,
-          Shape::kTight,
-          srcHalves,
-          3,
-          [=](In src, Out dst, Size s, Size, unsigned) { return call(src, dst, s.width, s.height); },
-          [=](const Bytes& src, Bytes& dst, Size s, Size, unsigned) { reference(src, dst, s); },
-          result};
+  Function function{name, Shape::kTight, srcHalves, 3};
+  function.call = [=](In src, Out dst, Size s, Size, unsigned) { return call(src, dst, s.width, s.height); };
+  function.reference = [=](const Bytes& src, Bytes& dst, Size s, Size, unsigned) { reference(src, dst, s); };
+  function.result = result;
+  return function;
 }
 
 Function strided(const char* name, StridedCall call, unsigned dstHalves,
                  const std::function<void(const Bytes&, Bytes&, Size, unsigned)>& reference) {
-  return {name,
-          Shape::kStrided,
-          3,
-          dstHalves,
-          [=](In src, Out dst, Size s, Size, unsigned n) { return call(src, dst, s.width, s.height, n); },
-          [=](const Bytes& src, Bytes& dst, Size s, Size, unsigned n) { reference(src, dst, s, n); },
-          [=](Size s, unsigned n) { return std::size_t{n} * s.height * dstHalves / 2; }};
+  Function function{name, Shape::kStrided, 3, dstHalves};
+  function.call = [=](In src, Out dst, Size s, Size, unsigned n) {
+    return call(src, dst, s.width, s.height, n);
+  };
+  function.reference = [=](const Bytes& src, Bytes& dst, Size s, Size, unsigned n) {
+    reference(src, dst, s, n);
+  };
+  function.result = [=](Size s, unsigned n) { return std::size_t{n} * s.height * dstHalves / 2; };
+  return function;
 }
 
 Function centred(const char* name, CentredCall call, unsigned srcHalves,
                  const std::function<void(const Bytes&, Size, Bytes&, Size)>& reference,
                  std::size_t (*result)(Size, unsigned) = frame) {
-  return {name,
-          Shape::kCentred,
-          srcHalves,
-          3,
-          [=](In src, Out dst, Size from, Size to, unsigned) {
-            return call(src, from.width, from.height, dst, to.width, to.height);
-          },
-          [=](const Bytes& src, Bytes& dst, Size from, Size to, unsigned) { reference(src, from, dst, to); },
-          result};
+  Function function{name, Shape::kCentred, srcHalves, 3};
+  function.call = [=](In src, Out dst, Size from, Size to, unsigned) {
+    return call(src, from.width, from.height, dst, to.width, to.height);
+  };
+  function.reference = [=](const Bytes& src, Bytes& dst, Size from, Size to, unsigned) {
+    reference(src, from, dst, to);
+  };
+  function.result = result;
+  return function;
 }
 
 Function rgb(const char* name, StridedCall call, const RgbLayout& layout) {
@@ -106,25 +108,25 @@ Function rgb(const char* name, TightCall call, const RgbLayout& layout) {
   return function;
 }
 
-Function turned(const char* name, TightCall call, Turn turn, Chroma chroma) {
+template <typename Call>
+Function turned(const char* name, const Call& call, Turn turn, Chroma chroma) {
   const auto reference = [=](const Bytes& src, Bytes& dst, Size s) {
     reference::turn(turn, chroma, src, dst, s);
   };
   return tight(name, call, 3, reference, turn == Turn::kHalf ? written : frame);
 }
 
-template <VideoType kType>
-int clockwise(In src, Out dst, unsigned width, unsigned height) {
-  return ConvertToI420AndRotateClockwise(src, width, height, dst, height, width, kType);
+// By the functions that take a type.
+Function turned(const char* name, VideoType type, Turn turn, Chroma chroma) {
+  const auto call = [=](In src, Out dst, unsigned width, unsigned height) {
+    if (turn == Turn::kHalf) return ConvertToI420AndMirrorUpDown(src, dst, width, height, type);
+    const auto rotate =
+        turn == Turn::kClockwise ? ConvertToI420AndRotateClockwise : ConvertToI420AndRotateAntiClockwise;
+    return rotate(src, width, height, dst, height, width, type);
+  };
+  return turned(name, call, turn, chroma);
 }
-template <VideoType kType>
-int antiClockwise(In src, Out dst, unsigned width, unsigned height) {
-  return ConvertToI420AndRotateAntiClockwise(src, width, height, dst, height, width, kType);
-}
-template <VideoType kType>
-int half(In src, Out dst, unsigned width, unsigned height) {
-  return ConvertToI420AndMirrorUpDown(src, dst, width, height, kType);
-}
+
 template <int (*kCall)(unsigned, unsigned, In, Out)>
 int sizeFirst(In src, Out dst, unsigned width, unsigned height) {
   return kCall(width, height, src, dst);
@@ -137,6 +139,8 @@ int sizeBetween(In src, Out dst, unsigned width, unsigned height) {
 std::vector<Function> functions() {
   using namespace std::placeholders;
   using namespace reference;
+  using enum Turn;
+  using enum Chroma;
   Function copy = strided("I420ToI420", ConvertI420ToI420, 3, i420ToI420);
   copy.result = [](Size s, unsigned stride) { return std::size_t{s.height / 2} * stride * 3; };
   copy.zeroSize = 0;
@@ -182,22 +186,20 @@ std::vector<Function> functions() {
       rgb("ARGB1555", ConvertI420ToARGB1555, {pixel1555, 2, Rows::kBottomUp, false}),
       rgb("ARGB1555_EX", ConvertI420ToARGB1555_EX, {pixel1555, 2, Rows::kTopDown, false}),
       rgb("NV12ToRGB565", ConvertNV12ToRGB565, {pixel565, 2, Rows::kBottomUp, true, false, true}),
-      turned("I420Clockwise", clockwise<kI420>, Turn::kClockwise, Chroma::kUThenV),
-      turned("I420AntiClockwise", antiClockwise<kI420>, Turn::kAntiClockwise, Chroma::kUThenV),
-      turned("I420Half", half<kI420>, Turn::kHalf, Chroma::kUThenV),
-      turned("YV12Clockwise", clockwise<kYV12>, Turn::kClockwise, Chroma::kVThenU),
-      turned("YV12AntiClockwise", antiClockwise<kYV12>, Turn::kAntiClockwise, Chroma::kVThenU),
-      turned("YV12Half", half<kYV12>, Turn::kHalf, Chroma::kVThenU),
-      turned("NV12Clockwise", ConvertNV12ToI420AndRotateClockwise, Turn::kClockwise, Chroma::kUvPairs),
-      turned("NV12AntiClockwise", ConvertNV12ToI420AndRotateAntiClockwise, Turn::kAntiClockwise,
-             Chroma::kUvPairs),
-      turned("NV12Half", ConvertNV12ToI420AndRotate180, Turn::kHalf, Chroma::kUvPairs),
-      turned("NV21Clockwise", ConvertNV21ToI420AndRotateClockwise, Turn::kClockwise, Chroma::kVuPairs),
-      turned("NV21AntiClockwise", ConvertNV21ToI420AndRotateAntiClockwise, Turn::kAntiClockwise,
-             Chroma::kVuPairs),
-      turned("NV21Half", ConvertNV21ToI420AndRotate180, Turn::kHalf, Chroma::kVuPairs),
-      turned("UpDown", MirrorI420UpDown, Turn::kUpDown, Chroma::kUThenV),
-      turned("LeftRight", MirrorI420LeftRight, Turn::kLeftRight, Chroma::kUThenV),
+      turned("I420Clockwise", kI420, kClockwise, kUThenV),
+      turned("I420AntiClockwise", kI420, kAntiClockwise, kUThenV),
+      turned("I420Half", kI420, kHalf, kUThenV),
+      turned("YV12Clockwise", kYV12, kClockwise, kVThenU),
+      turned("YV12AntiClockwise", kYV12, kAntiClockwise, kVThenU),
+      turned("YV12Half", kYV12, kHalf, kVThenU),
+      turned("NV12Clockwise", ConvertNV12ToI420AndRotateClockwise, kClockwise, kUvPairs),
+      turned("NV12AntiClockwise", ConvertNV12ToI420AndRotateAntiClockwise, kAntiClockwise, kUvPairs),
+      turned("NV12Half", ConvertNV12ToI420AndRotate180, kHalf, kUvPairs),
+      turned("NV21Clockwise", ConvertNV21ToI420AndRotateClockwise, kClockwise, kVuPairs),
+      turned("NV21AntiClockwise", ConvertNV21ToI420AndRotateAntiClockwise, kAntiClockwise, kVuPairs),
+      turned("NV21Half", ConvertNV21ToI420AndRotate180, kHalf, kVuPairs),
+      turned("UpDown", MirrorI420UpDown, kUpDown, kUThenV),
+      turned("LeftRight", MirrorI420LeftRight, kLeftRight, kUThenV),
   };
 }
 
@@ -263,6 +265,52 @@ TEST_P(Conversions, RefuseBadArguments) {
     }
     EXPECT_EQ(call({2, 2}, {0x10000, 0x10000}, 0), -1);
   }
+}
+
+// --- What is peculiar to single functions ---
+
+TEST(Rotate, TakesPlanarTypesAndTheTurnedSize) {
+  std::uint8_t src[12] = {}, dst[12];
+  EXPECT_EQ(ConvertToI420AndRotateClockwise(src, 4, 2, dst, 4, 2, kI420), -1);
+  EXPECT_EQ(ConvertToI420AndRotateAntiClockwise(src, 4, 2, dst, 2, 3, kI420), -1);
+  for (const VideoType type : {kUnknown, kI420Alt, kRGB24, kNV12, kNV21, static_cast<VideoType>(99)}) {
+    EXPECT_EQ(ConvertToI420AndRotateClockwise(src, 4, 2, dst, 2, 4, type), -1);
+    EXPECT_EQ(ConvertToI420AndRotateAntiClockwise(src, 4, 2, dst, 2, 4, type), -1);
+    EXPECT_EQ(ConvertToI420AndMirrorUpDown(src, dst, 4, 2, type), -1);
+  }
+}
+
+TEST(Nv12Crop, CopiesTheRectangleAndRefusesOnesThatAreEmptyOrLeaveTheFrame) {
+  Content content(14);
+  const auto number = [&](int low, int high) {
+    return static_cast<int>(content.number(static_cast<unsigned>(low), static_cast<unsigned>(high)));
+  };
+  for (unsigned k = 0; k < 300 && !HasFailure(); ++k) {
+    const int width = number(1, 40), height = number(1, 12);
+    const int left = number(0, width - 1), right = number(left, width - 1);
+    const int top = number(0, height - 1), bottom = number(top, height - 1);
+    const std::array<int, 4> ltrb{left, top, right, bottom};
+    SCOPED_TRACE(testing::PrintToString(ltrb));
+    const Size s{static_cast<unsigned>(width), static_cast<unsigned>(height)};
+    const Bytes src = content.bytes(reference::i420Bytes(s));
+    const int rows = bottom - top + 1 + bottom / 2 - top / 2 + 1;
+    const Bytes dst = content.bytes(static_cast<std::size_t>(rows * (right - left + 1)));
+    Bytes expected = dst;
+    reference::cropNv12(src, s, ltrb, expected);
+    expectConversion(
+        [&](auto* from, auto* to) {
+          return ConvertNV12ToNV12(from, width, height, left, top, right, bottom, to);
+        },
+        src, dst, expected, 0);
+  }
+  std::uint8_t src[24] = {}, dst[24] = {};
+  const int refused[][6] = {{0, 4, 0, 0, 3, 3}, {4, -4, 0, 0, 3, 3},      {4, 4, -1, 0, 3, 3},
+                            {4, 4, 3, 0, 2, 3}, {4, 4, 0, INT_MIN, 3, 3}, {4, 4, 0, 3, 3, 2},
+                            {4, 4, 0, 0, 4, 3}, {4, 4, 0, 0, 3, 4},       {4, 4, 0, 0, INT_MAX, INT_MAX}};
+  for (const auto& [stride, height, left, top, right, bottom] : refused) {
+    EXPECT_EQ(ConvertNV12ToNV12(src, stride, height, left, top, right, bottom, dst), -1);
+  }
+  EXPECT_EQ(ConvertNV12ToNV12(nullptr, 4, 4, 0, 0, 3, 3, dst), -1);
 }
 
 }  // namespace

@@ -50,7 +50,7 @@ TEST(PadFrame, ChecksInOrder) {
 TEST(PadFrame, FixedSizes) {
   Content content(52);
   const auto expectFixed = [&](Size from, Size to, unsigned cropRows, unsigned left, unsigned top,
-                               auto&& adjust) {
+                               std::size_t untouched) {
     const Bytes src = content.bytes(reference::i420Bytes(from)),
                 dst = content.bytes(reference::i420Bytes(to));
     Bytes expected = dst;
@@ -64,15 +64,13 @@ TEST(PadFrame, FixedSizes) {
     plane(0, 1, 0);
     plane(from.area(), 2, 127);
     plane(from.area() * 5 / 4, 2, 127);
-    adjust(dst, expected);
+    for (std::size_t i = untouched; i < untouched + 4 && i < dst.size(); ++i) expected[i] = dst[i];
     expectConversion(
         [&](auto* in, auto* out) { return PadI420Frame(static_cast<unsigned>(src.size()), in, out, true); },
         src, dst, expected, static_cast<int>(dst.size()));
   };
-  expectFixed({320, 240}, {352, 288}, 0, 16, 16, [](const Bytes& before, Bytes& after) {
-    for (std::size_t i = 352 * 288 * 5 / 4 + 1412; i < 352 * 288 * 5 / 4 + 1416; ++i) after[i] = before[i];
-  });
-  expectFixed({160, 120}, {176, 144}, 4, 0, 16, [](const Bytes&, Bytes&) {});
+  expectFixed({320, 240}, {352, 288}, 0, 16, 16, 352 * 288 * 5 / 4 + 1412);
+  expectFixed({160, 120}, {176, 144}, 4, 0, 16, 176 * 144 * 3 / 2);  // all of it is written
 }
 
 TEST(PadBottomRows, MovesChromaAndFillsInPlace) {

@@ -7,11 +7,11 @@
 
 namespace reference {
 
-struct Sums {
-  int r, g, b;  // before clamping
+struct Components {
+  int r, g, b;  // on the way to RGB: before clamping
 };
 
-using Pixel = void (*)(const Sums& sums, std::uint8_t* to);
+using Pixel = void (*)(const Components& c, std::uint8_t* to);
 
 enum class Rows { kTopDown, kBottomUp, kHalfStride };
 struct RgbLayout {
@@ -35,22 +35,11 @@ inline void word(unsigned value, std::uint8_t* to) {
   to[1] = static_cast<std::uint8_t>(value >> 8);
 }
 
-struct Components {
-  int r, g, b;
-};
-
 inline Components load(Rgb layout, const Bytes& src, std::size_t at) {
-  switch (layout) {
-    case Rgb::k24:
-      return {src[at + 2], src[at + 1], src[at]};
-    case Rgb::kMac:
-      return {src[at + 1], src[at + 2], src[at + 3]};
-    case Rgb::k565: {
-      const int w = src[at] + 256 * src[at + 1];
-      return {w / 2048 * 8, w / 32 % 64 * 4, w % 32 * 8};
-    }
-  }
-  return {};
+  if (layout == Rgb::k24) return {src[at + 2], src[at + 1], src[at]};
+  if (layout == Rgb::kMac) return {src[at + 1], src[at + 2], src[at + 3]};
+  const int w = src[at] + 256 * src[at + 1];
+  return {w / 2048 * 8, w / 32 % 64 * 4, w % 32 * 8};
 }
 
 inline unsigned bytesOf(Rgb layout) {
@@ -67,37 +56,37 @@ inline std::uint8_t vOf(Components c) {
   return low(((112 * c.r - 94 * c.g - 18 * c.b + 128) >> 8) + 128);
 }
 
-inline Sums sumsOf(int y, int u, int v) {
+inline Components sumsOf(int y, int u, int v) {
   const int luma = 298 * (y - 16);
   return {(luma + 409 * (v - 128) + 128) >> 8, (luma - 100 * (u - 128) + 128 - 208 * (v - 128)) >> 8,
           (luma + 516 * (u - 128) + 128) >> 8};
 }
 
-inline void pixelBgra(const Sums& s, std::uint8_t* to) {
+inline void pixelBgra(const Components& s, std::uint8_t* to) {
   const unsigned bgra[] = {clamped(s.b), clamped(s.g), clamped(s.r), 255};
   std::copy_n(bgra, 4, to);
 }
-inline void pixelBgr(const Sums& s, std::uint8_t* to) {
+inline void pixelBgr(const Components& s, std::uint8_t* to) {
   pixelBgra(s, to);
 }
-inline void pixelArgb(const Sums& s, std::uint8_t* to) {
+inline void pixelArgb(const Components& s, std::uint8_t* to) {
   pixelBgra(s, to);
   std::reverse(to, to + 4);
 }
-inline void pixelRgba(const Sums& s, std::uint8_t* to) {
+inline void pixelRgba(const Components& s, std::uint8_t* to) {
   pixelBgra(s, to);
   std::swap(to[0], to[2]);
 }
 
-inline void pixel565(const Sums& s, std::uint8_t* to) {
+inline void pixel565(const Components& s, std::uint8_t* to) {
   word((clamped(s.r) & 0xF8) << 8 | (clamped(s.g) & 0xFC) << 3 | clamped(s.b) >> 3, to);
 }
 
-inline void pixel4444(const Sums& s, std::uint8_t* to) {
+inline void pixel4444(const Components& s, std::uint8_t* to) {
   word(0xF000 | (clamped(s.r) >> 4) << 8 | (clamped(s.g) >> 4) << 4 | clamped(s.b) >> 4, to);
 }
 
-inline void pixel1555(const Sums& s, std::uint8_t* to) {
+inline void pixel1555(const Components& s, std::uint8_t* to) {
   const unsigned red = s.r < 0     ? 0x8000
                        : s.r > 255 ? 0x6000
                                    : (((static_cast<unsigned>(s.r) & 0xF8) << 10) - 0x8000) & 0xFFFF;

@@ -43,19 +43,21 @@ inline void exchangeChroma(const Bytes& src, Bytes& dst, Size s) {
   copy(src, vByArea(s), 0, dst, s.area(), 0, s.area() / 4, 1);
 }
 
-inline void i420ToYv12(const Bytes& src, Bytes& dst, Size s, unsigned stride) {
+inline void planesApart(const Bytes& src, Bytes& dst, Size s, unsigned stride, std::size_t u, std::size_t v) {
   copy(src, 0, s.width, dst, 0, stride, s.width, s.height);
-  const std::size_t v = std::size_t{stride} * s.height, u = v + std::size_t{s.height} * (stride / 2) / 2;
   copy(src, s.area(), s.width / 2, dst, u, stride / 2, s.width / 2, s.height / 2);
   copy(src, vByArea(s), s.width / 2, dst, v, stride / 2, s.width / 2, s.height / 2);
 }
 
+inline void i420ToYv12(const Bytes& src, Bytes& dst, Size s, unsigned stride) {
+  const std::size_t v = std::size_t{stride} * s.height, u = v + std::size_t{s.height} * (stride / 2) / 2;
+  planesApart(src, dst, s, stride, u, v);
+}
+
 inline void i420ToI420(const Bytes& src, Bytes& dst, Size s, unsigned stride) {
   if (stride == s.width) return copy(src, 0, 0, dst, 0, 0, std::size_t{s.height / 2} * s.width * 3, 1);
-  copy(src, 0, s.width, dst, 0, stride, s.width, s.height);
   const std::size_t u = std::size_t{stride} * s.height, v = u + std::size_t{s.height / 2} * (stride / 2);
-  copy(src, s.area(), s.width / 2, dst, u, stride / 2, s.width / 2, s.height / 2);
-  copy(src, vByArea(s), s.width / 2, dst, v, stride / 2, s.width / 2, s.height / 2);
+  planesApart(src, dst, s, stride, u, v);
 }
 
 inline void i420Centred(const Bytes& src, Size from, Bytes& dst, Size to) {

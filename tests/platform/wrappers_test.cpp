@@ -1,15 +1,12 @@
 // The chip's generation, and how the vendors' wrappers set up encoders and decoders: which records, byte for
 // byte.
-#include <gtest/gtest.h>
-
 #include <optional>
 
 #include <cutils/properties.h>
 
-#include "decoder/omx_interface_decoder.h"
 #include "platform/board_platform_wrapper.h"
 #include "platform/hardware_version.h"
-#include "tests/encoder/encoder_rig.h"
+#include "tests/core/session_fixture.h"
 
 namespace omxtest {
 namespace {
@@ -37,12 +34,22 @@ TEST(HardwareBaseVersionTest, FollowsThePropertyAndThenTheBuildId) {
 }
 
 using Definition = OMX_PARAM_PORTDEFINITIONTYPE;
+using QcomWrapper = SessionTest;
 
-TEST(QcomWrapper, ConfiguresAnEncoderStepByStep) {
-  EncoderRig rig("msm8960");
-  rig.server.encoder().answer(OMX_IndexParamVideoAvc, patternRecord<108>(1));
-  ASSERT_EQ(rig.create(), 0);
-  std::vector<Call> calls = rig.settingCalls();
+class TiWrapper : public SessionTest {
+ protected:
+  TiWrapper() : SessionTest("omap4") {}
+};
+
+class EitherWrapper : public SessionTest, public ::testing::WithParamInterface<const char*> {
+ protected:
+  EitherWrapper() : SessionTest(GetParam()) {}
+};
+
+TEST_F(QcomWrapper, ConfiguresAnEncoderStepByStep) {
+  script().answer(OMX_IndexParamVideoAvc, patternRecord<108>(1));
+  ASSERT_EQ(createEncoder(), 0);
+  std::vector<Call> calls = settingCalls();
   ASSERT_EQ(calls.size(), 10U);
   for (const size_t step : {0U, 2U}) {
     EXPECT_EQ(calls[step + 1].record, edited<Definition>(calls[step], [](Definition& definition) {
@@ -76,12 +83,12 @@ TEST(QcomWrapper, ConfiguresAnEncoderStepByStep) {
             (Words{20, kVersion, 1, OMX_Video_ControlRateVariableSkipFrames, 500000}));
   webrtc::VideoCodec codec = settings();
   codec.codecType = webrtc::kVideoCodecOther;  // has no H.264 settings
-  ASSERT_EQ(rig.create(codec), 0);
+  ASSERT_EQ(createEncoder(codec), 0);
   calls.erase(calls.begin() + 4, calls.begin() + 6);
-  EXPECT_EQ(rig.settingCalls().size(), calls.size());
+  EXPECT_EQ(settingCalls().size(), calls.size());
 }
 
-class AvcSettings : public ::testing::TestWithParam<const char*> {};
+using AvcSettings = EitherWrapper;
 
 TEST_P(AvcSettings, FollowTheApplicationButOnAnMsm7x30) {
   const bool baselineOnly = GetParam() == std::string("msm7x30");
@@ -97,17 +104,16 @@ TEST_P(AvcSettings, FollowTheApplicationButOnAnMsm7x30) {
                {100, 0, 1, 1, 0xFFFF, 8},  // no further key frames
                {88, INT32_MIN, 0, 0, 0x7FFFFFFF, own},
                {77, 1, 0xC8, 0x80, 0, 2}};  // flags other than 1
-  EncoderRig rig(GetParam());
-  rig.server.encoder().answer(OMX_IndexParamVideoAvc, patternRecord<108>(1));
-  ASSERT_EQ(rig.create(), 0);
+  script().answer(OMX_IndexParamVideoAvc, patternRecord<108>(1));
+  ASSERT_EQ(createEncoder(), 0);
   for (const auto& each : cases) {
     webrtc::VideoCodecH264 h264 = {};
     h264.profile = each.profile;
     h264.keyFrameInterval = each.keyFrameInterval;
     h264.entropyCoding = each.entropyCoding;
     h264.transform8x8 = each.transform8x8;
-    EXPECT_EQ(rig.session->setupAvcSettings(&h264), 0);
-    const Words record = words(rig.settingCalls().back().record);
+    EXPECT_EQ(encoder().setupAvcSettings(&h264), 0);
+    const Words record = words(settingCalls().back().record);
     EXPECT_EQ((Words{record[4], record[14], record[19], record[23]}),
               (baselineOnly ? Words{each.pFrames, OMX_VIDEO_AVCProfileBaseline, 0, 0}
                             : Words{each.pFrames, each.profileWord, each.entropyCoding, each.transform8x8}));
@@ -116,37 +122,33 @@ TEST_P(AvcSettings, FollowTheApplicationButOnAnMsm7x30) {
 
 INSTANTIATE_TEST_SUITE_P(Devices, AvcSettings, ::testing::Values("msm8960", "msm7x30"));
 
-TEST(QcomWrapper, SendsADecoderOneVendorRecordForEachSetting) {
-  ScriptedMediaServer server("msm8960");
-  OmxInterfaceDecoder* session = nullptr;
-  ASSERT_EQ(OmxInterfaceDecoder::Create(&session, nullptr), 0);
-  const std::unique_ptr<OmxInterfaceDecoder> owner(session);
-  const auto last = [&] { return words(server.omx().calls(Method::SetParameter).back().record); };
+TEST_F(QcomWrapper, SendsADecoderOneVendorRecordForEachSetting) {
+  ASSERT_EQ(createDecoder(), 0);
+  const auto last = [&] { return words(omx().calls(Method::SetParameter).back().record); };
   for (const auto& [order, word] : {std::pair(0, 1u), std::pair(1, 2u), std::pair(2, 0u)}) {
-    EXPECT_EQ(session->setPictureOrder(order), 0);
+    EXPECT_EQ(decoder().setPictureOrder(order), 0);
     EXPECT_EQ(last(), (Words{16, 0, 0, word}));  // without a version
   }
   for (const auto& [format, word] : {std::pair(1, 3u), std::pair(2, 1u), std::pair(7, 0u)}) {
-    EXPECT_EQ(session->setInputPackingFormat(format), 0);
+    EXPECT_EQ(decoder().setInputPackingFormat(format), 0);
     EXPECT_EQ(last(), (Words{24, kVersion, 0, 0, 0, word}));
   }
 }
 
 constexpr auto kTiSemiPlanar = static_cast<OMX_COLOR_FORMATTYPE>(0x7F000100);
 
-TEST(TiWrapper, ConfiguresAnEncoderStepByStep) {
-  EncoderRig rig("omap4");
-  rig.server.encoder().answer(OMX_IndexParamVideoAvc, patternRecord<108>(1));
-  rig.server.encoder().answer(OMX_IndexParamVideoProfileLevelCurrent, patternRecord<24>(1));
+TEST_F(TiWrapper, ConfiguresAnEncoderStepByStep) {
+  script().answer(OMX_IndexParamVideoAvc, patternRecord<108>(1));
+  script().answer(OMX_IndexParamVideoProfileLevelCurrent, patternRecord<24>(1));
   // Near misses in front of the match: another coding, a colour besides the coding.
-  rig.server.encoder().setFormats(1, {{OMX_VIDEO_CodingH263, OMX_COLOR_FormatUnused},
-                                      {OMX_VIDEO_CodingAVC, OMX_COLOR_FormatYUV420SemiPlanar},
-                                      {OMX_VIDEO_CodingAVC, OMX_COLOR_FormatUnused}});
+  script().setFormats(1, {{OMX_VIDEO_CodingH263, OMX_COLOR_FormatUnused},
+                          {OMX_VIDEO_CodingAVC, OMX_COLOR_FormatYUV420SemiPlanar},
+                          {OMX_VIDEO_CodingAVC, OMX_COLOR_FormatUnused}});
   webrtc::VideoCodec codec = settings();
   codec.width = 180;
   codec.codecSpecific.H264.entropyCoding = 0xC8;
-  ASSERT_EQ(rig.create(codec), 0);
-  std::vector<Call> calls = rig.settingCalls();
+  ASSERT_EQ(createEncoder(codec), 0);
+  std::vector<Call> calls = settingCalls();
   ASSERT_EQ(calls.size(), 17U);
   EXPECT_EQ(calls[1].record, calls[0].record) << "the input's format is confirmed as it is";
   for (const size_t i : {0U, 1U, 2U}) EXPECT_EQ(words(calls[2 + i].record)[3], i);
@@ -174,42 +176,32 @@ TEST(TiWrapper, ConfiguresAnEncoderStepByStep) {
               video.eColorFormat = OMX_COLOR_FormatUnused;
             }));
   // All of it is ours but the weighted prediction mode.
-  Words avc(27, 0);
-  const std::pair<size_t, OMX_U32> set[] = {{0, 108},
-                                            {1, kVersion},
-                                            {2, 1},
-                                            {4, 60},
-                                            {6, 1},
-                                            {7, 2},
-                                            {14, OMX_VIDEO_AVCProfileMain},
-                                            {15, OMX_VIDEO_AVCLevel31},
-                                            {16, 3},
-                                            {17, 1},
-                                            {19, 0xC8},
-                                            {21, patternRecord<108>(1)[21]}};
-  for (const auto& [place, value] : set) avc[place] = value;
+  const OMX_U32 mode = patternRecord<108>(1)[21];
+  const OMX_U32 profile = OMX_VIDEO_AVCProfileMain;
+  const OMX_U32 level = OMX_VIDEO_AVCLevel31;
+  const Words avc{108,     kVersion, 1, 0, 60, 0,    1, 2,    0, 0, 0, 0, 0, 0,
+                  profile, level,    3, 1, 0,  0xC8, 0, mode, 0, 0, 0, 0, 0};
   EXPECT_EQ(words(calls[9].record), avc);
   EXPECT_EQ(words(calls[11].record), (Words{24, kVersion, 1, OMX_VIDEO_AVCProfileMain, OMX_VIDEO_AVCLevel31,
                                             patternRecord<24>(1)[5]}));
   EXPECT_EQ(words(calls[13].record), (Words{20, kVersion, 1, OMX_Video_ControlRateVariable, 500000}));
   EXPECT_EQ(calls[14].enable, OMX_FALSE);
 
-  rig.server.encoder().setFormats(1, {{OMX_VIDEO_CodingH263, OMX_COLOR_FormatUnused}});
-  EXPECT_EQ(rig.create(), -1);
-  EXPECT_EQ(rig.settingCalls().size(), 4U);  // up to the list's end
+  script().setFormats(1, {{OMX_VIDEO_CodingH263, OMX_COLOR_FormatUnused}});
+  EXPECT_EQ(createEncoder(), -1);
+  EXPECT_EQ(settingCalls().size(), 4U);  // up to the list's end
 }
 
-TEST(TiWrapper, ComputesOnSignedWordsAndMapsProfilesAndRates) {
-  EncoderRig rig("omap4");
+TEST_F(TiWrapper, ComputesOnSignedWordsAndMapsProfilesAndRates) {
   for (const auto& [profile, word] : {std::pair(66, 1u), std::pair(100, 8u), std::pair(88, 0u)}) {
     webrtc::VideoCodec codec = settings();
     codec.codecSpecific.H264.profile = profile;
     codec.maxFramerate = 1;
-    ASSERT_EQ(rig.create(), 0);
-    rig.server.omx().clearCalls();
-    EXPECT_EQ(rig.session->configureEncoder(&codec), 0);
+    ASSERT_EQ(createEncoder(), 0);
+    omx().clearCalls();
+    EXPECT_EQ(encoder().configureEncoder(&codec), 0);
     EXPECT_EQ(codec.maxFramerate, 2u);  // in the caller's record
-    const std::vector<Call> calls = rig.settingCalls();
+    const std::vector<Call> calls = settingCalls();
     EXPECT_EQ(calls[5].as<Definition>()->format.video.xFramerate, 2u << 16);
     EXPECT_EQ(words(calls[9].record)[14], word);
     EXPECT_EQ(words(calls[11].record)[3], word);
@@ -222,21 +214,18 @@ TEST(TiWrapper, ComputesOnSignedWordsAndMapsProfilesAndRates) {
     webrtc::VideoCodec codec = settings();
     codec.width = width;
     codec.height = height;
-    rig.server.omx().clearCalls();
-    static_cast<void>(rig.session->configureEncoder(&codec));  // the component may refuse such a size
-    const auto definition = rig.settingCalls().at(5).as<Definition>();
+    omx().clearCalls();
+    static_cast<void>(encoder().configureEncoder(&codec));  // the component may refuse such a size
+    const auto definition = settingCalls().at(5).as<Definition>();
     EXPECT_EQ(definition->nBufferSize, bytes);
     EXPECT_EQ(definition->format.video.nStride, stride);
   }
 }
 
-TEST(TiWrapper, ChoosesTheDecodersOwnOutputLayout) {
-  ScriptedMediaServer server("omap4");
-  server.decoder().editPort(0, [](Definition& definition) { definition.nBufferCountActual = 9; });
-  OmxInterfaceDecoder* session = nullptr;
-  ASSERT_EQ(OmxInterfaceDecoder::Create(&session, nullptr), 0);
-  const std::unique_ptr<OmxInterfaceDecoder> owner(session);
-  const std::vector<Call> calls = server.omx().calls();  // behind those that found the component
+TEST_F(TiWrapper, ChoosesTheDecodersOwnOutputLayout) {
+  _server.decoder().editPort(0, [](Definition& definition) { definition.nBufferCountActual = 9; });
+  ASSERT_EQ(createDecoder(), 0);
+  const std::vector<Call> calls = omx().calls();  // behind those that found the component
   ASSERT_EQ(calls.size(), 9U);
   EXPECT_EQ(calls[4].record, calls[3].record) << "the second format of the list is the one looked for";
   EXPECT_EQ(calls[4].as<OMX_VIDEO_PARAM_PORTFORMATTYPE>()->eColorFormat, kTiSemiPlanar);
@@ -248,8 +237,8 @@ TEST(TiWrapper, ChoosesTheDecodersOwnOutputLayout) {
               definition.format.video.eCompressionFormat = OMX_VIDEO_CodingUnused;
               definition.format.video.eColorFormat = kTiSemiPlanar;
             }));
-  EXPECT_EQ(session->setInputPackingFormat(1), 0);  // without a call
-  EXPECT_EQ(server.omx().count(), 9U);
+  EXPECT_EQ(decoder().setInputPackingFormat(1), 0);  // without a call
+  EXPECT_EQ(omx().count(), 9U);
 }
 
 struct Item {
@@ -282,32 +271,31 @@ const std::vector<Item> kTiItems = {
     {CONFIG_ROTATION, 270, 0x0700000B, {16, kVersion, 1, 270}},
 };
 
-class RuntimeItems : public ::testing::TestWithParam<const char*> {};
+using RuntimeItems = EitherWrapper;
 
 TEST_P(RuntimeItems, AreOneRecordEach) {
-  EncoderRig rig(GetParam());
-  ASSERT_EQ(rig.create(), 0);
+  ASSERT_EQ(createEncoder(), 0);
   const bool isTi = GetParam() == std::string("omap4");
   for (const Item& item : isTi ? kTiItems : kQcomItems) {
     SCOPED_TRACE(testing::Message() << "item " << item.type << " value " << item.value);
-    rig.server.omx().clearCalls();
-    EXPECT_EQ(rig.session->setConfig(item.type, item.value), 0);
-    EXPECT_EQ(logLines(rig.log), LogLines());
-    const std::vector<Call> calls = rig.server.omx().calls();
+    omx().clearCalls();
+    EXPECT_EQ(encoder().setConfig(item.type, item.value), 0);
+    EXPECT_EQ(log(), LogLines());
+    const std::vector<Call> calls = omx().calls();
     ASSERT_EQ(calls.size(), 1U);
     EXPECT_EQ(calls[0].method, Method::SetConfig);
     EXPECT_EQ(static_cast<OMX_U32>(calls[0].index), item.index);
     EXPECT_EQ(words(calls[0].record), item.record);
   }
-  rig.server.omx().clearCalls();
+  omx().clearCalls();
   for (const int type : {5, 6, 0x7FFFFFFF}) {
-    EXPECT_EQ(rig.session->setConfig(static_cast<CONFIGTYPE>(type), 1), OMXI_ERR_SET_CONFIG);
+    EXPECT_EQ(encoder().setConfig(static_cast<CONFIGTYPE>(type), 1), OMXI_ERR_SET_CONFIG);
   }
   if (isTi) {
-    EXPECT_EQ(rig.session->setConfig(CONFIG_INTRA_PERIOD, 30), 0);  // without a call
-    EXPECT_EQ(rig.server.omx().count(), 0U);
+    EXPECT_EQ(encoder().setConfig(CONFIG_INTRA_PERIOD, 30), 0);  // without a call
+    EXPECT_EQ(omx().count(), 0U);
   }
-  EXPECT_EQ(logLines(rig.log), LogLines());
+  EXPECT_EQ(log(), LogLines());
 }
 
 INSTANTIATE_TEST_SUITE_P(Vendors, RuntimeItems, ::testing::Values("msm8960", "omap4"));
