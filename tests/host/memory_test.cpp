@@ -21,14 +21,10 @@ size_t pageSize() {
 }
 
 TEST(MemoryDealer, KeepsBlocksApartAlsoWhereTheyAreGivenBackTwice) {
-  struct Held {
-    sp<IMemory> memory;
-    uint8_t mark;
-  };
   std::mt19937 random(1);
   const sp<MemoryDealer> dealer = new MemoryDealer(100 * 1000);
   const size_t all = dealer->getMemoryHeap()->getSize();
-  std::vector<Held> held;
+  std::vector<std::pair<sp<IMemory>, uint8_t>> held;  // with what is written into them
   std::vector<sp<IMemory>> givenBack;
   int refused = 0;
   for (int step = 0; step < 10000; ++step) {
@@ -41,7 +37,7 @@ TEST(MemoryDealer, KeepsBlocksApartAlsoWhereTheyAreGivenBackTwice) {
       }
       ASSERT_TRUE(memory->size() == bytes && memory->offset() % 32 == 0);
       held.push_back({memory, static_cast<uint8_t>(random())});
-      memset(memory->pointer(), held.back().mark, bytes);
+      memset(memory->pointer(), held.back().second, bytes);
     } else if (!held.empty()) {
       std::swap(held[random() % held.size()], held.back());
       const auto [memory, mark] = held.back();

@@ -8,7 +8,7 @@
 #define EXPECT_IN_NEW_PROCESS(piece, matcher)                  \
   do {                                                         \
     GTEST_FLAG_SET(death_test_style, "threadsafe");            \
-    const auto run = [] {                                      \
+    const auto run = [&] {                                     \
       piece();                                                 \
       exit(::testing::Test::HasFailure() ? 1 : 0);             \
     };                                                         \

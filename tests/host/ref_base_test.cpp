@@ -29,7 +29,7 @@ class Interface : public virtual RefBase {
 
 class Object : public Interface {
  public:
-  explicit Object(Life* life = nullptr) : _life(life) {}
+  explicit Object(Life* life) : _life(life) {}
 
   int value() const override { return 42; }
 
@@ -39,16 +39,13 @@ class Object : public Interface {
  protected:
   ~Object() override {
     if (atDestruction) atDestruction();
-    if (_life != nullptr) ++_life->destroyed;
+    ++_life->destroyed;
   }
   void onFirstRef() override {
-    if (_life == nullptr) return;
     ++_life->firstRefs;
     const sp<Object> passedAround(this);  // what onFirstRef() is for
   }
-  void onLastStrongRef(const void* /*id*/) override {
-    if (_life != nullptr) ++_life->lastRefs;
-  }
+  void onLastStrongRef(const void* /*id*/) override { ++_life->lastRefs; }
 
  private:
   Life* const _life;
