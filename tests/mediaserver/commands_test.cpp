@@ -37,9 +37,8 @@ TEST_F(Commands, EveryPairOfStatesIsLegalOrRefused) {
       EXPECT_EQ(node->state(), expected == 's' || expected == '-' ? kStates[from] : kStates[to]);
       if (expected != 'i') continue;
       PortDefinition record{};
-      const auto index = OMX_IndexParamPortDefinition;
       EXPECT_EQ(node->command(OMX_CommandStateSet, OMX_StateLoaded), kUnknownError);
-      EXPECT_EQ(server->getParameter(node->node(), index, &record, sizeof(record)), kUnknownError);
+      EXPECT_EQ(node->get(OMX_IndexParamPortDefinition, &record), kUnknownError);
       node->freeBuffers(kInputPort);
     }
   }
@@ -75,21 +74,15 @@ TEST_F(Commands, FlushAndIdleReturnWhatThePortsHoldBeforeTheyComplete) {
     OMX_COMMANDTYPE command;
     OMX_U32 param;
     bool paused;
-    Words heard;
+    const char* heard;
   } cases[] = {
-      {OMX_CommandFlush, kInputPort, false, {"emptied", "emptied", "complete flush 0"}},
-      {OMX_CommandFlush, kOutputPort, false, {"filled", "filled", "complete flush 1"}},
-      {OMX_CommandFlush,
-       OMX_ALL,
-       false,
-       {"emptied", "emptied", "complete flush 0", "filled", "filled", "complete flush 1"}},
-      {OMX_CommandStateSet,
-       OMX_StateIdle,
-       true,
-       {"emptied", "emptied", "filled", "filled", "complete state 2"}},
+      {OMX_CommandFlush, kInputPort, false, " emptied emptied complete flush 0"},
+      {OMX_CommandFlush, kOutputPort, false, " filled filled complete flush 1"},
+      {OMX_CommandFlush, OMX_ALL, false, " emptied emptied complete flush 0 filled filled complete flush 1"},
+      {OMX_CommandStateSet, OMX_StateIdle, true, " emptied emptied filled filled complete state 2"},
   };
   for (const auto& test : cases) {
-    SCOPED_TRACE(test.heard.back());
+    SCOPED_TRACE(test.heard);
     decoder.holdInput();
     const auto node = running();
     if (test.paused) node->complete(OMX_CommandStateSet, OMX_StatePause);
@@ -98,13 +91,15 @@ TEST_F(Commands, FlushAndIdleReturnWhatThePortsHoldBeforeTheyComplete) {
     node->empty(1, "b");
     EXPECT_EQ(node->command(test.command, test.param), android::OK);
     node->expect(commandComplete(test.command), test.param == OMX_ALL ? 2 : 1);
-    EXPECT_EQ(node->heard(), test.heard);
+    std::string heard;
+    for (const std::string& each : node->heard()) heard += " " + each;
+    EXPECT_EQ(heard, test.heard);
     for (const Packet& output : node->outputs()) EXPECT_TRUE(output.bytes.empty());
     // What came back can be sent again.
     if (test.paused) node->complete(OMX_CommandStateSet, OMX_StateExecuting);
     EXPECT_EQ(node->empty(0, "c"), okIf(test.paused || test.param != kOutputPort));
     EXPECT_EQ(node->fill(0), okIf(test.paused || test.param != kInputPort));
-    EXPECT_EQ(decoder.inputCount(), 0u);
+    EXPECT_TRUE(decoder.inputs().empty());
   }
 }
 

@@ -103,9 +103,15 @@ TEST_F(Lifetime, NodesGoWithTheClientThatLetsGoOfItsObserver) {
   for (const bool inDelivery : {false, true}) {
     android::sp<SlowObserver> observer = new SlowObserver;
     NodeId nodes[2] = {};
+    BufferId buffer = nullptr;
+    void* data = nullptr;
     for (NodeId& node : nodes) {
       ASSERT_EQ(server->allocateNode(kDecoder, observer, &node), android::OK);
-      execute(node);
+      server->sendCommand(node, OMX_CommandStateSet, OMX_StateIdle);
+      for (OMX_U32 i = 0; i < 4; ++i) {
+        EXPECT_EQ(server->allocateBuffer(node, i % kPortCount, 64, &buffer, &data), android::OK);
+      }
+      server->sendCommand(node, OMX_CommandStateSet, OMX_StateExecuting);
     }
     ASSERT_TRUE(eventually([&] { return observer->begun == 2; }));
     if (!inDelivery) {

@@ -5,8 +5,6 @@
 
 #include <memory>
 
-#include <media/stagefright/MediaErrors.h>
-
 #include "host/mediaserver/omx_server.h"
 #include "tests/support/omx_client.h"
 #include "tests/support/script.h"
@@ -21,17 +19,13 @@ using Words = std::vector<std::string>;
 
 inline constexpr const char* kDecoder = "decoder";
 inline constexpr const char* kEncoder = "encoder";
-inline constexpr auto kUnknownError = static_cast<android::status_t>(android::UNKNOWN_ERROR);
-inline constexpr auto kUnsupported = static_cast<android::status_t>(android::ERROR_UNSUPPORTED);
 
 inline android::status_t okIf(bool expected) {
-  return expected ? android::status_t{android::OK} : kUnknownError;
+  return expected ? kOk : kUnknownError;
 }
 
 inline Match errorIs(OMX_ERRORTYPE code) {
-  return [=](const android::omx_message& message) {
-    return eventIs(OMX_EventError)(message) && message.u.event_data.data1 == static_cast<OMX_U32>(code);
-  };
+  return eventIs(OMX_EventError, static_cast<OMX_U32>(code));
 }
 
 class NodeTest : public ::testing::Test {
@@ -73,18 +67,6 @@ class NodeTest : public ::testing::Test {
     if (state != OMX_StateLoaded && state != OMX_StateWaitForResources) node->toIdle();
     if (state != OMX_StateLoaded && state != OMX_StateIdle) node->complete(OMX_CommandStateSet, state);
     node->messages().clear();
-  }
-
-  // The same for a node that a test has allocated by itself. Its buffers, input and output in turns.
-  std::vector<android::IOMX::buffer_id> execute(android::IOMX::node_id node) {
-    std::vector<android::IOMX::buffer_id> ids(2 * kPortCount);
-    void* data = nullptr;
-    server->sendCommand(node, OMX_CommandStateSet, OMX_StateIdle);
-    for (OMX_U32 i = 0; i < 2 * kPortCount; ++i) {
-      EXPECT_EQ(server->allocateBuffer(node, i % kPortCount, 64, &ids[i], &data), android::OK);
-    }
-    server->sendCommand(node, OMX_CommandStateSet, OMX_StateExecuting);
-    return ids;
   }
 
   // Returns when everything that the node was told before has been carried out and heard, as far as it

@@ -67,7 +67,7 @@ TEST_F(SettingsChange, GoesThroughDisableAndEnableAndLosesNoPicture) {
     node->expect(fillBufferDone(), 2);
     EXPECT_EQ(node->outputs()[0].text(), std::string(64, 'L'));
     EXPECT_EQ(node->outputs()[1].text(), "second");
-    EXPECT_EQ(decoder.configured()->at(kOutputPort).nBufferCountActual, 3u);
+    EXPECT_EQ(decoder.configured().at(kOutputPort).nBufferCountActual, 3u);
     sendBackAll(node.get());
   }
 }

@@ -4,7 +4,7 @@
 // any number of nodes; each client's messages are delivered on a thread of its own, one at a time, and
 // never from inside a call of the test.
 // All functions may be called from any thread, also from a delivery. Matches and filters run on the nodes'
-// threads and must not call the tap.
+// threads and must not call the tap. It outlives its nodes.
 
 #include <chrono>
 #include <condition_variable>
@@ -13,11 +13,11 @@
 #include <list>
 #include <map>
 #include <mutex>
-#include <vector>
+#include <optional>
 
 #include <media/IOMX.h>
 
-#include "tests/support/eventually.h"
+#include "tests/support/journal.h"
 
 namespace omxtest {
 
@@ -25,14 +25,14 @@ enum class Fate { Pass, Hold, Drop, Repeat };  // Repeat: delivered twice
 
 // May change the message.
 using Filter = std::function<Fate(android::omx_message&)>;
-using Match = std::function<bool(const android::omx_message&)>;
+using Messages = Journal<android::omx_message>;
+using Match = Messages::Match;
 
-// Matches for the usual kinds of messages.
+// Matches for the usual kinds of messages. Words that are not given may be any.
 Match anyMessage();
 Match anyEvent();
-Match eventIs(OMX_EVENTTYPE event);
-Match commandComplete(OMX_COMMANDTYPE command);
-Match commandComplete(OMX_COMMANDTYPE command, OMX_U32 data);
+Match eventIs(OMX_EVENTTYPE event, std::optional<OMX_U32> data1 = {}, std::optional<OMX_U32> data2 = {});
+Match commandComplete(OMX_COMMANDTYPE command, std::optional<OMX_U32> data = {});
 Match emptyBufferDone();
 Match fillBufferDone();
 
@@ -50,18 +50,15 @@ class MessageTap {
   MessageTap(const MessageTap&) = delete;
   MessageTap& operator=(const MessageTap&) = delete;
 
-  // From now on messages that match are kept.
-  void hold(Match match);
-  // Decides about every other one. Null: all pass.
+  // From now on messages that match are kept, and others treated as before.
+  void hold(const Match& match);
+  // Decides about every message from now on. Null: all pass. What is held stays held.
   void setFilter(Filter filter);
-  // All messages pass again; what is held stays held.
-  void passAll();
+  void passAll() { setFilter(nullptr); }
 
-  // Held messages, oldest first.
-  std::vector<android::omx_message> held() const;
   [[nodiscard]] bool waitForHeld(size_t count, std::chrono::milliseconds limit = kWaitLimit) const;
-  // Delivers the held message at `position` (so reordering is a choice of positions); false if there is
-  // none. Also when its node has been freed: that is a late message.
+  // Delivers the held message at `position`, counted from the oldest (so reordering is a choice of
+  // positions); false if there is none. Also when its node has been freed: that is a late message.
   bool release(size_t position = 0);
   void releaseAll() {
     while (release()) {
@@ -74,8 +71,10 @@ class MessageTap {
   bool forge(NodeId node, const android::omx_message& message);
 
   // Messages that clients have handled, that is: their function has returned.
-  size_t deliveredCount(const Match& match) const;
-  [[nodiscard]] bool waitForDelivered(const Match& match, size_t count = 1) const;
+  size_t deliveredCount(const Match& match) const { return _delivered.count(match); }
+  [[nodiscard]] bool waitForDelivered(const Match& match, size_t count = 1) const {
+    return _delivered.waitFor(match, count);
+  }
 
   // Lets go of the clients of freed nodes, and of messages held for them.
   void forgetFreedNodes();
@@ -91,25 +90,20 @@ class MessageTap {
 
  private:
   class Observer;
-  class Delivery;
-  struct Link;
   struct Held {
     android::sp<Observer> observer;
     android::omx_message message;
   };
 
   void onMessage(const android::sp<Observer>& observer, android::omx_message message);
-  size_t countDelivered(const Match& match) const;  // with the lock held
-  void noteDelivered(const android::omx_message& message);
+  android::sp<Observer> find(NodeId node) const;
 
+  Messages _delivered;
   mutable std::mutex _mutex;  // guards everything below; never held while a client is called
   mutable std::condition_variable _changed;
-  std::vector<Match> _holds;
   Filter _filter;
   std::list<Held> _held;
-  std::vector<android::omx_message> _delivered;
-  std::map<NodeId, android::sp<Observer>> _live;
-  std::map<NodeId, android::sp<Observer>> _freed;
+  std::map<NodeId, android::sp<Observer>> _observers;
 };
 
 }  // namespace omxtest

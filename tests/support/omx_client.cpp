@@ -1,7 +1,5 @@
 #include "tests/support/omx_client.h"
 
-#include <gtest/gtest.h>
-
 #include <algorithm>
 
 #include <utils/String8.h>
@@ -10,38 +8,11 @@ namespace omxtest {
 
 using android::omx_message;
 using android::status_t;
+using android::String8;
 using mediaserver::kInputPort;
 using mediaserver::kOutputPort;
 using mediaserver::kPortCount;
 using mediaserver::PortDefinition;
-
-void CollectingObserver::onMessage(const omx_message& message) {
-  std::lock_guard<std::mutex> lock(_mutex);
-  _messages.push_back(message);
-  _changed.notify_all();
-}
-
-std::vector<omx_message> CollectingObserver::all() const {
-  std::lock_guard<std::mutex> lock(_mutex);
-  return _messages;
-}
-
-size_t CollectingObserver::count(const Match& match) const {
-  std::lock_guard<std::mutex> lock(_mutex);
-  return static_cast<size_t>(std::count_if(_messages.begin(), _messages.end(), match));
-}
-
-bool CollectingObserver::waitFor(const Match& match, size_t count, std::chrono::milliseconds limit) const {
-  std::unique_lock<std::mutex> lock(_mutex);
-  return _changed.wait_for(lock, limit, [&] {
-    return static_cast<size_t>(std::count_if(_messages.begin(), _messages.end(), match)) >= count;
-  });
-}
-
-void CollectingObserver::clear() {
-  std::lock_guard<std::mutex> lock(_mutex);
-  _messages.clear();
-}
 
 std::string describe(const omx_message& message) {
   static constexpr const char* kCommands[] = {"state", "flush", "disable", "enable", "mark"};
@@ -49,20 +20,14 @@ std::string describe(const omx_message& message) {
   if (message.type == omx_message::FILL_BUFFER_DONE) return "filled";
   if (message.type != omx_message::EVENT) return "unknown";
   const auto& data = message.u.event_data;
-  switch (data.event) {
-    case OMX_EventCmdComplete:
-      if (data.data1 >= std::size(kCommands)) break;
-      return android::String8::format("complete %s %u", kCommands[data.data1], data.data2).string();
-    case OMX_EventError:
-      return android::String8::format("error 0x%x", data.data1).string();
-    case OMX_EventPortSettingsChanged:
-      return android::String8::format("settings %u 0x%x", data.data1, data.data2).string();
-    case OMX_EventBufferFlag:
-      return android::String8::format("flag %u 0x%x", data.data1, data.data2).string();
-    default:
-      break;
-  }
-  return android::String8::format("event %u %u %u", static_cast<unsigned>(data.event), data.data1, data.data2)
+  if (data.event == OMX_EventCmdComplete && data.data1 < std::size(kCommands))
+    return String8::format("complete %s %u", kCommands[data.data1], data.data2).string();
+  if (data.event == OMX_EventError) return String8::format("error 0x%x", data.data1).string();
+  if (data.event == OMX_EventPortSettingsChanged)
+    return String8::format("settings %u 0x%x", data.data1, data.data2).string();
+  if (data.event == OMX_EventBufferFlag)
+    return String8::format("flag %u 0x%x", data.data1, data.data2).string();
+  return String8::format("event %u %u %u", static_cast<unsigned>(data.event), data.data1, data.data2)
       .string();
 }
 
@@ -73,10 +38,6 @@ OmxClient::OmxClient(const android::sp<android::IOMX>& omx, const char* componen
 
 OmxClient::~OmxClient() {
   free();
-}
-
-status_t OmxClient::command(OMX_COMMANDTYPE command, OMX_U32 param) {
-  return _omx->sendCommand(_node, command, static_cast<OMX_S32>(param));
 }
 
 status_t OmxClient::free() {
@@ -93,46 +54,37 @@ OMX_STATETYPE OmxClient::state() const {
 }
 
 PortDefinition OmxClient::definition(OMX_U32 port) const {
-  PortDefinition definition{};
-  definition.nSize = sizeof(definition);
-  definition.nVersion.s.nVersionMajor = 1;
-  definition.nVersion.s.nVersionMinor = 1;
-  definition.nPortIndex = port;
-  EXPECT_EQ(_omx->getParameter(_node, OMX_IndexParamPortDefinition, &definition, sizeof(definition)),
-            android::OK);
+  auto definition = makeRecord<PortDefinition>(port);
+  EXPECT_EQ(get(OMX_IndexParamPortDefinition, &definition), kOk);
   return definition;
 }
 
 status_t OmxClient::define(OMX_U32 port, const PortDefinition& definition) {
   PortDefinition record = definition;
   record.nPortIndex = port;
-  return _omx->setParameter(_node, OMX_IndexParamPortDefinition, &record, sizeof(record));
-}
-
-OmxClient::Buffer OmxClient::allocate(OMX_U32 port, size_t size, status_t* status) {
-  Buffer buffer;
-  buffer.size = size;
-  if (_giving[port] == Giving::Allocate) {
-    void* data = nullptr;
-    *status = _omx->allocateBuffer(_node, port, size, &buffer.id, &data);
-    buffer.data = static_cast<uint8_t*>(data);
-    return buffer;
-  }
-  // The block keeps its dealer alive.
-  const android::sp<android::MemoryDealer> dealer = new android::MemoryDealer(size, "OmxClient");
-  buffer.block = dealer->allocate(size);
-  buffer.data = static_cast<uint8_t*>(buffer.block->pointer());
-  *status = _giving[port] == Giving::Use
-                ? _omx->useBuffer(_node, port, buffer.block, &buffer.id)
-                : _omx->allocateBufferWithBackup(_node, port, buffer.block, &buffer.id);
-  return buffer;
+  return set(OMX_IndexParamPortDefinition, record);
 }
 
 status_t OmxClient::give(OMX_U32 port, size_t size) {
-  status_t status = android::OK;
-  const Buffer buffer = allocate(port, size != 0 ? size : definition(port).nBufferSize, &status);
-  if (status == android::OK) _buffers[port].push_back(buffer);
-  return status;
+  Buffer buffer;
+  buffer.size = size != 0 ? size : definition(port).nBufferSize;
+  void* data = nullptr;
+  status_t status = kOk;
+  if (_giving[port] == Giving::Allocate) {
+    status = _omx->allocateBuffer(_node, port, buffer.size, &buffer.id, &data);
+  } else {
+    // The block keeps its dealer alive.
+    buffer.block = (new android::MemoryDealer(buffer.size, "OmxClient"))->allocate(buffer.size);
+    data = buffer.block->pointer();
+    status = _giving[port] == Giving::Use
+                 ? _omx->useBuffer(_node, port, buffer.block, &buffer.id)
+                 : _omx->allocateBufferWithBackup(_node, port, buffer.block, &buffer.id);
+  }
+  if (status != kOk) return status;
+  buffer.data = static_cast<uint8_t*>(data);
+  _buffers[port].push_back(buffer);
+  _given[buffer.id] = buffer;
+  return kOk;
 }
 
 void OmxClient::populate(OMX_U32 port) {
@@ -144,18 +96,12 @@ void OmxClient::populate(OMX_U32 port) {
 status_t OmxClient::freeBuffer(OMX_U32 port, size_t which) {
   std::vector<Buffer>& buffers = _buffers[port];
   const status_t status = _omx->freeBuffer(_node, port, buffers.at(which).id);
-  _retired.push_back(buffers[which]);
   buffers.erase(buffers.begin() + static_cast<ptrdiff_t>(which));
   return status;
 }
 
 void OmxClient::freeBuffers(OMX_U32 port) {
   while (!_buffers[port].empty()) EXPECT_EQ(freeBuffer(port), android::OK);
-}
-
-void OmxClient::complete(OMX_COMMANDTYPE kind, OMX_U32 param) {
-  EXPECT_EQ(command(kind, param), android::OK);
-  expectComplete(kind, param);
 }
 
 void OmxClient::toIdle() {
@@ -170,16 +116,6 @@ void OmxClient::toExecuting() {
   messages().clear();
 }
 
-void OmxClient::idleToLoaded() {
-  EXPECT_EQ(command(OMX_CommandStateSet, OMX_StateLoaded), android::OK);
-  for (OMX_U32 port = 0; port < kPortCount; ++port) freeBuffers(port);
-  expectComplete(OMX_CommandStateSet, OMX_StateLoaded);
-}
-
-status_t OmxClient::fill(size_t which) {
-  return _omx->fillBuffer(_node, _buffers[kOutputPort].at(which).id);
-}
-
 void OmxClient::fillAll() {
   for (size_t i = 0; i < _buffers[kOutputPort].size(); ++i) EXPECT_EQ(fill(i), android::OK);
 }
@@ -191,35 +127,32 @@ status_t OmxClient::empty(size_t which, std::string_view text, OMX_U32 flags, OM
 }
 
 void OmxClient::expect(const Match& match, size_t count) {
-  EXPECT_TRUE(_observer->waitFor(match, count))
+  EXPECT_TRUE(_observer->messages.waitFor(match, count))
       << "heard " << ::testing::PrintToString(heard()) << " and waited for " << count;
+}
+
+Packet OmxClient::output(const omx_message& filled) const {
+  const auto& data = filled.u.extended_buffer_data;
+  const uint8_t* const begin = _given.at(data.buffer).data + data.range_offset;
+  Packet packet;
+  packet.bytes.assign(begin, begin + data.range_length);
+  packet.timestamp = data.timestamp;
+  packet.flags = data.flags;
+  packet.offset = data.range_offset;
+  return packet;
 }
 
 std::vector<Packet> OmxClient::outputs() const {
   std::vector<Packet> packets;
-  for (const omx_message& message : _observer->all()) {
-    if (message.type != omx_message::FILL_BUFFER_DONE) continue;
-    const auto& data = message.u.extended_buffer_data;
-    Packet packet;
-    packet.timestamp = data.timestamp;
-    packet.flags = data.flags;
-    packet.offset = data.range_offset;
-    const auto holds = [&](const Buffer& buffer) { return buffer.id == data.buffer; };
-    for (const std::vector<Buffer>* list : {&_buffers[kOutputPort], &_retired}) {
-      const auto buffer = std::find_if(list->begin(), list->end(), holds);
-      if (buffer == list->end()) continue;
-      const uint8_t* const begin = buffer->data + data.range_offset;
-      if (buffer->data != nullptr) packet.bytes.assign(begin, begin + data.range_length);
-      break;
-    }
-    packets.push_back(std::move(packet));
+  for (const omx_message& message : _observer->messages.all()) {
+    if (message.type == omx_message::FILL_BUFFER_DONE) packets.push_back(output(message));
   }
   return packets;
 }
 
 std::vector<std::string> OmxClient::heard() const {
   std::vector<std::string> words;
-  for (const omx_message& message : _observer->all()) words.push_back(describe(message));
+  for (const omx_message& message : _observer->messages.all()) words.push_back(describe(message));
   return words;
 }
 

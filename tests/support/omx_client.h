@@ -3,11 +3,10 @@
 // messages, with verbs for the usual steps. Steps that wait have a limit and report a failure of the test
 // when it passes. Used by one thread; messages arrive on the server's.
 
-#include <chrono>
-#include <condition_variable>
+#include <gtest/gtest.h>
+
 #include <cstddef>
-#include <memory>
-#include <mutex>
+#include <map>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -15,29 +14,24 @@
 #include <OMX_Component.h>
 #include <binder/MemoryDealer.h>
 #include <media/IOMX.h>
+#include <media/stagefright/MediaErrors.h>
 
 #include "host/mediaserver/codec.h"
+#include "tests/support/call.h"
 #include "tests/support/message_tap.h"
-#include "tests/support/packet.h"
-#include "tests/support/script.h"
 
 namespace omxtest {
+
+inline constexpr auto kOk = static_cast<android::status_t>(android::OK);
+inline constexpr auto kUnknownError = static_cast<android::status_t>(android::UNKNOWN_ERROR);
+inline constexpr auto kUnsupported = static_cast<android::status_t>(android::ERROR_UNSUPPORTED);
 
 // Collects a node's messages in order.
 class CollectingObserver : public android::BnOMXObserver {
  public:
-  void onMessage(const android::omx_message& message) override;
+  void onMessage(const android::omx_message& message) override { messages.add(message); }
 
-  std::vector<android::omx_message> all() const;
-  size_t count(const Match& match) const;
-  [[nodiscard]] bool waitFor(const Match& match, size_t count = 1,
-                             std::chrono::milliseconds limit = kWaitLimit) const;
-  void clear();
-
- private:
-  mutable std::mutex _mutex;
-  mutable std::condition_variable _changed;
-  std::vector<android::omx_message> _messages;
+  Messages messages;
 };
 
 // A message in a few words: "complete state 2", "complete disable 1", "error 0x80001012", "settings 1 0",
@@ -45,6 +39,16 @@ class CollectingObserver : public android::BnOMXObserver {
 std::string describe(const android::omx_message& message);
 
 enum class Giving { Use, Backup, Allocate };
+
+template <typename Record>
+Record makeRecord(OMX_U32 port) {
+  Record record{};
+  record.nSize = sizeof(record);
+  record.nVersion.s.nVersionMajor = 1;
+  record.nVersion.s.nVersionMinor = 1;
+  record.nPortIndex = port;
+  return record;
+}
 
 class OmxClient {
  public:
@@ -62,16 +66,33 @@ class OmxClient {
   OmxClient(const OmxClient&) = delete;
   OmxClient& operator=(const OmxClient&) = delete;
 
-  const android::sp<android::IOMX>& omx() const { return _omx; }
   android::IOMX::node_id node() const { return _node; }
-  CollectingObserver& messages() { return *_observer; }
+  Messages& messages() { return _observer->messages; }
 
   // Statuses of the calls themselves.
-  android::status_t command(OMX_COMMANDTYPE command, OMX_U32 param);
+  android::status_t command(OMX_COMMANDTYPE command, OMX_U32 param) {
+    return _omx->sendCommand(_node, command, static_cast<OMX_S32>(param));
+  }
   android::status_t free();  // freeNode; the destructor then leaves it
   OMX_STATETYPE state() const;
   mediaserver::PortDefinition definition(OMX_U32 port) const;
   android::status_t define(OMX_U32 port, const mediaserver::PortDefinition& definition);
+  template <typename Record>
+  android::status_t get(OMX_INDEXTYPE index, Record* record) const {
+    return _omx->getParameter(_node, index, record, sizeof(*record));
+  }
+  template <typename Record>
+  android::status_t set(OMX_INDEXTYPE index, const Record& record) {
+    return _omx->setParameter(_node, index, &record, sizeof(record));
+  }
+  template <typename Record>
+  android::status_t getConfig(OMX_INDEXTYPE index, Record* record) {
+    return _omx->getConfig(_node, index, record, sizeof(*record));
+  }
+  template <typename Record>
+  android::status_t setConfig(OMX_INDEXTYPE index, const Record& record) {
+    return _omx->setConfig(_node, index, &record, sizeof(record));
+  }
 
   // How buffers of a port are given; default Use.
   void setGiving(OMX_U32 port, Giving giving) { _giving[port] = giving; }
@@ -83,13 +104,13 @@ class OmxClient {
   void freeBuffers(OMX_U32 port);
   const std::vector<Buffer>& buffers(OMX_U32 port) const { return _buffers[port]; }
 
-  // The whole way to a state through the states between, with buffers given and freed where that is due.
+  // The whole way to a state through the states between, with buffers given.
   void toIdle();
   void toExecuting();
-  void executingToIdle() { complete(OMX_CommandStateSet, OMX_StateIdle); }
-  void idleToLoaded();
 
-  android::status_t fill(size_t which);
+  android::status_t fill(size_t which) {
+    return _omx->fillBuffer(_node, _buffers[mediaserver::kOutputPort].at(which).id);
+  }
   void fillAll();
   android::status_t empty(size_t which, std::string_view text, OMX_U32 flags = 0, OMX_TICKS timestamp = 0);
 
@@ -97,21 +118,23 @@ class OmxClient {
   void expect(const Match& match, size_t count = 1);
   void expectComplete(OMX_COMMANDTYPE command, OMX_U32 data) { expect(commandComplete(command, data)); }
   // Sends a command and waits until it is complete.
-  void complete(OMX_COMMANDTYPE command, OMX_U32 param);
-  // The outputs so far, as the client reads them.
+  void complete(OMX_COMMANDTYPE kind, OMX_U32 param) {
+    EXPECT_EQ(command(kind, param), android::OK);
+    expectComplete(kind, param);
+  }
+  // A filled buffer, and the outputs so far, as the client reads them.
+  Packet output(const android::omx_message& filled) const;
   std::vector<Packet> outputs() const;
   // All messages in a few words.
   std::vector<std::string> heard() const;
 
  private:
-  Buffer allocate(OMX_U32 port, size_t size, android::status_t* status);
-
   const android::sp<android::IOMX> _omx;
   const android::sp<CollectingObserver> _observer;
   android::IOMX::node_id _node = nullptr;
   Giving _giving[mediaserver::kPortCount] = {Giving::Use, Giving::Use};
   std::vector<Buffer> _buffers[mediaserver::kPortCount];
-  std::vector<Buffer> _retired;  // freed ones: messages may still name them
+  std::map<BufferId, Buffer> _given;  // also those that were freed: messages may still name them
 };
 
 }  // namespace omxtest

@@ -1,14 +1,20 @@
 #include "tests/support/script.h"
 
-#include <utility>
-
-#include "tests/support/scripted_codec.h"
+#include <algorithm>
+#include <cstring>
+#include <deque>
+#include <variant>
 
 namespace omxtest {
 
+using mediaserver::InputView;
 using mediaserver::kInputPort;
 using mediaserver::kOutputPort;
+using mediaserver::OutputSpace;
 using mediaserver::PortDefinition;
+using mediaserver::PortPair;
+using mediaserver::Received;
+using mediaserver::Sent;
 
 namespace {
 
@@ -38,7 +44,193 @@ PortDefinition defaultPort(bool compressed, OMX_U32 buffers) {
   return port;
 }
 
+constexpr auto kMetaData = static_cast<OMX_INDEXTYPE>(0x7F000F01);
+constexpr size_t kHeaderBytes = 2 * sizeof(OMX_U32);
+constexpr size_t kRecordBytes = kHeaderBytes + sizeof(OMX_U32);  // with the port
+constexpr size_t kDepth = 16;  // outputs that a codec keeps before it takes no more inputs
+
+// Records that are the node's, unless a test answers for it. All others are the codec's.
+bool isStandard(OMX_INDEXTYPE index) {
+  return index == OMX_IndexParamPortDefinition || index == OMX_IndexParamVideoPortFormat ||
+         index == OMX_IndexParamStandardComponentRole || index == OMX_IndexParamCompBufferSupplier;
+}
+
+// The word behind the header, which names the port, or one further on.
+OMX_U32 wordAt(const void* record, size_t size, size_t index) {
+  OMX_U32 word = 0xFFFFFFFF;
+  const size_t offset = kHeaderBytes + index * sizeof(word);
+  if (size >= offset + sizeof(word))
+    std::memcpy(&word, static_cast<const uint8_t*>(record) + offset, sizeof(word));
+  return word;
+}
+
+// A picture's size decides the size of buffers that hold one.
+void fitPicture(PortDefinition* port) {
+  auto& video = port->format.video;
+  if (video.eCompressionFormat != OMX_VIDEO_CodingUnused) return;
+  const OMX_U32 stride = std::max(video.nFrameWidth, static_cast<OMX_U32>(std::max(video.nStride, 0)));
+  video.nStride = static_cast<OMX_S32>(stride);
+  video.nSliceHeight = std::max(video.nSliceHeight, video.nFrameHeight);
+  port->nBufferSize = std::max(port->nBufferSize, stride * video.nSliceHeight * 3 / 2);
+}
+
 }  // namespace
+
+// The codec of a script, which has the lock for both.
+class ScriptedCodec final : public mediaserver::Codec {
+ public:
+  ScriptedCodec(Script& script, mediaserver::CodecHost& host) : _script(script), _host(host) {
+    const Lock lock(_script._mutex);
+    _script._codecs.insert(this);
+  }
+  ~ScriptedCodec() override {
+    const Lock lock(_script._mutex);
+    _script._codecs.erase(this);
+  }
+
+  PortPair ports() const override { return _script.read(_script._ports); }
+  std::vector<mediaserver::VideoFormat> formats(OMX_U32 port) const override {
+    return _script.read(_script._formats).at(port);
+  }
+  // What storeMetaDataInBuffers needs; it takes false and refuses true.
+  std::vector<mediaserver::Extension> extensions() const override {
+    return {{"OMX.google.android.index.storeMetaDataInBuffers", kMetaData}};
+  }
+  OMX_ERRORTYPE definePort(OMX_U32 port, const PortDefinition& wanted, PortPair& ports) override {
+    const Lock lock(_script._mutex);
+    const auto& before = ports[port].format.video;
+    const auto& after = wanted.format.video;
+    const bool resized = before.nFrameWidth != after.nFrameWidth || before.nFrameHeight != after.nFrameHeight;
+    ports[port] = wanted;
+    if (resized && port == kInputPort && !_script._portsAreSeparate) {
+      auto& output = ports[kOutputPort].format.video;
+      output.nFrameWidth = after.nFrameWidth;
+      output.nFrameHeight = after.nFrameHeight;
+      fitPicture(&ports[kOutputPort]);
+    }
+    fitPicture(&ports[port]);
+    return OMX_ErrorNone;
+  }
+  Answer getParameter(OMX_INDEXTYPE index, void* record, size_t size) override {
+    const Lock lock(_script._mutex);
+    const auto answer = _script._answers.find(index);
+    const auto written = _script._records.find(index);
+    const bool answered =
+        answer != _script._answers.end() &&
+        (index != OMX_IndexParamPortDefinition ||
+         wordAt(answer->second.data(), answer->second.size(), 0) == wordAt(record, size, 0));
+    if (!answered && isStandard(index)) return {};
+    if (size < kRecordBytes) return OMX_ErrorBadParameter;
+    const bool isWritten = written != _script._records.end();
+    const auto* const source = answered ? &answer->second : isWritten ? &written->second : nullptr;
+    auto* const bytes = static_cast<uint8_t*>(record);
+    // Unanswered and unwritten: zeros behind the port, which is the client's.
+    for (size_t i = source != nullptr ? kHeaderBytes : kRecordBytes; i < size; ++i) {
+      bytes[i] = source != nullptr && i < source->size() ? (*source)[i] : 0;
+    }
+    return OMX_ErrorNone;
+  }
+  Answer setParameter(OMX_INDEXTYPE index, const void* record, size_t size) override {
+    const Lock lock(_script._mutex);
+    if (isStandard(index)) return {};
+    if (size < kRecordBytes) return OMX_ErrorBadParameter;
+    if (index == kMetaData && wordAt(record, size, 1) != OMX_FALSE) return OMX_ErrorUnsupportedSetting;
+    const auto* const bytes = static_cast<const uint8_t*>(record);
+    _script._records[index].assign(bytes, bytes + size);
+    return OMX_ErrorNone;
+  }
+  Answer getConfig(OMX_INDEXTYPE index, void* record, size_t size) override {
+    return getParameter(index, record, size);
+  }
+  Answer setConfig(OMX_INDEXTYPE index, const void* record, size_t size) override {
+    return setParameter(index, record, size);
+  }
+
+  void configure(const PortPair& ports) override {
+    const Lock lock(_script._mutex);
+    _script._configured = ports;
+  }
+  OMX_ERRORTYPE start() override {
+    const Lock lock(_script._mutex);
+    if (_script._startFailure == OMX_ErrorNone) ++_script._starts;
+    return _script._startFailure;
+  }
+  void stop() override {
+    const Lock lock(_script._mutex);
+    ++_script._stops;
+    _line.clear();
+    _draining = false;
+  }
+  void flush(OMX_U32 port) override {
+    const Lock lock(_script._mutex);
+    if (port == kInputPort) {
+      _draining = false;
+    } else {
+      std::erase_if(_line, [](const Item& item) { return std::holds_alternative<Packet>(item); });
+    }
+  }
+  Sent send(const InputView& input) override {
+    Lock lock(_script._mutex);
+    if (_script._inputBudget == std::optional<size_t>(0) || _line.size() >= kDepth) return Sent::Busy;
+    if (_script._inputBudget.has_value()) --*_script._inputBudget;
+    Packet packet;
+    packet.bytes.assign(input.data, input.data + input.length);
+    packet.timestamp = input.timestamp;
+    packet.flags = input.flags;
+    _draining = false;
+    const Script::Transform transform = _script._transform;
+    lock.unlock();
+    const std::vector<Packet> outputs = transform ? transform(packet) : std::vector<Packet>{packet};
+    lock.lock();
+    _line.insert(_line.end(), outputs.begin(), outputs.end());
+    _script._inputs.add(packet);
+    return Sent::Taken;
+  }
+  void drain(OMX_TICKS /*timestamp*/) override {
+    const Lock lock(_script._mutex);
+    _draining = true;
+  }
+  Received receive(OutputSpace& output) override {
+    const Lock lock(_script._mutex);
+    if (_script._outputHeld) return Received::Nothing;
+    if (_line.empty()) return std::exchange(_draining, false) ? Received::Drained : Received::Nothing;
+    if (std::holds_alternative<Announcement>(_line.front())) return Received::NewGeometry;
+    const Packet packet = std::get<Packet>(std::move(_line.front()));
+    _line.pop_front();
+    const size_t offset = std::min<size_t>(packet.offset, output.capacity);
+    const size_t length = std::min(packet.bytes.size(), output.capacity - offset);
+    if (length > 0) std::memcpy(output.data + offset, packet.bytes.data(), length);
+    output.offset = packet.offset;
+    output.length = packet.lengthToTell.value_or(static_cast<OMX_U32>(length));
+    output.flags = packet.flags;
+    output.timestamp = packet.timestamp;
+    if ((packet.flags & OMX_BUFFERFLAG_EOS) != 0) _draining = false;
+    return Received::Filled;
+  }
+  OMX_U32 geometry(PortDefinition& output) override {
+    Lock lock(_script._mutex);
+    const Announcement announcement = std::get<Announcement>(std::move(_line.front()));
+    _line.pop_front();
+    lock.unlock();
+    announcement.edit(output);
+    return announcement.index;
+  }
+
+ private:
+  friend class Script;
+  using Lock = Script::Lock;
+  // New output settings, as they are to be told.
+  struct Announcement {
+    Script::PortEdit edit;
+    OMX_U32 index;
+  };
+  using Item = std::variant<Packet, Announcement>;
+
+  Script& _script;
+  mediaserver::CodecHost& _host;
+  std::deque<Item> _line;  // outputs and announcements, in order
+  bool _draining = false;
+};
 
 Script::Script(Kind kind) : _kind(kind) {
   const bool decoder = kind == Kind::Decoder;
@@ -59,70 +251,16 @@ mediaserver::Component Script::component(const std::string& name) {
           }};
 }
 
-void Script::editPort(OMX_U32 port, const PortEdit& edit) {
-  const Lock lock(_mutex);
-  edit(_ports.at(port));
-}
-
-void Script::setFormats(OMX_U32 port, std::vector<mediaserver::VideoFormat> formats) {
-  const Lock lock(_mutex);
-  _formats.at(port) = std::move(formats);
-}
-
-void Script::separatePorts() {
-  const Lock lock(_mutex);
-  _portsAreSeparate = true;
-}
-
-void Script::refuse(Access access, OMX_INDEXTYPE index, OMX_ERRORTYPE error) {
-  const Lock lock(_mutex);
-  _refused[{access, index}] = error;
-}
-
-void Script::answerBytes(OMX_INDEXTYPE index, const void* record, size_t size) {
-  const auto* const bytes = static_cast<const uint8_t*>(record);
-  const Lock lock(_mutex);
-  _answers[index].assign(bytes, bytes + size);
-}
-
-void Script::failStart(OMX_ERRORTYPE error) {
-  const Lock lock(_mutex);
-  _startFailure = error;
-}
-
-void Script::setInputBudget(std::optional<size_t> budget) {
-  const Lock lock(_mutex);
-  _inputBudget = budget;
-  wakeAll();
-}
-
-void Script::setOutputHeld(bool held) {
-  const Lock lock(_mutex);
-  _outputHeld = held;
-  wakeAll();
-}
-
-void Script::onInput(Transform transform) {
-  const Lock lock(_mutex);
-  _transform = std::move(transform);
-}
-
 void Script::produce(const Packet& output) {
-  const Lock lock(_mutex);
-  for (ScriptedCodec* codec : _codecs) codec->_line.emplace_back(output);
-  wakeAll();
-}
-
-void Script::setDelay(std::chrono::milliseconds delay) {
-  const Lock lock(_mutex);
-  _delay = delay;
-  _changed.notify_all();
+  change([&] {
+    for (ScriptedCodec* codec : _codecs) codec->_line.emplace_back(output);
+  });
 }
 
 void Script::announce(const PortEdit& edit, OMX_U32 index) {
-  const Lock lock(_mutex);
-  for (ScriptedCodec* codec : _codecs) codec->_line.emplace_back(Announcement{edit, index});
-  wakeAll();
+  change([&] {
+    for (ScriptedCodec* codec : _codecs) codec->_line.emplace_back(ScriptedCodec::Announcement{edit, index});
+  });
 }
 
 void Script::announce(OMX_U32 width, OMX_U32 height) {
@@ -144,41 +282,11 @@ void Script::wakeAll() {
   for (ScriptedCodec* codec : _codecs) codec->_host.wake();
 }
 
-std::vector<Packet> Script::inputs() const {
-  const Lock lock(_mutex);
-  return _inputs;
-}
-
-bool Script::waitForInputs(size_t count) const {
-  Lock lock(_mutex);
-  return _changed.wait_for(lock, kWaitLimit, [&] { return _inputs.size() >= count; });
-}
-
 size_t Script::waiting() const {
   const Lock lock(_mutex);
   size_t sum = 0;
   for (const ScriptedCodec* codec : _codecs) sum += codec->_line.size();
   return sum;
-}
-
-std::optional<mediaserver::PortPair> Script::configured() const {
-  const Lock lock(_mutex);
-  return _configured;
-}
-
-size_t Script::liveCodecs() const {
-  const Lock lock(_mutex);
-  return _codecs.size();
-}
-
-size_t Script::starts() const {
-  const Lock lock(_mutex);
-  return _starts;
-}
-
-size_t Script::stops() const {
-  const Lock lock(_mutex);
-  return _stops;
 }
 
 }  // namespace omxtest

@@ -9,8 +9,6 @@
 // thread, also from hooks and callbacks, except from inside the functions that a test hands in here.
 
 #include <array>
-#include <chrono>
-#include <condition_variable>
 #include <cstddef>
 #include <functional>
 #include <map>
@@ -26,12 +24,10 @@
 #include <OMX_Index.h>
 
 #include "host/mediaserver/codec.h"
-#include "tests/support/eventually.h"
-#include "tests/support/packet.h"
+#include "tests/support/call.h"
+#include "tests/support/journal.h"
 
 namespace omxtest {
-
-enum class Access { GetParameter, SetParameter, GetConfig, SetConfig };
 
 class ScriptedCodec;
 
@@ -53,15 +49,17 @@ class Script {
   // Changes the definition that fresh nodes have, for instance nBufferCountActual. Edits add up.
   // Defaults: 176x144, 24 frames per second; buffers: 4 input, 8 (decoder) or 6 (encoder) output; 65536
   // bytes on the compressed port, a picture's size on the other.
-  void editPort(OMX_U32 port, const PortEdit& edit);
+  void editPort(OMX_U32 port, const PortEdit& edit) {
+    change([&] { edit(_ports.at(port)); });
+  }
   // Defaults: AVC, MPEG-4, H.263, WMV (an encoder: AVC); 21 and TI's 0x7F000100.
-  void setFormats(OMX_U32 port, std::vector<mediaserver::VideoFormat> formats);
+  void setFormats(OMX_U32 port, const std::vector<mediaserver::VideoFormat>& formats) {
+    change([&] { _formats.at(port) = formats; });
+  }
   // The output keeps its size when a client gives the input another one.
-  void separatePorts();
-
-  // Accesses to `index` fail, also to the records that the node answers by itself. Otherwise readable and
-  // writable are those that our wrappers send.
-  void refuse(Access access, OMX_INDEXTYPE index, OMX_ERRORTYPE error = OMX_ErrorUnsupportedIndex);
+  void separatePorts() {
+    change([&] { _portsAreSeparate = true; });
+  }
 
   // What reading `index` gives from now on: everything behind the record's first two words. Also for port
   // definitions (of the record's port), where the node itself goes on by its own.
@@ -69,13 +67,16 @@ class Script {
   template <typename Record>
   void answer(OMX_INDEXTYPE index, const Record& record) {
     static_assert(std::is_trivially_copyable_v<Record>);
-    answerBytes(index, &record, sizeof(record));
+    const auto* const bytes = reinterpret_cast<const uint8_t*>(&record);
+    change([&] { _answers[index].assign(bytes, bytes + sizeof(record)); });
   }
 
   // --- Work ---
 
   // Starting the codec (Idle to Executing) fails; OMX_ErrorNone takes it back.
-  void failStart(OMX_ERRORTYPE error);
+  void failStart(OMX_ERRORTYPE error) {
+    change([&] { _startFailure = error; });
+  }
 
   // The component keeps all inputs (their EMPTY_BUFFER_DONE does not come) until `count` of them are let
   // go, or all. The same for outputs: what it produces stays inside.
@@ -87,11 +88,11 @@ class Script {
 
   // What comes out of an input. An empty result: nothing (a dropped frame). Called on the worker thread.
   // Null: the default.
-  void onInput(Transform transform);
+  void onInput(const Transform& transform) {
+    change([&] { _transform = transform; });
+  }
   // An output out of nothing, behind those that wait.
   void produce(const Packet& output);
-  // Time that each input and each output takes; default none.
-  void setDelay(std::chrono::milliseconds delay);
 
   // New output settings behind the outputs that wait: the node sends OMX_EventPortSettingsChanged and goes
   // through the protocol. `index` is the event's second word; for a configuration (output crop, say) no
@@ -105,45 +106,58 @@ class Script {
   // --- Asking ---
 
   // The inputs so far; end marks without bytes count too.
-  std::vector<Packet> inputs() const;
-  size_t inputCount() const { return inputs().size(); }
-  [[nodiscard]] bool waitForInputs(size_t count) const;
+  std::vector<Packet> inputs() const { return _inputs.all(); }
+  [[nodiscard]] bool waitForInputs(size_t count) const {
+    return _inputs.waitFor([](const Packet&) { return true; }, count);
+  }
   // Outputs and announcements that wait inside.
   size_t waiting() const;
   // The definitions that the work was last told to go by: at start, and after each enable of a port.
-  std::optional<mediaserver::PortPair> configured() const;
-  size_t liveCodecs() const;
-  size_t starts() const;
-  size_t stops() const;
+  mediaserver::PortPair configured() const { return read(_configured); }
+  size_t liveCodecs() const { return read(_codecs).size(); }
+  size_t starts() const { return read(_starts); }
+  size_t stops() const { return read(_stops); }
 
  private:
   friend class ScriptedCodec;
   using Lock = std::unique_lock<std::mutex>;
 
-  void answerBytes(OMX_INDEXTYPE index, const void* record, size_t size);
-  void setInputBudget(std::optional<size_t> budget);
-  void setOutputHeld(bool held);
+  void setInputBudget(std::optional<size_t> budget) {
+    change([&] { _inputBudget = budget; });
+  }
+  void setOutputHeld(bool held) {
+    change([&] { _outputHeld = held; });
+  }
+  // With the lock held; afterwards the codecs look again at what there is to do.
+  template <typename Action>
+  void change(Action action) {
+    const Lock lock(_mutex);
+    action();
+    wakeAll();
+  }
+  template <typename Value>
+  Value read(const Value& value) const {
+    const Lock lock(_mutex);
+    return value;
+  }
   void wakeAll();
 
   const Kind _kind;
+  Journal<Packet> _inputs;
   // Guards everything below. Nodes call codecs without a lock, and codecs and scripts may call a CodecHost
   // with it held; functions of the test run without it.
   mutable std::mutex _mutex;
-  mutable std::condition_variable _changed;
   mediaserver::PortPair _ports{};
   bool _portsAreSeparate = false;
   std::array<std::vector<mediaserver::VideoFormat>, mediaserver::kPortCount> _formats;
-  std::map<std::pair<Access, OMX_INDEXTYPE>, OMX_ERRORTYPE> _refused;
   std::map<OMX_INDEXTYPE, std::vector<uint8_t>> _answers;
   std::map<OMX_INDEXTYPE, std::vector<uint8_t>> _records;  // as last written
   OMX_ERRORTYPE _startFailure = OMX_ErrorNone;
   std::optional<size_t> _inputBudget;  // how many may pass; no number: all
   bool _outputHeld = false;
   Transform _transform;
-  std::chrono::milliseconds _delay{0};
   std::set<ScriptedCodec*> _codecs;
-  std::vector<Packet> _inputs;
-  std::optional<mediaserver::PortPair> _configured;
+  mediaserver::PortPair _configured{};
   size_t _starts = 0;
   size_t _stops = 0;
 };

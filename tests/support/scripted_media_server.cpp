@@ -14,9 +14,8 @@ namespace omxtest {
 
 namespace {
 
-const android::String16& serviceName() {
-  static const android::String16& kName = *new android::String16(mediaserver::kServiceName);
-  return kName;
+android::String16 serviceName() {
+  return android::String16(mediaserver::kServiceName);
 }
 
 void publish(const android::sp<android::IOMX>& omx) {
@@ -24,28 +23,16 @@ void publish(const android::sp<android::IOMX>& omx) {
   EXPECT_EQ(android::defaultServiceManager()->addService(serviceName(), service->asBinder()), android::OK);
 }
 
-std::vector<mediaserver::Component> components(const omxhost::Device& device, Script* decoder,
-                                               Script* encoder) {
-  std::vector<mediaserver::Component> list;
-  if (device.decoderComponent != nullptr) list.push_back(decoder->component(device.decoderComponent));
-  if (device.encoderComponent != nullptr) list.push_back(encoder->component(device.encoderComponent));
-  return list;
-}
-
-const omxhost::Device& pose(const char* device) {
-  if (device != nullptr && !omxhost::setDevice(device)) ADD_FAILURE() << "no device " << device;
-  return omxhost::posedDevice();
-}
-
 }  // namespace
 
 ScriptedMediaServer::ScriptedMediaServer(const char* device, std::chrono::milliseconds readingTime)
-    : _decoder(std::make_unique<Script>(Script::Kind::Decoder)),
-      _encoder(std::make_unique<Script>(Script::Kind::Encoder)),
-      _server(
-          new mediaserver::OmxServer(components(pose(device), _decoder.get(), _encoder.get()), readingTime)),
-      _omx(new RecordingOmx(_server)),
-      _loadedOnDemand(omxhost::setLoadOnDemand(false)) {
+    : _loadedOnDemand(omxhost::setLoadOnDemand(false)) {
+  if (device != nullptr && !omxhost::setDevice(device)) ADD_FAILURE() << "no device " << device;
+  const omxhost::Device& posed = omxhost::posedDevice();
+  std::vector<mediaserver::Component> list;
+  if (posed.decoderComponent != nullptr) list.push_back(_decoder.component(posed.decoderComponent));
+  if (posed.encoderComponent != nullptr) list.push_back(_encoder.component(posed.encoderComponent));
+  _omx = new RecordingOmx(std::move(list), readingTime);
   serve();
 }
 
@@ -54,7 +41,7 @@ ScriptedMediaServer::~ScriptedMediaServer() {
   omxhost::setLoadOnDemand(_loadedOnDemand);
   _omx->freeAbandonedNodes();
   EXPECT_EQ(leaks(), "");
-  EXPECT_EQ(_server->nodeCount(), _omx->outstandingNodes()) << "nodes are left in the server only";
+  EXPECT_EQ(_omx->nodeCount(), _omx->outstandingNodes()) << "nodes are left in the server only";
 }
 
 void ScriptedMediaServer::unregister() {

@@ -5,12 +5,10 @@
 // One at a time in a process. Threads: as its parts; the object itself belongs to the test.
 
 #include <chrono>
-#include <memory>
 #include <string>
 
 #include <omxhost/device.h>
 
-#include "host/mediaserver/omx_server.h"
 #include "tests/support/recording_omx.h"
 #include "tests/support/script.h"
 
@@ -28,8 +26,8 @@ class ScriptedMediaServer {
   ScriptedMediaServer& operator=(const ScriptedMediaServer&) = delete;
 
   // Components carry the posed device's names. On a device without components the list is empty.
-  Script& decoder() { return *_decoder; }
-  Script& encoder() { return *_encoder; }
+  Script& decoder() { return _decoder; }
+  Script& encoder() { return _encoder; }
   RecordingOmx& omx() { return *_omx; }
   MessageTap& messages() { return _omx->messages(); }
 
@@ -43,11 +41,10 @@ class ScriptedMediaServer {
   std::string leaks() const;
 
  private:
-  const std::unique_ptr<Script> _decoder;
-  const std::unique_ptr<Script> _encoder;
-  android::sp<mediaserver::OmxServer> _server;
-  android::sp<RecordingOmx> _omx;
   const bool _loadedOnDemand;  // as it was before
+  Script _decoder{Script::Kind::Decoder};
+  Script _encoder{Script::Kind::Encoder};
+  android::sp<RecordingOmx> _omx;
 };
 
 }  // namespace omxtest

@@ -53,17 +53,12 @@ struct CallRig {
   CallRig() {
     server.encoder().onInput([](const Packet& input) { return std::vector<Packet>{coded(input)}; });
     server.decoder().onInput([](const Packet& input) { return std::vector<Packet>{decoded(input)}; });
-    // The decoder's pictures are small; its buffers stay those of the size that every session sets up.
-    OMX_PARAM_PORTDEFINITIONTYPE output{};
-    output.nSize = sizeof(output);
-    output.nPortIndex = mediaserver::kOutputPort;
-    output.eDir = OMX_DirOutput;
-    output.nBufferCountActual = 8;
-    output.nBufferCountMin = 1;
-    output.nBufferSize = 640 * 480 * 3 / 2;
-    output.format.video.nFrameWidth = static_cast<OMX_U32>(kSize.width);
-    output.format.video.nFrameHeight = static_cast<OMX_U32>(kSize.height);
-    server.decoder().answer(OMX_IndexParamPortDefinition, output);
+    // The decoder's pictures stay small, whatever size a session sets up.
+    server.decoder().separatePorts();
+    server.decoder().editPort(mediaserver::kOutputPort, [](auto& port) {
+      port.format.video.nFrameWidth = static_cast<OMX_U32>(kSize.width);
+      port.format.video.nFrameHeight = static_cast<OMX_U32>(kSize.height);
+    });
   }
 
   static Packet coded(const Packet& input) {
@@ -97,8 +92,13 @@ struct CallRig {
 
 TEST(ScriptedCall, EndsTheInputOnlyWhenThePicturesAreBack) {
   CallRig rig;
-  rig.server.encoder().setDelay(std::chrono::milliseconds(2));
-  rig.server.decoder().setDelay(std::chrono::milliseconds(2));
+  for (const auto& [script, work] :
+       {std::pair{&rig.server.encoder(), &CallRig::coded}, {&rig.server.decoder(), &CallRig::decoded}}) {
+    script->onInput([work = work](const Packet& input) {
+      std::this_thread::sleep_for(std::chrono::milliseconds(2));
+      return std::vector<Packet>{work(input)};
+    });
+  }
   std::vector<size_t> filledAtEnd;
   rig.server.omx().before(omxtest::Method::EmptyBuffer, [&](const omxtest::Call& call) {
     if ((call.flags & OMX_BUFFERFLAG_EOS) == 0) return;
@@ -191,7 +191,8 @@ TEST(ScriptedCall, FailsWithAMessageAndLeavesNoFile) {
     const char* text;
   } cases[] = {
       {[](CallRig& rig) {
-         rig.server.encoder().refuse(omxtest::Access::SetParameter, OMX_IndexParamVideoBitrate);
+         rig.server.omx().failWhere(
+             [](const auto& call) { return call.index == OMX_IndexParamVideoBitrate; });
        },
        ExitCode::Device, "the encoder of device msm8x55 cannot be created"},
       {[](CallRig& rig) { rig.server.omx().fail(omxtest::Method::SendCommand); }, ExitCode::Device,

@@ -11,7 +11,6 @@
 #include <type_traits>
 #include <vector>
 
-#include <media/stagefright/MediaErrors.h>
 #include <omxhost/device.h>
 
 #include "host/mediaserver/components/sequence_set.h"
@@ -26,64 +25,33 @@ using mediaserver::kInputPort;
 using mediaserver::kOutputPort;
 using mediaserver::QcomOrder;
 using mediaserver::QcomPacking;
+using omxtest::kOk;
+using omxtest::kUnknownError;
+using omxtest::kUnsupported;
+using omxtest::makeRecord;
 using Options = std::map<std::string, std::string>;
 using Errors = std::vector<std::string>;
 using NalTypes = std::vector<unsigned>;
-
-constexpr auto kOk = static_cast<android::status_t>(android::OK);
-constexpr auto kUnknownError = static_cast<android::status_t>(android::UNKNOWN_ERROR);
-constexpr auto kUnsupported = static_cast<android::status_t>(android::ERROR_UNSUPPORTED);
 
 // Those that have components.
 constexpr const char* kDevices[] = {"msm7x30", "msm8x55", "msm8x60", "msm8960", "omap4", "msm-unknown"};
 
 // A filled output buffer, with the port and the rectangle as the client reads them when it gets it.
-struct Output {
-  std::vector<uint8_t> bytes;
-  int64_t timestamp;
+struct Output : Unit {
   OMX_U32 flags;
   mediaserver::PortDefinition definition;
   OMX_CONFIG_RECTTYPE crop;
 };
 
-template <typename T>
-T makeRecord(OMX_U32 port) {
-  T record{};
-  record.nSize = sizeof(T);
-  record.nVersion.s.nVersionMajor = 1;
-  record.nVersion.s.nVersionMinor = 1;
-  record.nPortIndex = port;
-  return record;
-}
-
-class ComponentRun {
+class ComponentRun : public omxtest::OmxClient {
  public:
   ComponentRun(const omxhost::Device& device, const char* component, omxtest::Giving output);
 
-  omxtest::OmxClient& node() { return _node; }
   const omxhost::ComponentTraits& traits() const { return _traits; }
   bool isTi() const { return _traits.vendor == omxhost::Vendor::Ti; }
 
-  // Records. The index and what it takes are the caller's business.
-  template <typename T>
-  android::status_t get(OMX_INDEXTYPE index, T* record) {
-    return _node.omx()->getParameter(_node.node(), index, record, sizeof(T));
-  }
-  template <typename T>
-  android::status_t set(OMX_INDEXTYPE index, const T& record) {
-    return _node.omx()->setParameter(_node.node(), index, &record, sizeof(T));
-  }
-  template <typename T>
-  android::status_t getConfig(OMX_INDEXTYPE index, T* record) {
-    return _node.omx()->getConfig(_node.node(), index, record, sizeof(T));
-  }
-  template <typename T>
-  android::status_t setConfig(OMX_INDEXTYPE index, const T& record) {
-    return _node.omx()->setConfig(_node.node(), index, &record, sizeof(T));
-  }
-  // Changes a port's video definition.
-  using VideoEdit = std::function<void(OMX_VIDEO_PORTDEFINITIONTYPE&)>;
-  android::status_t define(OMX_U32 port, const VideoEdit& edit);
+  // Defines a port's pictures; rate 0: as it is.
+  android::status_t resize(OMX_U32 port, uint32_t width, uint32_t height, uint32_t framesPerSecond = 0);
 
   // Executing, with all output buffers given.
   void start();
@@ -94,10 +62,14 @@ class ComponentRun {
   // Disables the input port, changes something, and enables it again with new buffers.
   void reopenInput(const std::function<void()>& change);
   // Lets the component work until `count` outputs have come.
-  void awaitOutputs(size_t count);
-  void awaitEnd();
+  void awaitOutputs(size_t count) {
+    await([&] { return outputs.size() >= count; });
+  }
+  void awaitEnd() {
+    await([this] { return _ended; });
+  }
 
-  std::vector<Output> outputs;  // with bytes
+  std::vector<Output> outputs;  // those with bytes
   Errors errors;
   size_t reconfigurations = 0;
 
@@ -109,7 +81,6 @@ class ComponentRun {
   size_t indexOf(OMX_U32 port, android::IOMX::buffer_id id) const;
 
   const omxhost::ComponentTraits& _traits;
-  omxtest::OmxClient _node;
   size_t _handled = 0;  // messages
   std::vector<bool> _inputFree;
   size_t _outputsOut = 0;  // with the component
@@ -120,50 +91,77 @@ class ComponentRun {
 
 class DecoderRun : public ComponentRun {
  public:
-  explicit DecoderRun(const char* device);
+  explicit DecoderRun(const char* device)
+      : ComponentRun(*omxhost::findDevice(device), omxhost::findDevice(device)->decoderComponent,
+                     omxtest::Giving::Backup) {}
   DecoderRun(const char* device, QcomOrder order) : DecoderRun(device) { EXPECT_EQ(setOrder(order), kOk); }
 
-  android::status_t setOrder(QcomOrder order);
-  android::status_t setPacking(QcomPacking packing);
+  android::status_t setOrder(QcomOrder order) {
+    auto record = makeRecord<mediaserver::QcomPictureOrder>(kInputPort);
+    record.eOutputPictureOrder = static_cast<OMX_U32>(order);
+    return set(mediaserver::kQcomPictureOrderIndex, record);
+  }
+  android::status_t setPacking(QcomPacking packing) {
+    auto record = makeRecord<mediaserver::QcomPortDefinition>(kInputPort);
+    record.nFramePackingFormat = static_cast<OMX_U32>(packing);
+    return set(mediaserver::kQcomPortDefinitionIndex, record);
+  }
   // 0: the size stays.
   void setInput(OMX_VIDEO_CODINGTYPE coding, uint32_t width = 0, uint32_t height = 0);
   // One buffer a unit.
-  void sendAll(const std::vector<Unit>& units);
+  void sendAll(const std::vector<Unit>& units) {
+    for (const Unit& unit : units) send(unit.bytes, unit.timestamp);
+  }
   // A whole life with these units.
-  void run(const std::vector<Unit>& units);
+  void run(const std::vector<Unit>& units) {
+    start();
+    sendAll(units);
+    finish();
+  }
   // The outputs.
   std::vector<Decoded> pictures() const;
 };
 
 class EncoderRun : public ComponentRun {
  public:
-  explicit EncoderRun(const char* device);
+  explicit EncoderRun(const char* device)
+      : ComponentRun(*omxhost::findDevice(device), omxhost::findDevice(device)->encoderComponent,
+                     omxtest::Giving::Use) {}
   EncoderRun(const char* device, uint32_t width, uint32_t height, uint32_t framesPerSecond = 25)
       : EncoderRun(device) {
     setSize(width, height, framesPerSecond);
   }
 
   // Both ports, as wrappers do it.
-  void setSize(uint32_t width, uint32_t height, uint32_t framesPerSecond = 25);
-  void setBitRate(uint32_t bitsPerSecond);
+  void setSize(uint32_t width, uint32_t height, uint32_t framesPerSecond = 25) {
+    for (const OMX_U32 port : {kInputPort, kOutputPort}) {
+      EXPECT_EQ(resize(port, width, height, framesPerSecond), kOk);
+    }
+  }
+  void setBitRate(uint32_t bitsPerSecond) {
+    auto record = makeRecord<OMX_VIDEO_PARAM_BITRATETYPE>(kOutputPort);
+    record.eControlRate = OMX_Video_ControlRateVariable;
+    record.nTargetBitrate = bitsPerSecond;
+    EXPECT_EQ(set(OMX_IndexParamVideoBitrate, record), kOk);
+  }
   // Changes the AVC record as it is.
-  android::status_t setAvc(const std::function<void(OMX_VIDEO_PARAM_AVCTYPE&)>& change);
-  OMX_VIDEO_PARAM_AVCTYPE avc();
+  android::status_t setAvc(const std::function<void(OMX_VIDEO_PARAM_AVCTYPE&)>& change) {
+    OMX_VIDEO_PARAM_AVCTYPE record = avc();
+    change(record);
+    return set(OMX_IndexParamVideoAvc, record);
+  }
+  OMX_VIDEO_PARAM_AVCTYPE avc() {
+    auto record = makeRecord<OMX_VIDEO_PARAM_AVCTYPE>(kOutputPort);
+    EXPECT_EQ(get(OMX_IndexParamVideoAvc, &record), kOk);
+    return record;
+  }
 
   // Configurations, on the port that wrappers use.
   template <typename Record, typename Value>
-  android::status_t change(OMX_INDEXTYPE index, Value Record::*field, std::type_identity_t<Value> value,
-                           OMX_U32 port = kOutputPort) {
-    Record record = makeRecord<Record>(port);
+  android::status_t change(OMX_INDEXTYPE index, Value Record::*field, std::type_identity_t<Value> value) {
+    Record record = makeRecord<Record>(kOutputPort);
     record.*field = value;
     return setConfig(index, record);
-  }
-  android::status_t changeBitRate(uint32_t bitsPerSecond) {
-    return change(OMX_IndexConfigVideoBitrate, &OMX_VIDEO_CONFIG_BITRATETYPE::nEncodeBitrate, bitsPerSecond);
-  }
-  android::status_t requestKey() {
-    const auto field = &OMX_CONFIG_INTRAREFRESHVOPTYPE::IntraRefreshVOP;
-    return change(OMX_IndexConfigVideoIntraVOPRefresh, field, OMX_TRUE);
   }
   android::status_t rotate(int32_t degrees) {
     return change(OMX_IndexConfigCommonRotate, &OMX_CONFIG_ROTATIONTYPE::nRotation, degrees);
@@ -172,13 +170,25 @@ class EncoderRun : public ComponentRun {
   // One picture in the device's layout, and its access unit.
   Output& encode(const Picture& picture);
   // Pictures of the scene from where it was.
-  void encodeScene(uint32_t width, uint32_t height, uint32_t count);
+  void encodeScene(uint32_t width, uint32_t height, uint32_t count) {
+    for (uint32_t i = 0; i < count; ++i) encode(scene(width, height, _next++));
+  }
 
   // Where in the outputs the key frames are, by their flags.
-  std::vector<size_t> keyFrames() const;
-  std::vector<Unit> units() const;
+  std::vector<size_t> keyFrames() const {
+    std::vector<size_t> found;
+    for (size_t i = 0; i < outputs.size(); ++i) {
+      if ((outputs[i].flags & OMX_BUFFERFLAG_SYNCFRAME) != 0) found.push_back(i);
+    }
+    return found;
+  }
+  std::vector<Unit> units() const { return {outputs.begin(), outputs.end()}; }
   // Of `count` outputs from `first` on.
-  double bits(size_t first, size_t count) const;
+  double bits(size_t first, size_t count) const {
+    size_t bytes = 0;
+    for (size_t i = first; i < first + count; ++i) bytes += outputs.at(i).bytes.size();
+    return static_cast<double>(bytes) * 8;
+  }
 
  private:
   uint32_t _next = 0;

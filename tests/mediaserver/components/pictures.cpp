@@ -1,7 +1,6 @@
 #include "tests/mediaserver/components/pictures.h"
 
 #include <algorithm>
-#include <cmath>
 
 namespace componenttest {
 
@@ -13,17 +12,11 @@ size_t roundUp(size_t value, size_t multiple) {
   return (value + multiple - 1) / multiple * multiple;
 }
 
-// Smooth noise that can be followed from picture to picture.
+// Noise that can be followed from picture to picture: squares of 8 pixels.
 uint8_t texture(uint32_t x, uint32_t y) {
-  const auto at = [](uint32_t column, uint32_t row) {
-    uint32_t h = column * 374761393U + row * 668265263U;
-    h = (h ^ h >> 13) * 1274126177U;
-    return (h ^ h >> 16) % 160;
-  };
-  const uint32_t fx = x % 8, fy = y % 8, cx = x / 8, cy = y / 8;
-  const uint32_t top = at(cx, cy) * (8 - fx) + at(cx + 1, cy) * fx;
-  const uint32_t bottom = at(cx, cy + 1) * (8 - fx) + at(cx + 1, cy + 1) * fx;
-  return static_cast<uint8_t>(40 + (top * (8 - fy) + bottom * fy) / 64);
+  uint32_t hash = x / 8 * 374761393U + y / 8 * 668265263U;
+  hash = (hash ^ hash >> 13) * 1274126177U;
+  return static_cast<uint8_t>(40 + (hash ^ hash >> 16) % 160);
 }
 
 // The position of a byte in a tiled plane that begins at `start`: number of the tile, then row by row.
@@ -72,17 +65,6 @@ Picture scene(uint32_t width, uint32_t height, uint32_t number) {
     }
   }
   return picture;
-}
-
-double psnr(const Picture& a, const Picture& b) {
-  if (a.width != b.width || a.height != b.height) return 0;
-  double error = 0;
-  const size_t count = size_t{a.width} * a.height;
-  for (size_t i = 0; i < count; ++i) {
-    const double difference = static_cast<double>(a.bytes[i]) - b.bytes[i];
-    error += difference * difference;
-  }
-  return error == 0 ? 100 : 10 * std::log10(255.0 * 255.0 * static_cast<double>(count) / error);
 }
 
 std::vector<uint8_t> packInput(const Picture& picture, PictureLayout layout, uint32_t pitch) {

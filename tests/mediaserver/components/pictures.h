@@ -3,6 +3,7 @@
 // stated independently of the components' own code. Plain values and pure functions.
 
 #include <cstdint>
+#include <span>
 #include <vector>
 
 #include <OMX_IVCommon.h>
@@ -22,14 +23,12 @@ struct Picture {
   uint32_t chromaHeight() const { return (height + 1) / 2; }
   uint8_t* plane(int index);
   const uint8_t* plane(int index) const { return const_cast<Picture*>(this)->plane(index); }
+  std::span<const uint8_t> luma() const { return std::span(bytes).first(size_t{width} * height); }
   bool operator==(const Picture&) const = default;
 };
 
 // Picture `number` of a scene with texture that moves; the same for the same arguments.
 Picture scene(uint32_t width, uint32_t height, uint32_t number);
-
-// In decibels; 100 for equal pictures. Compares luma.
-double psnr(const Picture& a, const Picture& b);
 
 // As an encoder's client sends it. `pitch` counts for the TI layout alone.
 std::vector<uint8_t> packInput(const Picture& picture, omxhost::PictureLayout layout, uint32_t pitch = 0);
