@@ -24,9 +24,6 @@ class Fields {
     _bits.ue(value);
     return *this;
   }
-  Fields& se(int32_t value) {
-    return ue(value > 0 ? static_cast<uint32_t>(value) * 2 - 1 : static_cast<uint32_t>(-value) * 2);
-  }
   // With the stop bit and the bytes that keep start codes out, and no start code.
   std::string nal(uint8_t header) {
     _bits.finish();
@@ -46,7 +43,7 @@ std::string sps(bool interlaced = false, uint32_t profile = 66) {
   Fields bits;
   bits.u(8, profile).u(8, 0).u(8, 31).ue(0);
   if (profile == kHigh)
-    bits.ue(1).ue(0).ue(0).u(1, 0).u(1, 1).u(1, 1).se(2).se(-10).u(7, 0);  // a scaling list
+    bits.ue(1).ue(0).ue(0).u(1, 0).u(1, 1).u(1, 1).ue(3).ue(20).u(7, 0);  // a scaling list: 2 more, 10 less
   bits.ue(2).ue(0).ue(4).ue(1).u(1, 0).ue(10).ue(8).u(1, interlaced ? 0 : 1);
   if (interlaced) bits.u(1, 0);
   bits.u(1, 1).u(1, 0);

@@ -24,16 +24,14 @@ long picturesIn(const std::string& path, size_t pictureBytes) {
   return static_cast<long>((content.size() - head) / each);
 }
 
-struct DeviceCase {
-  const char* name;
-  double psnr;  // dB, at least
+class CallOn : public testing::TestWithParam<const char*> {
+ protected:
+  const double leastPsnr = GetParam() == std::string("msm8x60") ? 28 : 35;  // dB
 };
 
-class CallOn : public testing::TestWithParam<DeviceCase> {};
-
 TEST_P(CallOn, LosesNothingAndKeepsItsQualityAndRate) {
-  const json figures = report({"call", "-d", GetParam().name, "-n", std::to_string(CALL_FRAMES)});
-  EXPECT_EQ(figures["device"], GetParam().name);
+  const json figures = report({"call", "-d", GetParam(), "-n", std::to_string(CALL_FRAMES)});
+  EXPECT_EQ(figures["device"], GetParam());
   EXPECT_EQ(figures["frames_in"], CALL_FRAMES);
   EXPECT_EQ(figures["frames_encoded"], CALL_FRAMES);
   EXPECT_EQ(figures["frames_decoded"], CALL_FRAMES);
@@ -41,7 +39,7 @@ TEST_P(CallOn, LosesNothingAndKeepsItsQualityAndRate) {
   EXPECT_EQ(figures["frames_out_of_order"], 0);
   EXPECT_EQ(figures["bitrate_target"], 1'000'000);
   EXPECT_NEAR(figures["bitrate_reached"], 1e6, 1e5);
-  EXPECT_GE(figures["psnr_y"], GetParam().psnr);
+  EXPECT_GE(figures["psnr_y"], leastPsnr);
   EXPECT_LT(figures["psnr_y"], 60) << "no lossy coder does that";
   EXPECT_GT(figures["latency_ms"]["p50"], 0);
   EXPECT_GT(figures["cpu_seconds"], 0);
@@ -52,12 +50,12 @@ TEST_P(CallOn, WritesAStreamThatDecodesToThePicturesItWrote) {
   const std::string stream = directory.file("coded.264");
   const std::string called = directory.file("called.y4m");
   const std::string decoded = directory.file("decoded.y4m");
-  const json figures = report({"call", "-d", GetParam().name, "-s", "320x176", "--fps", "25", "-n", "40",
-                               "-k", "10", "-p", "high", "--stream", stream, "-o", called});
+  const json figures = report({"call", "-d", GetParam(), "-s", "320x176", "--fps", "25", "-n", "40", "-k",
+                               "10", "-p", "high", "--stream", stream, "-o", called});
   EXPECT_EQ(figures["frames_decoded"], 40);
-  EXPECT_EQ(figures["profile"], std::string(GetParam().name) == "msm7x30" ? 66 : 100);
+  EXPECT_EQ(figures["profile"], GetParam() == std::string("msm7x30") ? 66 : 100);
   EXPECT_EQ(picturesIn(called, 320 * 176 * 3 / 2), 40);
-  const json again = report({"decode", "-d", GetParam().name, stream, "-o", decoded, "--fps", "25"});
+  const json again = report({"decode", "-d", GetParam(), stream, "-o", decoded, "--fps", "25"});
   EXPECT_EQ(again["access_units"], 40);
   EXPECT_EQ(again["frames_decoded"], 40);
   EXPECT_TRUE(contentOf(called) == contentOf(decoded));
@@ -68,23 +66,20 @@ TEST_P(CallOn, WritesAStreamThatDecodesToThePicturesItWrote) {
 TEST_P(CallOn, CarriesOutChangesAtThePictureTheyAreMeantFor) {
   const TemporaryDirectory directory;
   const std::string pictures = directory.file("a.y4m");
-  const json figures = report({"call",     "-d",   GetParam().name, "-s",        "192x128", "-n",    "120",
-                               "-b",       "200k", "--at",          "2s",        "fps=15",  "--at",  "1s",
-                               "keyframe", "--at", "3000ms",        "rotate=90", "-o",      pictures});
+  const json figures = report({"call",     "-d",   GetParam(), "-s",        "192x128", "-n",    "120",
+                               "-b",       "200k", "--at",     "2s",        "fps=15",  "--at",  "1s",
+                               "keyframe", "--at", "3000ms",   "rotate=90", "-o",      pictures});
   EXPECT_EQ(figures["frames_in"], 90);
   EXPECT_EQ(figures["frames_decoded"], 90);
   EXPECT_EQ(figures["frames_dropped"], 0);
   EXPECT_EQ(figures["key_frames"], json({0, 30, 75}));
   EXPECT_EQ(figures["changes"][0], json({{"seconds", 1.0}, {"change", "keyframe"}}));
-  EXPECT_GE(figures["psnr_y"], GetParam().psnr) << "compared with pictures turned in the same way";
+  EXPECT_GE(figures["psnr_y"], leastPsnr) << "compared with pictures turned in the same way";
   EXPECT_EQ(picturesIn(pictures, 192 * 128 * 3 / 2), 90);
 }
 
-INSTANTIATE_TEST_SUITE_P(Device, CallOn,
-                         testing::Values(DeviceCase{"msm7x30", 35}, DeviceCase{"msm8x55", 35},
-                                         DeviceCase{"msm8x60", 28}, DeviceCase{"msm8960", 35},
-                                         DeviceCase{"omap4", 35}),
-                         [](const auto& instance) { return std::string(instance.param.name); });
+INSTANTIATE_TEST_SUITE_P(Device, CallOn, testing::Values("msm7x30", "msm8x55", "msm8x60", "msm8960", "omap4"),
+                         [](const auto& instance) { return std::string(instance.param); });
 
 TEST(Call, RecoversFromLossesTheSameWayEveryTimeAndReportsThem) {
   const TemporaryDirectory directory;

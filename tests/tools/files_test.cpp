@@ -14,7 +14,6 @@
 namespace {
 
 using namespace tool;
-using tooltest::contentOf;
 using tooltest::TemporaryDirectory;
 
 constexpr size_t kPicture = 4 * 2 * 3 / 2;  // bytes, of 4x2
@@ -23,30 +22,19 @@ std::string pictureOf(char value) {
   return std::string(kPicture, value);
 }
 
-// Opens the content as a file and reads it to its end.
-struct ReadAll {
-  std::string pictures;  // the first byte of each
-  std::string failure;
-  ExitCode code = ExitCode::Done;
-};
-
-ReadAll readAll(const std::string& content, std::optional<Size> size) {
+// Opens the content as a file and reads it up to a failure: the first byte of each picture, and that.
+std::pair<std::string, Failure> readAll(const std::string& content, std::optional<Size> size) {
   const TemporaryDirectory directory;
-  ReadAll result;
-  const auto note = [&result](const Failure& failure) {
-    result.failure = failure.text;
-    result.code = failure.code;
-    return result;
-  };
   auto source = openFrameSource({directory.write("in", content), size, {}}, {});
-  if (!source.ok()) return note(source.failure());
+  if (!source.ok()) return {"", source.failure()};
+  std::string pictures;
   Picture picture;
   for (;;) {
     const auto more = source.value()->next(picture);
-    if (!more.ok()) return note(more.failure());
-    if (!more.value()) return result;
+    if (!more.ok()) return {pictures, more.failure()};
+    if (!more.value()) return {pictures, {}};
     EXPECT_EQ(picture.bytes.size(), kPicture);
-    result.pictures += static_cast<char>(picture.bytes[0]);
+    pictures += static_cast<char>(picture.bytes[0]);
   }
 }
 
@@ -79,11 +67,11 @@ TEST(FrameSource, SaysWhatIsWrongWithAnInput) {
   };
   for (const auto& each : cases) {
     SCOPED_TRACE(each.content.substr(0, 60));
-    const ReadAll read = readAll(each.content, each.size);
-    EXPECT_EQ(read.pictures, each.pictures);
-    EXPECT_NE(read.failure.find(each.complaint), std::string::npos) << read.failure;
-    EXPECT_NE(read.failure.find("/in: "), std::string::npos) << read.failure;
-    EXPECT_EQ(read.code, ExitCode::Input);
+    const auto [pictures, failure] = readAll(each.content, each.size);
+    EXPECT_EQ(pictures, each.pictures);
+    EXPECT_NE(failure.text.find(each.complaint), std::string::npos) << failure.text;
+    EXPECT_NE(failure.text.find("/in: "), std::string::npos) << failure.text;
+    EXPECT_EQ(failure.code, ExitCode::Input);
   }
 }
 
@@ -105,33 +93,6 @@ TEST(ByteReader, ReadsAPipeThatComesInDrops) {
   EXPECT_EQ(picture.bytes[0], 'b');
   EXPECT_FALSE(source.value()->next(picture).value());
   EXPECT_EQ(source.value()->frameCount(), std::nullopt);
-}
-
-std::span<const uint8_t> bytesOf(std::string_view text) {
-  return {reinterpret_cast<const uint8_t*>(text.data()), text.size()};
-}
-
-// Through a link, which stays one, and with the mode that the file had.
-TEST(OutputFile, HasItsNameOnlyWhenComplete) {
-  const TemporaryDirectory directory;
-  const std::string path = directory.write("a", "old");
-  chmod(path.c_str(), 0640);
-  const std::string link = directory.file("link");
-  ASSERT_EQ(symlink("a", link.c_str()), 0);
-  for (const bool abandoned : {true, false}) {
-    const auto file = OutputFile::create(link);
-    ASSERT_TRUE(file.ok());
-    EXPECT_FALSE(file.value()->write(bytesOf("new")));
-    EXPECT_EQ(contentOf(path), "old");
-    EXPECT_EQ(directory.names().size(), 3U);
-    EXPECT_FALSE(!abandoned && file.value()->commit());
-  }
-  EXPECT_EQ(contentOf(path), "new");
-  EXPECT_TRUE(std::filesystem::is_symlink(link));
-  EXPECT_EQ(directory.names().size(), 2U);
-  struct stat status {};
-  EXPECT_EQ(stat(path.c_str(), &status), 0);
-  EXPECT_EQ(status.st_mode & 0777, 0640U);
 }
 
 TEST(OutputFile, AHardEndRemovesWhatIsTemporary) {

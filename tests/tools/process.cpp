@@ -28,8 +28,6 @@ std::vector<char*> pointers(std::vector<std::string>& texts) {
 
 }  // namespace
 
-Process::Process(const std::vector<std::string>& arguments) : Process(arguments, Streams()) {}
-
 Process::Process(const std::vector<std::string>& arguments, const Streams& streams) {
   std::vector<std::string> words{OMXBRIDGE_TOOL};
   words.insert(words.end(), arguments.begin(), arguments.end());

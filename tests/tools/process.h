@@ -20,16 +20,15 @@ struct Ended {
   std::string err;
 };
 
+struct Streams {
+  std::string in = "/dev/null";            // a file or pipe
+  std::string out{};                       // a file or device; empty: collected
+  std::vector<std::string> environment{};  // NAME=VALUE, added to the test's own
+};
+
 class Process {
  public:
-  struct Streams {
-    std::string in = "/dev/null";            // a file or pipe
-    std::string out{};                       // a file or device; empty: collected
-    std::vector<std::string> environment{};  // NAME=VALUE, added to the test's own
-  };
-
-  explicit Process(const std::vector<std::string>& arguments);
-  Process(const std::vector<std::string>& arguments, const Streams& streams);
+  explicit Process(const std::vector<std::string>& arguments, const Streams& streams = {});
   ~Process();  // kills what has not ended
   Process(const Process&) = delete;
   Process& operator=(const Process&) = delete;
@@ -51,7 +50,7 @@ class Process {
   std::string _collected;
 };
 
-inline Ended runTool(const std::vector<std::string>& arguments, const Process::Streams& streams = {}) {
+inline Ended runTool(const std::vector<std::string>& arguments, const Streams& streams = {}) {
   return Process(arguments, streams).finish();
 }
 
