@@ -42,8 +42,9 @@ TEST(Vector, FollowsAPlainModelThroughRandomOperations) {
         model.assign(count, element);
       } else if (operation == 2) {
         // An element of its own, which may move away while it is being copied.
-        EXPECT_EQ(vector.insertAt(vector[at / 2], at, count), static_cast<ssize_t>(at));
-        model.insert(where, count, Element{model[at / 2]});
+        const size_t own = below(model.size());
+        EXPECT_EQ(vector.insertAt(vector[own], at, count), static_cast<ssize_t>(at));
+        model.insert(where, count, Element{model[own]});
       } else if (operation == 3) {
         const bool fits = at + count <= model.size();
         EXPECT_EQ(vector.removeItemsAt(at, count), fits ? static_cast<ssize_t>(at) : android::BAD_VALUE);
