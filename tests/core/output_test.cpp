@@ -47,9 +47,12 @@ TEST_F(OutputTest, DeliversWhatTheComponentMakesInOrder) {
   EXPECT_EQ(outputs[20].data, outputRecord(20 % kOutputs)->data);
   EXPECT_EQ(outputs[20].length, 3u);
   EXPECT_EQ(outputs[22].length, 65536u);
+  EXPECT_TRUE(_log.waitFor("4294967295 bytes"));  // it is written behind the delivery
   EXPECT_EQ(log(), (LogLines{"E OMXINTERFACE - Output of 65537 bytes cut to the buffer's 65536",
                              "E OMXINTERFACE - Output of 4294967295 bytes cut to the buffer's 65536"}));
-  // Lost in silence, the end of a stream would leave deInit() waiting for it.
+  // Lost in silence, the end of a stream would leave deInit() waiting for it. The node that fails is not one of
+  // those that take buffers back.
+  waitForBusy(1, kOutputs);
   const faults::Fault failed(faults::Failing::NothrowNew, sizeof(SimpleNode));
   componentProduces("the end", 0, OMX_BUFFERFLAG_EOS);
   EXPECT_EQ(deInit(), OMXI_ERR_ALLOCATE_MEMORY);
