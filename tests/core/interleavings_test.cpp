@@ -104,7 +104,7 @@ TEST_F(InterleavingTest, PicturesInFlightComeFirstAndThenTheEnd) {
   script().passOutput();
   _application.waitForOutputs(kOutputs);
   waitForBusy(1, 0);
-  EXPECT_GT(script().waiting(), 0u);
+  requireEventually([this] { return script().waiting() > 0; }, "the picture that has no buffer");
   EXPECT_FALSE(_session->_endOfOutputReached);
   // A failure ends the wait, although deInit() has looked for one before.
   _session->setThreadError(OMXI_ERR_APPLICATION);
