@@ -50,8 +50,8 @@ TEST_F(OutputTest, DeliversWhatTheComponentMakesInOrder) {
   EXPECT_TRUE(_log.waitFor("4294967295 bytes"));  // it is written behind the delivery
   EXPECT_EQ(log(), (LogLines{"E OMXINTERFACE - Output of 65537 bytes cut to the buffer's 65536",
                              "E OMXINTERFACE - Output of 4294967295 bytes cut to the buffer's 65536"}));
-  // Lost in silence, the end of a stream would leave deInit() waiting for it. The node that fails is not one of
-  // those that take buffers back.
+  // Lost in silence, the end of a stream would leave deInit() waiting for it. The node that fails is not one
+  // of those that take buffers back.
   waitForBusy(1, kOutputs);
   const faults::Fault failed(faults::Failing::NothrowNew, sizeof(SimpleNode));
   componentProduces("the end", 0, OMX_BUFFERFLAG_EOS);
