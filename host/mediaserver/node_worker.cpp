@@ -162,8 +162,7 @@ bool Node::sendInput(Lock& lock) {
     _draining = true;
     _drainTime = view.timestamp;
   }
-  giveBack(kInputPort,
-           buffer);  // the client is told with the output, which is next, or at the latest before a pause
+  giveBack(kInputPort, buffer);  // told together with the output, which is next, or else before the pause
   return true;
 }
 
