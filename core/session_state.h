@@ -38,6 +38,7 @@
 #include <semaphore.h>
 #include <stdint.h>
 
+#include <atomic>
 #include <condition_variable>
 #include <mutex>
 
@@ -82,7 +83,8 @@ struct SessionState {
   // _omxState, which a late or doubled completion of another state may overwrite before the owner looks.
   int32_t awaitedState = OMX_StateInvalid;
   bool awaitedStateReached = false;
-  bool idle = false;  // the component got to Idle and no further; the owner's own
+  // The component got to Idle and no further. The owner's own, but deInit() may come while an init() hangs.
+  std::atomic<bool> idle{false};
 
   // --- Taking the session down -------------------------------------------------------------------------
   // deInit has passed its first wait: nothing goes to the output port any more and no reconfiguration
