@@ -2,6 +2,7 @@
 
 #include <pthread.h>
 #include <sched.h>
+#include <stdio.h>
 
 namespace bench {
 
@@ -12,7 +13,10 @@ Awake::Awake() {
       }
     });
     const sched_param none{};
-    if (pthread_setschedparam(_threads.back().native_handle(), SCHED_IDLE, &none) != 0) _over = true;
+    if (pthread_setschedparam(_threads.back().native_handle(), SCHED_IDLE, &none) != 0) {
+      _over = true;
+      fprintf(stderr, "bridge_bench: the processors may sleep: threads of the lowest priority are refused\n");
+    }
   }
 }
 
