@@ -1,6 +1,7 @@
-// One observer's messages: a queue and the thread that delivers it, strictly in the order in which they were
-// queued. They may be queued under the caller's locks; the observer is called without any lock of ours and
-// never on the caller's thread. The channel does not keep the observer alive, except while it is called.
+// One observer's messages: a queue and the thread that delivers it, one message at a time and strictly in the
+// order in which they were queued. They may be queued under the caller's locks; the observer is called
+// without any lock of ours, on the delivery thread or on one that calls deliver(). The channel does not keep
+// the observer alive, except while it is called.
 #pragma once
 
 #include <functional>
@@ -23,10 +24,10 @@ class MessageChannel {
   // Starts the delivery thread, or does nothing when it runs. False when the system has no thread left.
   [[nodiscard]] bool open();
 
-  // Queues a message; drops it unless the channel is open. `before`, if there is one, runs on the delivery
-  // thread before the message is delivered. The thread need not see the message before the next wake: where a
-  // processor sleeps, to wake one takes longer than all the rest, so messages that come together wake it
-  // once.
+  // Queues a message; drops it unless the channel is open. `before`, if there is one, runs before the message
+  // is delivered, on the same thread. The delivery thread need not see the message before the next wake:
+  // where a processor sleeps, to wake one takes longer than all the rest, so messages that come together wake
+  // it once.
   void queue(const android::omx_message& message, std::function<void()> before = nullptr);
   void wake();
   void post(const android::omx_message& message) {
@@ -34,21 +35,28 @@ class MessageChannel {
     wake();
   }
 
+  // Delivers what waits on the calling thread, which nobody has to wake for it; leaves it to the thread that
+  // delivers at the moment, if one does. The caller holds no lock, and sees to it that the channel, which may
+  // well be closed meanwhile, is still there at the end.
+  void deliver();
+
   // Drops what waits and returns when no delivery is in progress; nothing is delivered from then on until
   // the channel is opened again. Called from inside a delivery, it does not wait for that one.
   void close();
 
  private:
   struct Queue;
-  static void deliver(const MessageChannel* channel, std::shared_ptr<Queue> queue,
-                      const android::wp<android::IOMXObserver>& observer);
+  static void run(const MessageChannel* channel, std::shared_ptr<Queue> queue,
+                  const android::wp<android::IOMXObserver>& observer);
+  std::shared_ptr<Queue> present() const;
   void shut();
+  void awaitEnd();
 
   const android::wp<android::IOMXObserver> _observer;
-  std::mutex _lifecycle;  // guards _thread; held while it is joined
+  std::mutex _lifecycle;  // guards _thread; held while the end of deliveries is waited for
   std::thread _thread;
-  std::mutex _mutex;              // guards _queue
-  std::shared_ptr<Queue> _queue;  // null unless open; shared with the delivery thread
+  mutable std::mutex _mutex;      // guards _queue
+  std::shared_ptr<Queue> _queue;  // the last one opened, null before; shared with those that deliver
 };
 
 }  // namespace mediaserver

@@ -56,14 +56,14 @@ std::shared_ptr<Node> Node::create(android::IOMX::node_id id, const Component& c
                                    const android::sp<android::IOMXObserver>& observer,
                                    std::chrono::milliseconds readingTime) {
   std::shared_ptr<Node> node(new Node(id, component, observer, readingTime));
-  return node->start() ? node : nullptr;
+  return node->start(node) ? node : nullptr;
 }
 
 Node::Node(android::IOMX::node_id id, const Component& component,
            const android::sp<android::IOMXObserver>& observer, std::chrono::milliseconds readingTime)
     : _id(id), _component(component), _readingTime(readingTime), _channel(observer) {}
 
-bool Node::start() {
+bool Node::start(const std::shared_ptr<Node>& self) {
   _codec = _component.factory(*this);
   if (_codec == nullptr) return false;
   const PortPair definitions = _codec->ports();
@@ -76,7 +76,7 @@ bool Node::start() {
   }
   if (!_channel.open()) return false;
   try {
-    _worker = std::thread(&Node::work, this);
+    _worker = std::thread(&Node::work, self);
   } catch (const std::system_error&) {
     return false;
   }
@@ -84,7 +84,6 @@ bool Node::start() {
 }
 
 Node::~Node() {
-  shutdown();
   // The codec may call its host until it is gone.
   _codec.reset();
 }
@@ -97,7 +96,11 @@ void Node::shutdown() {
     _stopping = true;
     _wake.notify_all();
   }
-  if (_worker.joinable()) _worker.join();
+  if (_worker.get_id() == std::this_thread::get_id()) {
+    _worker.detach();  // a delivery of its own: it ends after that, and owns the node until then
+  } else {
+    _worker.join();
+  }
 
   std::array<Port, kPortCount> released;
   std::lock_guard<std::mutex> lock(_mutex);

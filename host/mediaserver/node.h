@@ -1,7 +1,9 @@
 // One instance of a component: OpenMAX IL 1.1 behaviour (states, ports, buffer ownership, events) around a
 // Codec. Every public operation may come from any thread, several at once; none calls the client, and
-// results are IL codes. Completions reach the client through the node's own delivery thread, in order.
-// Owned by shared pointers: the server's table has one, and each call in progress.
+// results are IL codes. Completions reach the client on the node's own threads, one at a time and in order:
+// from the worker itself where it has nothing else to do, since to hand them to another thread costs more than
+// to deliver them, else from the delivery thread, beside the codec's work.
+// Owned by shared pointers: the server's table has one, each call in progress, and the worker.
 //
 // Commands run on the worker thread in the order in which they came, except that one which waits for the
 // client (population, buffers to be freed) lets the others pass.
@@ -66,7 +68,7 @@ class Node final : private CodecHost {
 
   // Ends the node from any state: messages that wait are dropped and none is delivered any more, the work
   // stops, buffers are released. Waits for a delivery and for a codec call in progress (not for a delivery
-  // that it is called from). Every later operation fails. To be called once.
+  // that it is called from). Every later operation fails. To be called once, before the last owner lets go.
   void shutdown();
 
   // Accepts a command; its completion or failure is an event. `param` is a state or a port.
@@ -98,7 +100,7 @@ class Node final : private CodecHost {
 
   Node(android::IOMX::node_id id, const Component& component,
        const android::sp<android::IOMXObserver>& observer, std::chrono::milliseconds readingTime);
-  bool start();
+  bool start(const std::shared_ptr<Node>& self);
 
   // CodecHost.
   void wake() override;
@@ -112,7 +114,7 @@ class Node final : private CodecHost {
   void event(OMX_EVENTTYPE event, OMX_U32 data1, OMX_U32 data2);
   void error(OMX_ERRORTYPE code) { event(OMX_EventError, static_cast<OMX_U32>(code), 0); }
   void completed(OMX_COMMANDTYPE command, OMX_U32 data) { event(OMX_EventCmdComplete, command, data); }
-  // The client hears of it with the next message, or by _channel.wake().
+  // The client hears of it with the next message, or by _channel.wake() or deliver().
   void giveBack(OMX_U32 port, const std::shared_ptr<Buffer>& buffer,
                 std::function<void()> complete = nullptr);
   void giveBackAll(OMX_U32 port);
@@ -151,8 +153,9 @@ class Node final : private CodecHost {
   bool announce();
   bool receiveOutput(Lock& lock);
   bool sendInput(Lock& lock);
-  void finishOutput(const std::shared_ptr<Buffer>& buffer, OutputSpace space);
+  void finishOutput(const std::shared_ptr<Buffer>& buffer, OutputSpace space, Lock& lock);
   void endAnnouncement(Settings next);
+  void deliver(Lock& lock);
   void pause(Lock& lock);
   bool readersAreDone();
   bool changeGeometry(Lock& lock);

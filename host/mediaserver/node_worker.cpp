@@ -13,10 +13,16 @@ void Node::work() {
     _signalled = false;
     _awaitsReader = false;
     if (runCommand(lock) || process(lock)) continue;
-    _channel.wake();
+    deliver(lock);
     pause(lock);
   }
   stopCodec(lock);
+}
+
+void Node::deliver(Lock& lock) {
+  lock.unlock();
+  _channel.deliver();
+  lock.lock();
 }
 
 void Node::pause(Lock& lock) {
@@ -76,14 +82,14 @@ bool Node::receiveOutput(Lock& lock) {
 
   switch (received) {
     case Received::Filled:
-      finishOutput(buffer, std::move(space));
+      finishOutput(buffer, std::move(space), lock);
       return true;
     case Received::Drained:
       if (_draining) {
         OutputSpace end{buffer->data(), buffer->capacity()};
         end.flags = OMX_BUFFERFLAG_EOS;
         end.timestamp = _drainTime;
-        finishOutput(buffer, std::move(end));
+        finishOutput(buffer, std::move(end), lock);
         return true;
       }
       break;
@@ -125,7 +131,7 @@ bool Node::changeGeometry(Lock& lock) {
   return true;
 }
 
-void Node::finishOutput(const std::shared_ptr<Buffer>& buffer, OutputSpace space) {
+void Node::finishOutput(const std::shared_ptr<Buffer>& buffer, OutputSpace space, Lock& lock) {
   buffer->header.nOffset = space.offset;
   buffer->header.nFilledLen = space.length;
   buffer->header.nFlags = space.flags;
@@ -138,7 +144,11 @@ void Node::finishOutput(const std::shared_ptr<Buffer>& buffer, OutputSpace space
     event(OMX_EventBufferFlag, kOutputPort, space.flags);
   }
   giveBack(kOutputPort, buffer, std::move(space.complete));
-  _channel.wake();
+  if (_ports[kInputPort].line.empty()) {
+    deliver(lock);
+  } else {
+    _channel.wake();  // the codec goes on beside the delivery
+  }
 }
 
 bool Node::sendInput(Lock& lock) {
