@@ -62,8 +62,8 @@ struct OutputSpace {
   OMX_U32 flags = 0;
   OMX_TICKS timestamp = 0;
   // What is left to be written, if anything. It runs on the worker thread, or, while there is more input, on
-  // the delivery thread just before the client hears of the buffer, and perhaps never: the codec goes on
-  // meanwhile, and may even be gone.
+  // the channel's just before the client hears of the buffer, and perhaps never: the codec goes on meanwhile,
+  // and may even be gone.
   std::function<void()> complete = nullptr;
 };
 
