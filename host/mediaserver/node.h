@@ -1,9 +1,9 @@
 // One instance of a component: OpenMAX IL 1.1 behaviour (states, ports, buffer ownership, events) around a
 // Codec. Every public operation may come from any thread, several at once; none calls the client, and
 // results are IL codes. Completions reach the client on the node's own threads, one at a time and in order:
-// from the worker itself where it has nothing else to do, since to hand them to another thread costs more than
-// to deliver them, else from the delivery thread, beside the codec's work.
-// Owned by shared pointers: the server's table has one, each call in progress, and the worker.
+// from the worker itself where it has nothing else to do, since to hand them to another thread costs more
+// than to deliver them, else from the delivery thread, beside the codec's work. Owned by shared pointers: the
+// server's table has one, each call in progress, and the worker.
 //
 // Commands run on the worker thread in the order in which they came, except that one which waits for the
 // client (population, buffers to be freed) lets the others pass.
