@@ -4,6 +4,7 @@
 #include <errno.h>
 #include <pthread.h>
 
+#include <atomic>
 #include <new>
 #include <type_traits>
 
@@ -13,10 +14,9 @@ namespace faults {
 
 namespace {
 
-// Accessed atomically, also by a malloc() that is called before the program is up: no constructors.
-size_t g_failing[4];  // by function; 0: none
+std::atomic<size_t> g_failing[3];  // by function; 0: none
 
-size_t& failing(Failing function) {
+std::atomic<size_t>& failing(Failing function) {
   return g_failing[static_cast<size_t>(function)];
 }
 
@@ -29,19 +29,15 @@ bool isProduct(void* code) {
 }
 
 // True for the one allocation that is to fail.
-__attribute__((no_sanitize("address", "thread", "undefined"))) bool failsNow(Failing function, size_t size,
-                                                                             void* caller) {
-  size_t* const place = &g_failing[static_cast<size_t>(function)];
+bool failsNow(Failing function, size_t size, void* caller) {
   size_t expected = size;
-  return size != 0 && __atomic_load_n(place, __ATOMIC_SEQ_CST) == size && isProduct(caller) &&
-         __atomic_compare_exchange_n(place, &expected, size_t{0}, false, __ATOMIC_SEQ_CST, __ATOMIC_SEQ_CST);
+  return size != 0 && failing(function) == size && isProduct(caller) &&
+         failing(function).compare_exchange_strong(expected, 0);
 }
 
 bool threadFailsNow() {
-  size_t* const place = &failing(Failing::Thread);
-  size_t left = __atomic_load_n(place, __ATOMIC_SEQ_CST);
-  while (left > 0 &&
-         !__atomic_compare_exchange_n(place, &left, left - 1, false, __ATOMIC_SEQ_CST, __ATOMIC_SEQ_CST)) {
+  size_t left = failing(Failing::Thread);
+  while (left > 0 && !failing(Failing::Thread).compare_exchange_weak(left, left - 1)) {
   }
   return left == 1;
 }
@@ -49,13 +45,10 @@ bool threadFailsNow() {
 }  // namespace
 
 Fault::Fault(Failing function, size_t number) : _function(function) {
-  __atomic_store_n(&failing(function), number, __ATOMIC_SEQ_CST);
+  failing(function) = number;
 }
 Fault::~Fault() {
-  __atomic_store_n(&failing(_function), size_t{0}, __ATOMIC_SEQ_CST);
-}
-size_t Fault::left() const {
-  return __atomic_load_n(&failing(_function), __ATOMIC_SEQ_CST);
+  failing(_function) = 0;
 }
 
 }  // namespace faults
@@ -76,33 +69,18 @@ void* operator new(size_t size, const std::nothrow_t& /*unused*/) noexcept {
                                                                                   : ::operator new(size);
 }
 
-void* operator new(size_t size, std::align_val_t alignment, const std::nothrow_t& /*unused*/) noexcept {
-  return faults::failsNow(Failing::NothrowNew, size, __builtin_return_address(0))
-             ? nullptr
-             : ::operator new(size, alignment);
-}
-
-// Where a sanitizer is part of the executable, its own forms are behind these names.
-#define REPLACED extern "C" __attribute__((visibility("default")))
+// Where a sanitizer is part of the executable, its own form is behind this name.
 extern "C" {
-void* __interceptor_malloc(size_t size) __attribute__((weak));
-void* __libc_malloc(size_t size);
 int __interceptor_pthread_create(pthread_t*, const pthread_attr_t*, void* (*)(void*), void*)
     __attribute__((weak));
-}
 
-// Called before the program, and the sanitizers, are up: nothing in here may need them.
-REPLACED __attribute__((no_sanitize("address", "thread", "undefined"))) void* malloc(size_t size) {
-  if (faults::failsNow(Failing::Malloc, size, __builtin_return_address(0))) return nullptr;
-  return __interceptor_malloc != nullptr ? __interceptor_malloc(size) : __libc_malloc(size);
-}
-
-REPLACED int pthread_create(pthread_t* thread, const pthread_attr_t* attributes, void* (*entry)(void*),
-                            void* argument) {
+__attribute__((visibility("default"))) int pthread_create(pthread_t* thread, const pthread_attr_t* attributes,
+                                                          void* (*entry)(void*), void* argument) {
   if (faults::threadFailsNow()) return EAGAIN;
   static auto* const create =
       __interceptor_pthread_create != nullptr
           ? &__interceptor_pthread_create
           : reinterpret_cast<decltype(&pthread_create)>(dlsym(RTLD_NEXT, "pthread_create"));
   return create(thread, attributes, entry, argument);
+}
 }

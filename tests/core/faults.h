@@ -8,7 +8,7 @@
 namespace faults {
 
 // The functions that can be made to fail once.
-enum class Failing { New, NothrowNew, Malloc, Thread };
+enum class Failing { New, NothrowNew, Thread };
 
 // Fails the product's next allocation of exactly `number` bytes on any thread, or the `number`-th
 // pthread_create() from now on, counting from 1; 0: none.
@@ -18,9 +18,6 @@ class Fault {
   ~Fault();
   Fault(const Fault&) = delete;
   Fault& operator=(const Fault&) = delete;
-
-  // Threads that can be made up to the one that fails; of an allocation, its bytes until it has failed.
-  size_t left() const;
 
  private:
   const Failing _function;

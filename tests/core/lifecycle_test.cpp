@@ -1,6 +1,6 @@
 // The way to the component, and what comes back through the observer; init() and deInit(): what they wait
-// for, what a refused call leaves behind, and destruction while others are inside, which ends every wait,
-// lets everyone leave, and only then frees anything.
+// for, what a refusal leaves behind, and destruction while others are inside, which ends every wait, lets
+// everyone leave, and only then frees anything.
 #include <binder/MemoryHeapBase.h>
 #include <omxhost/services.h>
 
@@ -13,7 +13,14 @@ namespace {
 
 using faults::Failing;
 
-using LifecycleTest = SessionTest;
+class LifecycleTest : public SessionTest {
+ protected:
+  // The session as such, with an encoder's component and no way to it.
+  void construct() {
+    _session = std::make_unique<OmxInterface>();
+    _session->_isEncoder = true;
+  }
+};
 
 TEST_F(LifecycleTest, AsksForIomxOnce) {
   construct();
@@ -24,10 +31,11 @@ TEST_F(LifecycleTest, AsksForIomxOnce) {
   EXPECT_EQ(deInit(), OMXI_ERR_SEND_COMMAND_STATE);
   _server.unregister();
   EXPECT_EQ(_session->acquireOmxFromMediaPlayer(), OMXI_ERR_MEDIA_PLAYER_SERVICE);
-  _server.serveWithoutOmx();
+  _server.serve(nullptr);
   EXPECT_EQ(_session->acquireOmxFromMediaPlayer(), OMXI_ERR_IOMX);
+  EXPECT_EQ(log().back(), "E OMXINTERFACE: MEDIA PLAYER SERVICE CANNOT GET IOMX INTERFACE");
   _server.unregister();
-  _server.serve();
+  _server.serve(&omx());
   EXPECT_EQ(_session->acquireOmxFromMediaPlayer(), OMXI_OK);
   _server.unregister();
   EXPECT_EQ(_session->acquireOmxFromMediaPlayer(), OMXI_OK);  // nobody is asked again
@@ -42,32 +50,27 @@ TEST_F(LifecycleTest, AsksForIomxOnce) {
 TEST_F(LifecycleTest, LeavesTheRestOfAFailedSetUpToDestruction) {
   const std::tuple<Failing, size_t, int> cases[] = {
       {Failing::New, sizeof(OmxCodecObserver), OMXI_ERR_CREATE_OBSERVER},
-      {Failing::NothrowNew, sizeof(CQcomBoardPlatformWrapper), OMXI_ERR_NO_PLATFORM_WRAPPER}};
-  for (const auto& [function, size, code] : cases) {
+      {Failing::NothrowNew, sizeof(CQcomBoardPlatformWrapper), OMXI_ERR_NO_PLATFORM_WRAPPER},
+      {Failing::Thread, 1, OMXI_ERR_ALLOCATE_COMPONENT}};  // of the node
+  for (const auto& [function, number, code] : cases) {
     construct();
-    const faults::Fault failed(function, size);
+    const faults::Fault failed(function, number);
     EXPECT_EQ(_session->setupIOMXConnections(), code);
     destroy();
   }
   EXPECT_TRUE(omxhost::isThreadPoolStarted());
-  EXPECT_EQ(trace(),
-            (Trace{"listNodes", "listNodes", "allocateNode OMX.qcom.video.encoder.avc", "freeNode"}));
-}
-
-TEST_F(LifecycleTest, PassesTheComponentsHeapOnAndLogsMessagesItDoesNotKnow) {
-  connect();
-  const android::sp<OmxCodecObserver> observer = _session->_observer;
-  const android::sp<android::IMemoryHeap> heap = new android::MemoryHeapBase(4096);
-  observer->registerBuffers(heap);
-  EXPECT_EQ(_session->_mpMemHeap.get(), heap.get());
-  android::omx_message unknown{};
-  unknown.type = static_cast<decltype(unknown.type)>(3);
-  deliver(unknown);
-  EXPECT_EQ(log(), LogLines{"E OMXINTERFACE - OnMessage :: default called, message not handled\n"});
+  EXPECT_EQ(trace(), (Trace{"listNodes", "listNodes", "allocateNode OMX.qcom.video.encoder.avc", "freeNode",
+                            "listNodes", "allocateNode OMX.qcom.video.encoder.avc failed"}));
+  for (const size_t thread : {1u, 2u}) {
+    ASSERT_EQ(createDecoder(), OMXI_OK);
+    const faults::Fault failed(Failing::Thread, thread);
+    EXPECT_EQ(_session->init(), thread == 1 ? OMXI_ERR_CREATE_EVENT_THREAD : OMXI_ERR_CREATE_OUTPUT_THREAD);
+    destroy();
+  }
 }
 
 TEST_F(LifecycleTest, WaitsForEachStateThatItAsksFor) {
-  connect();
+  ASSERT_EQ(createEncoder(), OMXI_OK);
   messages().hold(anyEvent());
   Later<int> starting = beginInit();
   for (const OMX_U32 state : {OMX_StateIdle, OMX_StateExecuting}) {
@@ -78,22 +81,25 @@ TEST_F(LifecycleTest, WaitsForEachStateThatItAsksFor) {
     EXPECT_EQ(static_cast<OMX_U32>(_session->_omxState), state - 1);
     deliverEvent(OMX_EventCmdComplete, OMX_CommandFlush, state);
     deliverEvent(OMX_EventError, 0x80001001, 7);  // logged, no more
-    requireEventually([this] { return valueOf(_session->_semStateChanged) == 0; }, "a look at the state");
+    requireEventually([this] { return isIdle(_session->_semStateChanged); }, "a look at the state");
     waitForSleeper(&SessionState::stateWaiters);
     EXPECT_FALSE(starting.isDone());
     EXPECT_EQ(omx().count(Method::SendCommand), state - 1);
     EXPECT_TRUE(messages().release());
   }
   EXPECT_EQ(starting.result(), OMXI_OK);
-  messages().passAll();
   EXPECT_EQ(log(), LogLines(2, "E OMXINTERFACE - Event error = -2147479551(0x80001001), data2 7 \n"));
   int seen = 0;
   _application.onInput([&] { seen = _session->threadError(); });
   _session->setThreadError(OMXI_ERR_EVENT_ERROR);
   EXPECT_EQ(seen, OMXI_ERR_EVENT_ERROR);  // it can be read when the callback comes
-  _session->registerInputCallback(nullptr, nullptr);
-  _session->setThreadError(OMXI_ERR_APPLICATION);
-  EXPECT_EQ(_application.inputCallbacks(), std::vector<void*>{_session.get()});
+  const android::sp<android::IMemoryHeap> heap = new android::MemoryHeapBase(4096);
+  _session->_observer->registerBuffers(heap);
+  EXPECT_EQ(_session->_mpMemHeap.get(), heap.get());
+  android::omx_message unknown{};
+  unknown.type = static_cast<decltype(unknown.type)>(3);
+  deliver(unknown);
+  EXPECT_EQ(log().back(), "E OMXINTERFACE - OnMessage :: default called, message not handled\n");
 }
 
 TEST_F(LifecycleTest, CanBeTakenDownAgainAfterARefusal) {
@@ -113,37 +119,37 @@ TEST_F(LifecycleTest, CanBeTakenDownAgainAfterARefusal) {
   before = omx().count();
   EXPECT_EQ(deInit(), OMXI_ERR_EVENT_ERROR);
   EXPECT_EQ(trace(before)[0], "sendCommand state 1");  // the component is in Idle already
-  const size_t after = omx().count();
+  before = omx().count();
   EXPECT_EQ(deInit(), OMXI_ERR_EVENT_ERROR);
-  EXPECT_EQ(omx().count(), after);
+  EXPECT_EQ(omx().count(), before);
 }
 
 TEST_F(LifecycleTest, DestructionWaitsForEveryOperationInProgress) {
-  // One operation of each kind is in the middle of its call to the component.
+  // One operation of each kind is in the middle of its call to the component, or of a callback.
   const struct {
     Method method;
-    int (*operation)(OmxInterface& session, void* kept);
+    std::function<int(OmxInterface& session)> operation;
     int result;
   } operations[] = {
-      {Method::UseBuffer, [](auto& session, void*) { return session.init(); }, 20},
-      {Method::EmptyBuffer, [](auto& session, void*) { return session.sendInputData(nullptr, 0, 0); }, 0},
-      {Method::EmptyBuffer, [](auto& session, void*) { return session.sendEndOfInputFlag(0); }, 0},
-      {Method::ListNodes, [](auto& session, void*) { return session.sendInputData(nullptr, 0, 0); }, 0},
-      {Method::GetParameter, [](auto& session, void*) { return session.setupPortParameters(0, 16, 16, 0); },
-       14},
-      {Method::FillBuffer, [](auto& session, void* kept) { return session.returnIomxOutputBuffer(kept), 0; },
+      {Method::UseBuffer, [](auto& session) { return session.init(); }, 20},
+      {Method::EmptyBuffer, [](auto& session) { return session.sendInputData(nullptr, 0, 0); }, 0},
+      {Method::EmptyBuffer, [](auto& session) { return session.sendEndOfInputFlag(0); }, 0},
+      {Method::ListNodes, [](auto& session) { return session.sendInputData(nullptr, 0, 0); }, 0},
+      {Method::GetParameter, [](auto& session) { return session.setupPortParameters(0, 16, 16, 0); }, 14},
+      {Method::FillBuffer,
+       [this](auto& session) {
+         return session.returnIomxOutputBuffer(_application.outputs().back().bufferId), 0;
+       },
        0},
-      {Method::SendCommand, [](auto& session, void*) { return session.deInit(); }, OMXI_ERR_APPLICATION},
+      {Method::SendCommand, [](auto& session) { return session.deInit(); }, OMXI_ERR_APPLICATION},
   };
   for (const auto& [method, call, result] : operations) {
     Gate& gate = newGate();
-    void* kept = nullptr;
-    connect();
+    ASSERT_EQ(createEncoder(), OMXI_OK);
     if (method != Method::UseBuffer) {
       ASSERT_EQ(init(), OMXI_OK);
       _application.onOutput([](const Output&) { return 1; });
       feedThrough("kept");
-      kept = _application.outputs().back().bufferId;
     }
     if (method == Method::SendCommand) _session->setThreadError(OMXI_ERR_APPLICATION);
     omx().before(method, [&](const Call&) { gate.pass(); });
@@ -151,8 +157,7 @@ TEST_F(LifecycleTest, DestructionWaitsForEveryOperationInProgress) {
       _application.onOutput([&](const Output&) { return gate.pass(), 0; });
       _application.onInput([&] { gate.pass(); });
     }
-    Later<int> operation("the operation",
-                         [kept, call = call, session = _session.get()] { return call(*session, kept); });
+    Later<int> operation("the operation", [call = call, session = _session.get()] { return call(*session); });
     gate.waitForArrival();
     Later<bool> destroyed = beginDestroyOfBusySession();
     gate.open();

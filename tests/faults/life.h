@@ -1,57 +1,65 @@
-// A session's whole life as an application leads it, through the C interface: each step until nothing moves
-// any more, so that all lives of a kind take the same way up to their fault.
+// A session's whole life as an application leads it, through the C interface, with one fault in it: each step
+// until nothing moves any more, so that all lives of a kind take the same way up to their fault. A life
+// without a fault counts the places at which one could happen: it is the only list of them that there is.
 #pragma once
 
-#include <functional>
 #include <map>
 #include <optional>
 #include <string>
 
-#include "tests/faults/injector.h"
-#include "tests/faults/worker.h"
+#include "tests/support/scripted_media_server.h"
 
 namespace omxtest {
+
+// What an application does in its order; only a decoder's output is reconfigured.
+enum class Step { Create, Configure, Init, Feed, Reconfigure, FeedMore, EndOfInput, DeInit, Destroy };
+inline constexpr size_t kFrames = 2;  // of each feeding step
+
+// What goes wrong with an IOMX call, or with a message.
+enum class Kind {
+  None,
+  Refused,   // the call
+  Withheld,  // the message, until a call cannot go on without it
+  Delayed,   // ... until nothing else moves any more
+  Late,      // ... until the session is gone
+  Doubled,   // twice in a row
+  Forged     // with the id of no buffer, an event with that of no node
+};
+
+struct Fault {
+  Kind kind = Kind::None;
+  size_t number = 0;  // which call or message, from 1
+};
+
+// Where the fault has happened.
+struct Hit {
+  Step step{};
+  size_t nth = 0;  // of its like in that step, from 1
+  Call call;       // of a refused one
+  OMX_U32 port = 0;
+  android::omx_message message{};  // as the component sent it
+};
 
 struct Outcome {
   std::map<Step, int> results;  // of the steps that were taken; of several calls the first that is not 0
   std::optional<Step> stuck;    // the one that had to be helped: nobody was going to end its wait
-  std::string hang;             // what did not end in spite of that; empty: nothing
+  bool hung = false;            // in spite of that
   size_t pictures = 0;          // delivered
+  size_t calls = 0;             // to IOMX
+  size_t messages = 0;
+  std::optional<Hit> hit;  // empty if there were fewer than the fault's number
 };
 
-class Life {
- public:
-  static constexpr size_t kFrames = 2;  // of each feeding step
+const char* name(Step step);
+// A fault and where it happened, in words.
+std::string describe(const Fault& fault, const std::optional<Hit>& hit);
 
-  // The calls are the owner's; `other` destroys the session while the owner is stuck.
-  Life(ScriptedMediaServer& server, Injector& injector, bool encoding, Worker& owner, Worker& other)
-      : _server(server), _injector(injector), _encoding(encoding), _owner(owner), _other(other) {}
+Outcome live(ScriptedMediaServer& server, const Fault& fault, bool encoding);
 
-  Outcome live();
-
- private:
-  // One call; false when the session is gone.
-  bool take(Step step, const std::function<int()>& call);
-  bool create();
-  int configure();
-  bool feed(Step step);
-  bool run();
-  void help(Step step);
-  bool ends(const std::function<bool()>& ended);
-  void settle();
-
-  static int onInput(void* /*session*/, void* /*context*/) { return 0; }
-  static int onOutput(void* first, void* data, unsigned int length, void* bufferId, void* context,
-                      unsigned int timestamp);
-
-  ScriptedMediaServer& _server;
-  Injector& _injector;
-  const bool _encoding;
-  Worker& _owner;
-  Worker& _other;
-  void* _session = nullptr;
-  std::atomic<size_t> _pictures{0};
-  Outcome _outcome;
-};
+// Whether there was a moment in this call at which every other thread of the process slept. A call that has
+// not come back then waits for something that nobody is going to bring, so a hang is found at once and
+// without a limit of time. A wait with such a limit counts as sleep: those of tests are longer than a test
+// may take.
+bool atStandstill();
 
 }  // namespace omxtest

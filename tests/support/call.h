@@ -62,7 +62,6 @@ struct Call {
   OMX_U32 flags = 0;
   OMX_TICKS timestamp = 0;
   OMX_BOOL enable = OMX_FALSE;  // StoreMetaDataInBuffers
-  bool forwarded = true;        // false: failed on request
   android::status_t status = android::OK;
 
   // The record as a T; nothing if it is shorter.

@@ -5,6 +5,7 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cstddef>
 #include <map>
 #include <string>
@@ -52,17 +53,20 @@ Record makeRecord(OMX_U32 port) {
 
 class OmxClient {
  public:
-  using BufferId = android::IOMX::buffer_id;
+  using Definition = mediaserver::PortDefinition;
   struct Buffer {
-    BufferId id = nullptr;
+    android::IOMX::buffer_id id = nullptr;
     android::sp<android::IMemory> block;  // null: allocated by the component
     uint8_t* data = nullptr;
     size_t size = 0;
   };
 
   // Allocates the node; a failure is the test's.
-  OmxClient(const android::sp<android::IOMX>& omx, const char* component);
-  ~OmxClient();  // frees the node
+  OmxClient(const android::sp<android::IOMX>& omx, const char* component)
+      : _omx(omx), _observer(new CollectingObserver) {
+    EXPECT_EQ(_omx->allocateNode(component, _observer, &_node), kOk) << component;
+  }
+  ~OmxClient() { free(); }
   OmxClient(const OmxClient&) = delete;
   OmxClient& operator=(const OmxClient&) = delete;
 
@@ -73,10 +77,24 @@ class OmxClient {
   android::status_t command(OMX_COMMANDTYPE command, OMX_U32 param) {
     return _omx->sendCommand(_node, command, static_cast<OMX_S32>(param));
   }
-  android::status_t free();  // freeNode; the destructor then leaves it
-  OMX_STATETYPE state() const;
-  mediaserver::PortDefinition definition(OMX_U32 port) const;
-  android::status_t define(OMX_U32 port, const mediaserver::PortDefinition& definition);
+  android::status_t free() {
+    const android::IOMX::node_id node = std::exchange(_node, nullptr);
+    return node != nullptr ? _omx->freeNode(node) : kOk;
+  }
+  OMX_STATETYPE state() const {
+    OMX_STATETYPE state = OMX_StateInvalid;
+    EXPECT_EQ(_omx->getState(_node, &state), kOk);
+    return state;
+  }
+  Definition definition(OMX_U32 port) const {
+    auto definition = makeRecord<Definition>(port);
+    EXPECT_EQ(get(OMX_IndexParamPortDefinition, &definition), kOk);
+    return definition;
+  }
+  android::status_t define(OMX_U32 port, Definition definition) {
+    definition.nPortIndex = port;
+    return set(OMX_IndexParamPortDefinition, definition);
+  }
   template <typename Record>
   android::status_t get(OMX_INDEXTYPE index, Record* record) const {
     return _omx->getParameter(_node, index, record, sizeof(*record));
@@ -99,34 +117,66 @@ class OmxClient {
   // Gives one buffer of the port's size, or of `size` bytes.
   android::status_t give(OMX_U32 port, size_t size = 0);
   // Gives what the definition asks for.
-  void populate(OMX_U32 port);
-  android::status_t freeBuffer(OMX_U32 port, size_t which = 0);
-  void freeBuffers(OMX_U32 port);
+  void populate(OMX_U32 port) {
+    for (OMX_U32 left = definition(port).nBufferCountActual; left > 0; --left) EXPECT_EQ(give(port), kOk);
+  }
+  android::status_t freeBuffer(OMX_U32 port, size_t which = 0) {
+    const android::IOMX::buffer_id id = _buffers[port].at(which).id;
+    _buffers[port].erase(_buffers[port].begin() + static_cast<ptrdiff_t>(which));
+    return _omx->freeBuffer(_node, port, id);
+  }
+  void freeBuffers(OMX_U32 port) {
+    while (!_buffers[port].empty()) EXPECT_EQ(freeBuffer(port), kOk);
+  }
   const std::vector<Buffer>& buffers(OMX_U32 port) const { return _buffers[port]; }
 
   // The whole way to a state through the states between, with buffers given.
-  void toIdle();
-  void toExecuting();
+  void toIdle() {
+    EXPECT_EQ(command(OMX_CommandStateSet, OMX_StateIdle), kOk);
+    for (OMX_U32 port = 0; port < mediaserver::kPortCount; ++port) populate(port);
+    expectComplete(OMX_CommandStateSet, OMX_StateIdle);
+  }
+  void toExecuting() {
+    toIdle();
+    complete(OMX_CommandStateSet, OMX_StateExecuting);
+    messages().clear();
+  }
 
   android::status_t fill(size_t which) {
     return _omx->fillBuffer(_node, _buffers[mediaserver::kOutputPort].at(which).id);
   }
-  void fillAll();
-  android::status_t empty(size_t which, std::string_view text, OMX_U32 flags = 0, OMX_TICKS timestamp = 0);
+  void fillAll() {
+    for (size_t i = 0; i < _buffers[mediaserver::kOutputPort].size(); ++i) EXPECT_EQ(fill(i), kOk);
+  }
+  android::status_t empty(size_t which, std::string_view text, OMX_U32 flags = 0, OMX_TICKS timestamp = 0) {
+    const Buffer& buffer = _buffers[mediaserver::kInputPort].at(which);
+    std::copy_n(text.begin(), std::min(text.size(), buffer.size), buffer.data);
+    return _omx->emptyBuffer(_node, buffer.id, 0, static_cast<OMX_U32>(text.size()), flags, timestamp);
+  }
 
   // Waits for `count` messages that match, counted from the last clear.
-  void expect(const Match& match, size_t count = 1);
+  void expect(const Match& match, size_t count = 1) {
+    EXPECT_TRUE(messages().waitFor(match, count))
+        << "heard " << ::testing::PrintToString(heard()) << " and waited for " << count;
+  }
   void expectComplete(OMX_COMMANDTYPE command, OMX_U32 data) { expect(commandComplete(command, data)); }
   // Sends a command and waits until it is complete.
   void complete(OMX_COMMANDTYPE kind, OMX_U32 param) {
-    EXPECT_EQ(command(kind, param), android::OK);
+    EXPECT_EQ(command(kind, param), kOk);
     expectComplete(kind, param);
   }
-  // A filled buffer, and the outputs so far, as the client reads them.
-  Packet output(const android::omx_message& filled) const;
+  // The outputs so far, as the client reads them.
   std::vector<Packet> outputs() const;
   // All messages in a few words.
-  std::vector<std::string> heard() const;
+  std::vector<std::string> heard() const {
+    std::vector<std::string> words;
+    for (const auto& message : _observer->messages.all()) words.push_back(describe(message));
+    return words;
+  }
+
+ protected:
+  // A filled buffer.
+  Packet output(const android::omx_message& filled) const;
 
  private:
   const android::sp<android::IOMX> _omx;
@@ -134,7 +184,7 @@ class OmxClient {
   android::IOMX::node_id _node = nullptr;
   Giving _giving[mediaserver::kPortCount] = {Giving::Use, Giving::Use};
   std::vector<Buffer> _buffers[mediaserver::kPortCount];
-  std::map<BufferId, Buffer> _given;  // also those that were freed: messages may still name them
+  std::map<android::IOMX::buffer_id, Buffer> _given;  // also freed ones: messages may still name them
 };
 
 }  // namespace omxtest

@@ -55,13 +55,10 @@ bool isStandard(OMX_INDEXTYPE index) {
          index == OMX_IndexParamStandardComponentRole || index == OMX_IndexParamCompBufferSupplier;
 }
 
-// The word behind the header, which names the port, or one further on.
-OMX_U32 wordAt(const void* record, size_t size, size_t index) {
-  OMX_U32 word = 0xFFFFFFFF;
-  const size_t offset = kHeaderBytes + index * sizeof(word);
-  if (size >= offset + sizeof(word))
-    std::memcpy(&word, static_cast<const uint8_t*>(record) + offset, sizeof(word));
-  return word;
+OMX_U32 portOf(const uint8_t* record) {
+  OMX_U32 port = 0;
+  std::memcpy(&port, record + kHeaderBytes, sizeof(port));
+  return port;
 }
 
 // A picture's size decides the size of buffers that hold one.
@@ -92,52 +89,34 @@ class ScriptedCodec final : public mediaserver::Codec {
   std::vector<mediaserver::VideoFormat> formats(OMX_U32 port) const override {
     return _script.read(_script._formats).at(port);
   }
-  // What storeMetaDataInBuffers needs; it takes false and refuses true.
+  // What storeMetaDataInBuffers needs.
   std::vector<mediaserver::Extension> extensions() const override {
     return {{"OMX.google.android.index.storeMetaDataInBuffers", kMetaData}};
   }
   OMX_ERRORTYPE definePort(OMX_U32 port, const PortDefinition& wanted, PortPair& ports) override {
-    const Lock lock(_script._mutex);
-    const auto& before = ports[port].format.video;
-    const auto& after = wanted.format.video;
-    const bool resized = before.nFrameWidth != after.nFrameWidth || before.nFrameHeight != after.nFrameHeight;
     ports[port] = wanted;
-    if (resized && port == kInputPort && !_script._portsAreSeparate) {
-      auto& output = ports[kOutputPort].format.video;
-      output.nFrameWidth = after.nFrameWidth;
-      output.nFrameHeight = after.nFrameHeight;
-      fitPicture(&ports[kOutputPort]);
-    }
     fitPicture(&ports[port]);
     return OMX_ErrorNone;
   }
   Answer getParameter(OMX_INDEXTYPE index, void* record, size_t size) override {
     const Lock lock(_script._mutex);
-    const auto answer = _script._answers.find(index);
-    const auto written = _script._records.find(index);
-    const bool answered =
-        answer != _script._answers.end() &&
-        (index != OMX_IndexParamPortDefinition ||
-         wordAt(answer->second.data(), answer->second.size(), 0) == wordAt(record, size, 0));
-    if (!answered && isStandard(index)) return {};
-    if (size < kRecordBytes) return OMX_ErrorBadParameter;
-    const bool isWritten = written != _script._records.end();
-    const auto* const source = answered ? &answer->second : isWritten ? &written->second : nullptr;
+    if (size < kRecordBytes) return isStandard(index) ? Answer() : OMX_ErrorBadParameter;
     auto* const bytes = static_cast<uint8_t*>(record);
-    // Unanswered and unwritten: zeros behind the port, which is the client's.
-    for (size_t i = source != nullptr ? kHeaderBytes : kRecordBytes; i < size; ++i) {
-      bytes[i] = source != nullptr && i < source->size() ? (*source)[i] : 0;
+    const auto found = _script._answers.find(index);
+    const bool answered = found != _script._answers.end() && (index != OMX_IndexParamPortDefinition ||
+                                                              portOf(found->second.data()) == portOf(bytes));
+    if (!answered && isStandard(index)) return {};
+    if (answered) {
+      std::copy(found->second.begin() + kHeaderBytes,
+                found->second.begin() + std::min(size, found->second.size()), bytes + kHeaderBytes);
+    } else {
+      std::fill(bytes + kRecordBytes, bytes + size, uint8_t{0});  // behind the port, which is the client's
     }
     return OMX_ErrorNone;
   }
-  Answer setParameter(OMX_INDEXTYPE index, const void* record, size_t size) override {
-    const Lock lock(_script._mutex);
+  Answer setParameter(OMX_INDEXTYPE index, const void* /*record*/, size_t size) override {
     if (isStandard(index)) return {};
-    if (size < kRecordBytes) return OMX_ErrorBadParameter;
-    if (index == kMetaData && wordAt(record, size, 1) != OMX_FALSE) return OMX_ErrorUnsupportedSetting;
-    const auto* const bytes = static_cast<const uint8_t*>(record);
-    _script._records[index].assign(bytes, bytes + size);
-    return OMX_ErrorNone;
+    return size < kRecordBytes ? OMX_ErrorBadParameter : OMX_ErrorNone;
   }
   Answer getConfig(OMX_INDEXTYPE index, void* record, size_t size) override {
     return getParameter(index, record, size);
@@ -235,10 +214,9 @@ class ScriptedCodec final : public mediaserver::Codec {
 Script::Script(Kind kind) : _kind(kind) {
   const bool decoder = kind == Kind::Decoder;
   _ports = {defaultPort(decoder, 4), defaultPort(!decoder, decoder ? 8 : 6)};
-  auto& compressed = _formats[decoder ? kInputPort : kOutputPort];
-  compressed = {{OMX_VIDEO_CodingAVC, OMX_COLOR_FormatUnused}};
-  for (const auto coding : {OMX_VIDEO_CodingMPEG4, OMX_VIDEO_CodingH263, OMX_VIDEO_CodingWMV}) {
-    if (decoder) compressed.push_back({coding, OMX_COLOR_FormatUnused});
+  for (const auto coding :
+       {OMX_VIDEO_CodingAVC, OMX_VIDEO_CodingMPEG4, OMX_VIDEO_CodingH263, OMX_VIDEO_CodingWMV}) {
+    _formats[decoder ? kInputPort : kOutputPort].push_back({coding, OMX_COLOR_FormatUnused});
   }
   _formats[decoder ? kOutputPort : kInputPort] = {{OMX_VIDEO_CodingUnused, OMX_COLOR_FormatYUV420SemiPlanar},
                                                   {OMX_VIDEO_CodingUnused, kTiPackedSemiPlanar}};
@@ -280,13 +258,6 @@ void Script::raiseError(OMX_ERRORTYPE error) {
 
 void Script::wakeAll() {
   for (ScriptedCodec* codec : _codecs) codec->_host.wake();
-}
-
-size_t Script::waiting() const {
-  const Lock lock(_mutex);
-  size_t sum = 0;
-  for (const ScriptedCodec* codec : _codecs) sum += codec->_line.size();
-  return sum;
 }
 
 }  // namespace omxtest

@@ -1,7 +1,8 @@
 #pragma once
 // What a test tells a scripted component, and what it can ask it. The component runs behind the media
 // server's real node, so states, ports, buffers and events follow OpenMAX rules; the script decides the
-// rest. Unscripted, it takes each input and produces one output with the same bytes, time stamp and flags.
+// rest. Unscripted, it takes each input and produces one output with the same bytes, time stamp and flags;
+// its output keeps its size when a client gives the input another one.
 //
 // One Script belongs to one entry of the server's component list and outlives the server. What concerns
 // definitions and start is read when a node is allocated; everything else works at once, on all nodes of
@@ -16,8 +17,6 @@
 #include <optional>
 #include <set>
 #include <string>
-#include <type_traits>
-#include <utility>
 #include <vector>
 
 #include <OMX_Core.h>
@@ -52,21 +51,16 @@ class Script {
   void editPort(OMX_U32 port, const PortEdit& edit) {
     change([&] { edit(_ports.at(port)); });
   }
-  // Defaults: AVC, MPEG-4, H.263, WMV (an encoder: AVC); 21 and TI's 0x7F000100.
+  // Defaults: AVC, MPEG-4, H.263, WMV; 21 and TI's 0x7F000100.
   void setFormats(OMX_U32 port, const std::vector<mediaserver::VideoFormat>& formats) {
     change([&] { _formats.at(port) = formats; });
-  }
-  // The output keeps its size when a client gives the input another one.
-  void separatePorts() {
-    change([&] { _portsAreSeparate = true; });
   }
 
   // What reading `index` gives from now on: everything behind the record's first two words. Also for port
   // definitions (of the record's port), where the node itself goes on by its own.
-  // Without an answer, reading gives what was last written, or zeros.
+  // Without an answer, reading gives zeros.
   template <typename Record>
   void answer(OMX_INDEXTYPE index, const Record& record) {
-    static_assert(std::is_trivially_copyable_v<Record>);
     const auto* const bytes = reinterpret_cast<const uint8_t*>(&record);
     change([&] { _answers[index].assign(bytes, bytes + sizeof(record)); });
   }
@@ -80,11 +74,15 @@ class Script {
 
   // The component keeps all inputs (their EMPTY_BUFFER_DONE does not come) until `count` of them are let
   // go, or all. The same for outputs: what it produces stays inside.
-  void holdInput() { setInputBudget(0); }
-  void releaseInput(size_t count) { setInputBudget(count); }
-  void passInput() { setInputBudget({}); }
-  void holdOutput() { setOutputHeld(true); }
-  void passOutput() { setOutputHeld(false); }
+  void holdInput() { releaseInput(0); }
+  void releaseInput(std::optional<size_t> count) {
+    change([&] { _inputBudget = count; });
+  }
+  void passInput() { releaseInput({}); }
+  void holdOutput(bool held = true) {
+    change([&] { _outputHeld = held; });
+  }
+  void passOutput() { holdOutput(false); }
 
   // What comes out of an input. An empty result: nothing (a dropped frame). Called on the worker thread.
   // Null: the default.
@@ -110,8 +108,6 @@ class Script {
   [[nodiscard]] bool waitForInputs(size_t count) const {
     return _inputs.waitFor([](const Packet&) { return true; }, count);
   }
-  // Outputs and announcements that wait inside.
-  size_t waiting() const;
   // The definitions that the work was last told to go by: at start, and after each enable of a port.
   mediaserver::PortPair configured() const { return read(_configured); }
   size_t liveCodecs() const { return read(_codecs).size(); }
@@ -122,12 +118,6 @@ class Script {
   friend class ScriptedCodec;
   using Lock = std::unique_lock<std::mutex>;
 
-  void setInputBudget(std::optional<size_t> budget) {
-    change([&] { _inputBudget = budget; });
-  }
-  void setOutputHeld(bool held) {
-    change([&] { _outputHeld = held; });
-  }
   // With the lock held; afterwards the codecs look again at what there is to do.
   template <typename Action>
   void change(Action action) {
@@ -148,10 +138,8 @@ class Script {
   // with it held; functions of the test run without it.
   mutable std::mutex _mutex;
   mediaserver::PortPair _ports{};
-  bool _portsAreSeparate = false;
   std::array<std::vector<mediaserver::VideoFormat>, mediaserver::kPortCount> _formats;
   std::map<OMX_INDEXTYPE, std::vector<uint8_t>> _answers;
-  std::map<OMX_INDEXTYPE, std::vector<uint8_t>> _records;  // as last written
   OMX_ERRORTYPE _startFailure = OMX_ErrorNone;
   std::optional<size_t> _inputBudget;  // how many may pass; no number: all
   bool _outputHeld = false;

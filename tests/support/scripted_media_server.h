@@ -5,7 +5,6 @@
 // One at a time in a process. Threads: as its parts; the object itself belongs to the test.
 
 #include <chrono>
-#include <string>
 
 #include <omxhost/device.h>
 
@@ -16,10 +15,9 @@ namespace omxtest {
 
 class ScriptedMediaServer {
  public:
-  // Poses as `device`, a name from the host's table; null: as whatever the process poses as. Product code
-  // detects the device once a process, so tests for several devices run in processes of their own.
-  // `readingTime` is that of the server's nodes.
-  explicit ScriptedMediaServer(const char* device = nullptr,
+  // Poses as `device`, a name from the host's table. Product code detects the device once a process, so tests
+  // for several devices run in processes of their own. `readingTime` is that of the server's nodes.
+  explicit ScriptedMediaServer(const char* device,
                                std::chrono::milliseconds readingTime = std::chrono::milliseconds(500));
   ~ScriptedMediaServer();
   ScriptedMediaServer(const ScriptedMediaServer&) = delete;
@@ -29,21 +27,16 @@ class ScriptedMediaServer {
   Script& decoder() { return _decoder; }
   Script& encoder() { return _encoder; }
   RecordingOmx& omx() { return *_omx; }
-  MessageTap& messages() { return _omx->messages(); }
+  MessageTap& messages() { return _messages; }
 
-  // The service is no longer found, until `serve` puts it back.
+  // The service is no longer found, until it is served again: with its IOMX or, with null, none to give.
   void unregister();
-  void serve();
-  // The service is found, but has no IOMX to give.
-  void serveWithoutOmx();
-
-  // Says what has not been freed; empty when everything was.
-  std::string leaks() const;
+  void serve(const android::sp<android::IOMX>& omx);
 
  private:
-  const bool _loadedOnDemand;  // as it was before
   Script _decoder{Script::Kind::Decoder};
   Script _encoder{Script::Kind::Encoder};
+  MessageTap _messages;
   android::sp<RecordingOmx> _omx;
 };
 

@@ -54,7 +54,6 @@ struct CallRig {
     server.encoder().onInput([](const Packet& input) { return std::vector<Packet>{coded(input)}; });
     server.decoder().onInput([](const Packet& input) { return std::vector<Packet>{decoded(input)}; });
     // The decoder's pictures stay small, whatever size a session sets up.
-    server.decoder().separatePorts();
     server.decoder().editPort(mediaserver::kOutputPort, [](auto& port) {
       port.format.video.nFrameWidth = static_cast<OMX_U32>(kSize.width);
       port.format.video.nFrameHeight = static_cast<OMX_U32>(kSize.height);
