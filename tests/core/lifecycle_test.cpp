@@ -40,11 +40,6 @@ TEST_F(LifecycleTest, AsksForIomxOnce) {
   _server.unregister();
   EXPECT_EQ(_session->acquireOmxFromMediaPlayer(), OMXI_OK);  // nobody is asked again
   EXPECT_EQ(_session->queryForOmxComponent(nullptr), OMXI_ERR_NODE_NOT_FOUND);
-  EXPECT_EQ(log().back(), "E OMXINTERFACE: CODEC NOT FOUND: (null)");
-  int result = 0;
-  const faults::Fault failed(Failing::New, sizeof(SessionState));
-  EXPECT_EQ(OmxInterface::OmxComponentCanBeAcquired("OMX.qcom.video.encoder.avc", result), 0);
-  EXPECT_EQ(result, OMXI_ERR_IOMX);  // whatever keeps IOMX away
 }
 
 TEST_F(LifecycleTest, LeavesTheRestOfAFailedSetUpToDestruction) {
@@ -72,7 +67,7 @@ TEST_F(LifecycleTest, LeavesTheRestOfAFailedSetUpToDestruction) {
 TEST_F(LifecycleTest, WaitsForEachStateThatItAsksFor) {
   ASSERT_EQ(createEncoder(), OMXI_OK);
   messages().hold(anyEvent());
-  Later<int> starting = beginInit();
+  Later starting = beginInit();
   for (const OMX_U32 state : {OMX_StateIdle, OMX_StateExecuting}) {
     require(messages().waitForHeld(1), "the completion of a state");
     waitForSleeper(&SessionState::stateWaiters);
@@ -157,9 +152,9 @@ TEST_F(LifecycleTest, DestructionWaitsForEveryOperationInProgress) {
       _application.onOutput([&](const Output&) { return gate.pass(), 0; });
       _application.onInput([&] { gate.pass(); });
     }
-    Later<int> operation("the operation", [call = call, session = _session.get()] { return call(*session); });
+    Later operation("the operation", [call = call, session = _session.get()] { return call(*session); });
     gate.waitForArrival();
-    Later<bool> destroyed = beginDestroyOfBusySession();
+    Later destroyed = beginDestroyOfBusySession();
     gate.open();
     EXPECT_EQ(operation.result(), result) << name(method);
     destroyed.result();

@@ -1,6 +1,4 @@
 // Output buffers on their round, and the output thread.
-#include <binder/MemoryHeapBase.h>
-
 #include "tests/core/faults.h"
 #include "tests/core/session_fixture.h"
 
@@ -51,7 +49,7 @@ TEST_F(OutputTest, DeliversWhatTheComponentMakesInOrder) {
   // Lost in silence, the end of a stream would leave deInit() waiting for it. The node that fails is not one
   // of those that take buffers back.
   waitForBusy(1, kOutputs);
-  Later<int> ending = beginDeInit();
+  Later ending = beginDeInit();
   waitForSleeper(&SessionState::endOfOutputWaiters);
   const faults::Fault failed(faults::Failing::NothrowNew, sizeof(SimpleNode));
   componentProduces("the end", 0, OMX_BUFFERFLAG_EOS);
@@ -107,32 +105,6 @@ TEST_F(OutputTest, DeliversNothingThatComesAfterTheEnd) {
   EXPECT_EQ(fills(), kOutputs + 1);  // only the first goes back
   EXPECT_EQ(_application.outputTexts(), (Texts{"before", "the end"}));
   EXPECT_EQ(log(), LogLines{"W OMXINTERFACE - ===DataOutputThread over! enc thread!\n"});
-}
-
-TEST_F(OutputTest, StopsAfterThePassThatFindsAFailure) {
-  start();
-  _session->setMPmemInfo(new android::MemoryHeapBase(4096));
-  _session->setThreadError(OMXI_ERR_APPLICATION);
-  EXPECT_EQ(log(), LogLines{});  // the failure alone does not wake the thread
-  componentProduces("last");
-  waitForOutputThreadToEnd();
-  const Output output = _application.outputs().at(0);
-  EXPECT_EQ(output.data, nullptr);  // only the id, when the component has a heap of its own
-  EXPECT_EQ(output.bufferId, bufferId(1, 0));
-  EXPECT_EQ(fills(), kOutputs + 1);  // that pass was a whole one
-}
-
-TEST_F(OutputTest, ParksBuffersWhileNotExecuting) {
-  start();
-  deliverEvent(OMX_EventCmdComplete, OMX_CommandStateSet, OMX_StatePause);
-  feedThrough("a");
-  feedThrough("b");  // the pass of "a" is over
-  EXPECT_EQ(fills(), kOutputs);
-  deliverEvent(OMX_EventCmdComplete, OMX_CommandStateSet, OMX_StateExecuting);
-  feedThrough("c");
-  waitForFills(kOutputs + 1);
-  EXPECT_EQ(_session->fillOutputBuffers(), OMXI_OK);  // picks the parked ones up
-  waitForBusy(1, kOutputs);
 }
 
 TEST_F(OutputTest, ABufferGivenBackInsideItsCallbackGoesBackOnceAndHasBeenReadBefore) {

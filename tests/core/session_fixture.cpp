@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <map>
 
+#include <android/log.h>
 #include <utils/String8.h>
 
 namespace omxtest {
@@ -33,9 +34,6 @@ std::string detailsOf(const Call& call, const std::string& buffer) {
     if (record[1] != kVersion) text += " version " + std::to_string(record[1]);
     return text;
   }
-  if (method == Method::StoreMetaDataInBuffers) {
-    return " " + std::to_string(call.enable) + " port " + std::to_string(call.port);
-  }
   if (makesABuffer(call)) return " " + buffer + " of " + std::to_string(call.size);
   if (method == Method::FreeBuffer) return " " + std::to_string(call.port) + " " + buffer;
   if (method == Method::FillBuffer) return " " + buffer;
@@ -46,6 +44,17 @@ std::string detailsOf(const Call& call, const std::string& buffer) {
 }
 
 }  // namespace
+
+LogLines logLines(const omxhost::LogCapture& capture) {
+  LogLines lines;
+  for (const omxhost::LogLine& line : capture.lines()) {
+    std::string text = std::to_string(line.priority);
+    if (line.priority == ANDROID_LOG_ERROR) text = "E";
+    if (line.priority == ANDROID_LOG_WARN) text = "W";
+    lines.push_back(text + (line.tag.empty() ? " " : "/" + line.tag + " ") + line.text);
+  }
+  return lines;
+}
 
 webrtc::VideoCodec settings() {
   webrtc::VideoCodec codec = {};
@@ -131,16 +140,13 @@ void SessionTest::endOfStream(int timestamp) {
   requireEventually([this]() -> bool { return _session->_endOfOutputReached; }, "the end of output");
 }
 
-Later<bool> SessionTest::beginDestroy() {
-  return {"destruction", [session = _session.release()] {
-            delete session;
-            return true;
-          }};
+Later SessionTest::beginDestroy() {
+  return {"destruction", [session = _session.release()] { return delete session, 0; }};
 }
 
-Later<bool> SessionTest::beginDestroyOfBusySession() {
+Later SessionTest::beginDestroyOfBusySession() {
   SessionState& state = *_session->_state;
-  Later<bool> destroyed = beginDestroy();
+  Later destroyed = beginDestroy();
   requireUnderLock(
       state, [](SessionState& busy) { return busy.ending; }, "the destruction");
   EXPECT_FALSE(destroyed.isDone());

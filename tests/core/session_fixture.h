@@ -18,12 +18,16 @@
 #include "encoder/omx_interface_encoder.h"
 #include "tests/core/application.h"
 #include "tests/core/bounded.h"
-#include "tests/core/log_lines.h"
 #include "tests/support/scripted_media_server.h"
 
 namespace omxtest {
 
 using Trace = std::vector<std::string>;
+using LogLines = std::vector<std::string>;
+
+// A log capture as text: one entry a line, the priority's letter in front ("E text", "W text"); a tag shows
+// as "4/tag text". Exact, blanks and line ends included.
+LogLines logLines(const omxhost::LogCapture& capture);
 
 // --- Records that a session sends to its component ---
 
@@ -80,25 +84,25 @@ class SessionTest : public ::testing::Test {
   void start();
   OmxInterfaceEncoder& encoder() { return static_cast<OmxInterfaceEncoder&>(*_session); }
   OmxInterfaceDecoder& decoder() { return static_cast<OmxInterfaceDecoder&>(*_session); }
-  Later<int> beginInit() {
+  Later beginInit() {
     return {"init()", [session = _session.get()] { return session->init(); }};
   }
   int init() { return beginInit().result(); }
-  Later<int> beginDeInit() {
+  Later beginDeInit() {
     return {"deInit()", [session = _session.get()] { return session->deInit(); }};
   }
   int deInit() { return beginDeInit().result(); }
-  Later<int> beginEndOfInput(int timestamp = 0) {
+  Later beginEndOfInput(int timestamp = 0) {
     return {"sendEndOfInputFlag()",
             [session = _session.get(), timestamp] { return session->sendEndOfInputFlag(timestamp); }};
   }
   // Sends the end mark and waits until it has come out and been delivered.
   void endOfStream(int timestamp = 0);
   // Destroys the session, from another thread. The pointer stays readable for calls in progress.
-  Later<bool> beginDestroy();
+  Later beginDestroy();
   // The same for a session that cannot be gone before the test lets something in progress end: comes back
   // once destruction has begun.
-  Later<bool> beginDestroyOfBusySession();
+  Later beginDestroyOfBusySession();
   void destroy() { beginDestroy().result(); }
   Gate& newGate() { return _gates.emplace_back(); }  // lives as long as the session
 

@@ -62,7 +62,7 @@ class Lane {
     create();
     application.attach(*_session);
     OmxInterface* const session = _session;
-    Later<int> starting("init()", [=] { return session->init(); });
+    Later starting("init()", [=] { return session->init(); });
     awaitBegun(starting, [](const SessionState& state) {
       return state.outputThread.joinable || state.eventThread.joinable;
     });
@@ -72,13 +72,13 @@ class Lane {
     }
     // What destruction finds in progress.
     const unsigned way = draw(3);
-    Later<int> ending("a call at the end", [=] {
+    Later ending("a call at the end", [=] {
       return way == 0 ? session->deInit() : way == 1 ? session->sendEndOfInputFlag(0) : 0;
     });
     awaitBegun(ending, [=](const SessionState& state) {
       return state.endOfOutputWaiters > 0 || state.tearingDown || session->_endOfInputPending;
     });
-    Later<int>("destruction", [=] { return delete session, 0; }).result();
+    Later("destruction", [=] { return delete session, 0; }).result();
     starting.result();
     ending.result();
     _outputs += application.outputs().size();
@@ -97,7 +97,7 @@ class Lane {
 
   // Until the call is under way: one that begins after the session's end is the application's fault.
   template <typename Begun>
-  void awaitBegun(const Later<int>& call, Begun begun) {
+  void awaitBegun(const Later& call, Begun begun) {
     const auto come = [&] {
       if (call.isDone()) return true;
       const SessionState::Lock held(_session->_state->lock);

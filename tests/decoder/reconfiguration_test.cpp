@@ -198,7 +198,7 @@ TEST_F(SettingsEndTest, AndDeInitAreBothWokenByTheBuffersAlsoOfAFailedComponent)
     } else {
       _session->setThreadError(OMXI_ERR_EVENT_ERROR);
     }
-    Later<int> ending = beginDeInit();
+    Later ending = beginDeInit();
     waitForSleeper(&SessionState::outputReturnWaiters, failed ? 1 : 2);
     EXPECT_EQ(freed(), 0u);  // it may still be writing into them
     messages().passAll();
@@ -221,7 +221,7 @@ TEST_F(SettingsEndTest, FinishAStepOfCallsBeforeDeInitGoesOn) {
     omx().before(method, [&](const Call&) { gate.pass(); });
     script().announce(352, 288);
     gate.waitForArrival();
-    Later<int> ending = beginDeInit();
+    Later ending = beginDeInit();
     requireUnderLock([](SessionState& state) { return state.tearingDown; }, "deInit()'s first step");
     EXPECT_EQ(commands().size(), enabled ? 2u : 1u);
     gate.open();
@@ -247,7 +247,7 @@ TEST_F(SettingsEndTest, BeginNoFurtherStepOnceDeInitHasBegun) {
     require(messages().waitForHeld(1), "the completion");
     omx().clearCalls();
     messages().hold(commandComplete(OMX_CommandStateSet));
-    Later<int> ending = beginDeInit();
+    Later ending = beginDeInit();
     require(messages().waitForHeld(2), "the component's way to Idle");
     deliverEvent(OMX_EventPortSettingsChanged, 1, 0);  // nor a new reconfiguration
     waitForEvents();
@@ -268,9 +268,9 @@ TEST_F(SettingsEndTest, ASettingAndTheWrappersEndExcludeEachOther) {
   endOfOutput();
   Gate& gate = newGate();
   omx().before(Method::SetParameter, [&](const Call&) { gate.pass(); });
-  Later<int> setting("setPictureOrder()", [this] { return decoder().setPictureOrder(0); });
+  Later setting("setPictureOrder()", [this] { return decoder().setPictureOrder(0); });
   gate.waitForArrival();
-  Later<int> ending = beginDeInit();
+  Later ending = beginDeInit();
   requireUnderLock([this](SessionState&) { return _session->_platformWrapper == nullptr; },
                    "the wrapper's removal");
   EXPECT_FALSE(ending.isDone());

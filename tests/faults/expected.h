@@ -2,7 +2,7 @@
 // what failed and in which step, so one rule answers for many faults.
 #pragma once
 
-#include "tests/core/log_lines.h"
+#include "tests/core/session_fixture.h"
 #include "tests/faults/life.h"
 
 namespace omxtest {

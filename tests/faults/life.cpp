@@ -93,7 +93,7 @@ class Life {
   // One call; false when the session is gone.
   bool take(Step step, const std::function<int()>& action) {
     enter(step);
-    Later<int> call(name(step), action);
+    Later call(name(step), action);
     if (!ends([&] { return call.isDone(); })) help(step, call);
     int& result = _outcome.results[step];
     if (const int own = call.result(); result == 0) result = own;
@@ -101,12 +101,12 @@ class Life {
     return _session != nullptr;
   }
   // What the call waits for does not come. It gets what was kept from it; or the session is destroyed.
-  void help(Step step, const Later<int>& call) {
+  void help(Step step, const Later& call) {
     const bool again = std::exchange(_outcome.stuck, step).has_value();
     if (release(Kind::Withheld) && ends([&] { return call.isDone(); })) return;
     _outcome.hung = again || _fault.kind == Kind::Withheld || _session == nullptr;
     enter(Step::Destroy);
-    Later<int> destruction("destruction", [session = std::exchange(_session, nullptr)] {
+    Later destruction("destruction", [session = std::exchange(_session, nullptr)] {
       return omx_interface_destroy(session);
     });
     require(ends([&] { return destruction.isDone() && call.isDone(); }), "the end of a destroyed session");

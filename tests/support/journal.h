@@ -35,10 +35,11 @@ class Journal {
     const std::lock_guard<std::mutex> lock(_mutex);
     return matching(match);
   }
-  // Until so many match, with a limit.
-  [[nodiscard]] bool waitFor(const Match& match, size_t count = 1) const {
+  // Until so many match.
+  [[nodiscard]] bool waitFor(const Match& match, size_t count = 1,
+                             std::chrono::milliseconds limit = kWaitLimit) const {
     std::unique_lock<std::mutex> lock(_mutex);
-    return _changed.wait_for(lock, kWaitLimit, [&] { return matching(match) >= count; });
+    return _changed.wait_for(lock, limit, [&] { return matching(match) >= count; });
   }
 
  private:

@@ -1,8 +1,7 @@
 #pragma once
 // A media server's IOMX that writes down the calls that sessions make, fails those that a test asks for, and
 // runs a test's code before and after calls. Messages pass a tap, which has to outlive it.
-// Any thread may call it, several at once; hooks run on the calling thread and without a lock, so they may
-// call it again and block.
+// Any thread may call it; hooks run on the calling thread and without a lock, so they may call it and block.
 
 #include <algorithm>
 #include <functional>

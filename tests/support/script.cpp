@@ -3,25 +3,16 @@
 #include <algorithm>
 #include <cstring>
 #include <deque>
-#include <variant>
 
 namespace omxtest {
 
-using mediaserver::InputView;
-using mediaserver::kInputPort;
-using mediaserver::kOutputPort;
-using mediaserver::OutputSpace;
-using mediaserver::PortDefinition;
-using mediaserver::PortPair;
-using mediaserver::Received;
-using mediaserver::Sent;
+using namespace mediaserver;
 
 namespace {
 
 constexpr OMX_U32 kWidth = 176;
 constexpr OMX_U32 kHeight = 144;
 constexpr OMX_U32 kCompressedBytes = 65536;
-constexpr auto kTiPackedSemiPlanar = static_cast<OMX_COLOR_FORMATTYPE>(0x7F000100);
 
 OMX_U32 pictureBytes(OMX_U32 width, OMX_U32 height) {
   return width * height * 3 / 2;
@@ -74,9 +65,9 @@ void fitPicture(PortDefinition* port) {
 }  // namespace
 
 // The codec of a script, which has the lock for both.
-class ScriptedCodec final : public mediaserver::Codec {
+class ScriptedCodec final : public Codec {
  public:
-  ScriptedCodec(Script& script, mediaserver::CodecHost& host) : _script(script), _host(host) {
+  ScriptedCodec(Script& script, CodecHost& host) : _script(script), _host(host) {
     const Lock lock(_script._mutex);
     _script._codecs.insert(this);
   }
@@ -86,11 +77,11 @@ class ScriptedCodec final : public mediaserver::Codec {
   }
 
   PortPair ports() const override { return _script.read(_script._ports); }
-  std::vector<mediaserver::VideoFormat> formats(OMX_U32 port) const override {
+  std::vector<VideoFormat> formats(OMX_U32 port) const override {
     return _script.read(_script._formats).at(port);
   }
   // What storeMetaDataInBuffers needs.
-  std::vector<mediaserver::Extension> extensions() const override {
+  std::vector<Extension> extensions() const override {
     return {{"OMX.google.android.index.storeMetaDataInBuffers", kMetaData}};
   }
   OMX_ERRORTYPE definePort(OMX_U32 port, const PortDefinition& wanted, PortPair& ports) override {
@@ -145,7 +136,7 @@ class ScriptedCodec final : public mediaserver::Codec {
     if (port == kInputPort) {
       _draining = false;
     } else {
-      std::erase_if(_line, [](const Item& item) { return std::holds_alternative<Packet>(item); });
+      std::erase_if(_line, [](const Item& item) { return !item.edit; });
     }
   }
   Sent send(const InputView& input) override {
@@ -161,7 +152,7 @@ class ScriptedCodec final : public mediaserver::Codec {
     lock.unlock();
     const std::vector<Packet> outputs = transform ? transform(packet) : std::vector<Packet>{packet};
     lock.lock();
-    _line.insert(_line.end(), outputs.begin(), outputs.end());
+    for (const Packet& output : outputs) _line.push_back({output});
     _script._inputs.add(packet);
     return Sent::Taken;
   }
@@ -173,8 +164,8 @@ class ScriptedCodec final : public mediaserver::Codec {
     const Lock lock(_script._mutex);
     if (_script._outputHeld) return Received::Nothing;
     if (_line.empty()) return std::exchange(_draining, false) ? Received::Drained : Received::Nothing;
-    if (std::holds_alternative<Announcement>(_line.front())) return Received::NewGeometry;
-    const Packet packet = std::get<Packet>(std::move(_line.front()));
+    if (_line.front().edit) return Received::NewGeometry;
+    const Packet packet = std::move(_line.front().packet);
     _line.pop_front();
     const size_t offset = std::min<size_t>(packet.offset, output.capacity);
     const size_t length = std::min(packet.bytes.size(), output.capacity - offset);
@@ -188,7 +179,7 @@ class ScriptedCodec final : public mediaserver::Codec {
   }
   OMX_U32 geometry(PortDefinition& output) override {
     Lock lock(_script._mutex);
-    const Announcement announcement = std::get<Announcement>(std::move(_line.front()));
+    const Item announcement = std::move(_line.front());
     _line.pop_front();
     lock.unlock();
     announcement.edit(output);
@@ -198,15 +189,14 @@ class ScriptedCodec final : public mediaserver::Codec {
  private:
   friend class Script;
   using Lock = Script::Lock;
-  // New output settings, as they are to be told.
-  struct Announcement {
-    Script::PortEdit edit;
-    OMX_U32 index;
+  struct Item {
+    Packet packet;
+    Script::PortEdit edit = nullptr;  // not null: new output settings instead, as they are to be told
+    OMX_U32 index = 0;
   };
-  using Item = std::variant<Packet, Announcement>;
 
   Script& _script;
-  mediaserver::CodecHost& _host;
+  CodecHost& _host;
   std::deque<Item> _line;  // outputs and announcements, in order
   bool _draining = false;
 };
@@ -218,26 +208,26 @@ Script::Script(Kind kind) : _kind(kind) {
        {OMX_VIDEO_CodingAVC, OMX_VIDEO_CodingMPEG4, OMX_VIDEO_CodingH263, OMX_VIDEO_CodingWMV}) {
     _formats[decoder ? kInputPort : kOutputPort].push_back({coding, OMX_COLOR_FormatUnused});
   }
-  _formats[decoder ? kOutputPort : kInputPort] = {{OMX_VIDEO_CodingUnused, OMX_COLOR_FormatYUV420SemiPlanar},
-                                                  {OMX_VIDEO_CodingUnused, kTiPackedSemiPlanar}};
+  constexpr auto kTiPackedSemiPlanar = static_cast<OMX_COLOR_FORMATTYPE>(0x7F000100);
+  for (const auto color : {OMX_COLOR_FormatYUV420SemiPlanar, kTiPackedSemiPlanar}) {
+    _formats[decoder ? kOutputPort : kInputPort].push_back({OMX_VIDEO_CodingUnused, color});
+  }
 }
 
-mediaserver::Component Script::component(const std::string& name) {
+Component Script::component(const std::string& name) {
   const char* const role = _kind == Kind::Decoder ? "video_decoder.avc" : "video_encoder.avc";
-  return {name, {role}, [this](mediaserver::CodecHost& host) {
-            return std::make_unique<ScriptedCodec>(*this, host);
-          }};
+  return {name, {role}, [this](CodecHost& host) { return std::make_unique<ScriptedCodec>(*this, host); }};
 }
 
 void Script::produce(const Packet& output) {
   change([&] {
-    for (ScriptedCodec* codec : _codecs) codec->_line.emplace_back(output);
+    for (ScriptedCodec* codec : _codecs) codec->_line.push_back({output});
   });
 }
 
 void Script::announce(const PortEdit& edit, OMX_U32 index) {
   change([&] {
-    for (ScriptedCodec* codec : _codecs) codec->_line.emplace_back(ScriptedCodec::Announcement{edit, index});
+    for (ScriptedCodec* codec : _codecs) codec->_line.push_back({{}, edit, index});
   });
 }
 

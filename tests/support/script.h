@@ -1,13 +1,11 @@
 #pragma once
 // What a test tells a scripted component, and what it can ask it. The component runs behind the media
-// server's real node, so states, ports, buffers and events follow OpenMAX rules; the script decides the
-// rest. Unscripted, it takes each input and produces one output with the same bytes, time stamp and flags;
-// its output keeps its size when a client gives the input another one.
-//
-// One Script belongs to one entry of the server's component list and outlives the server. What concerns
-// definitions and start is read when a node is allocated; everything else works at once, on all nodes of
-// that component (allocate one, or give each its own component). All functions may be called from any
-// thread, also from hooks and callbacks, except from inside the functions that a test hands in here.
+// server's real node, so OpenMAX rules hold; the script decides the rest. Unscripted, it takes each input and
+// produces one output with the same bytes, time stamp and flags, and its ports keep their sizes apart. One
+// Script belongs to one entry of the server's component list and outlives the server. What concerns
+// definitions and start is read when a node is allocated; all else works at once, on all nodes of that
+// component. Any thread may call it, also hooks and callbacks, but not the functions that a test hands in
+// here.
 
 #include <array>
 #include <cstddef>
@@ -37,8 +35,6 @@ class Script {
 
   enum class Kind { Decoder, Encoder };
   explicit Script(Kind kind);
-  Script(const Script&) = delete;
-  Script& operator=(const Script&) = delete;
 
   // An entry for OmxServer's list.
   mediaserver::Component component(const std::string& name);

@@ -10,14 +10,6 @@
 
 namespace omxtest {
 
-namespace {
-
-android::String16 serviceName() {
-  return android::String16(mediaserver::kServiceName);
-}
-
-}  // namespace
-
 ScriptedMediaServer::ScriptedMediaServer(const char* device, std::chrono::milliseconds readingTime) {
   omxhost::setLoadOnDemand(false);
   if (!omxhost::setDevice(device)) ADD_FAILURE() << "no device " << device;
@@ -35,12 +27,13 @@ ScriptedMediaServer::~ScriptedMediaServer() {
 }
 
 void ScriptedMediaServer::unregister() {
-  omxhost::removeService(serviceName());
+  omxhost::removeService(android::String16(mediaserver::kServiceName));
 }
 
 void ScriptedMediaServer::serve(const android::sp<android::IOMX>& omx) {
   const android::sp<mediaserver::MediaPlayerService> service = new mediaserver::MediaPlayerService(omx);
-  EXPECT_EQ(android::defaultServiceManager()->addService(serviceName(), service->asBinder()), android::OK);
+  const android::String16 name(mediaserver::kServiceName);
+  EXPECT_EQ(android::defaultServiceManager()->addService(name, service->asBinder()), android::OK);
 }
 
 }  // namespace omxtest

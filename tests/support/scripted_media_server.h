@@ -20,8 +20,6 @@ class ScriptedMediaServer {
   explicit ScriptedMediaServer(const char* device,
                                std::chrono::milliseconds readingTime = std::chrono::milliseconds(500));
   ~ScriptedMediaServer();
-  ScriptedMediaServer(const ScriptedMediaServer&) = delete;
-  ScriptedMediaServer& operator=(const ScriptedMediaServer&) = delete;
 
   // Components carry the posed device's names. On a device without components the list is empty.
   Script& decoder() { return _decoder; }
