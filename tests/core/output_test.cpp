@@ -107,6 +107,19 @@ TEST_F(OutputTest, DeliversNothingThatComesAfterTheEnd) {
   EXPECT_EQ(log(), LogLines{"W OMXINTERFACE - ===DataOutputThread over! enc thread!\n"});
 }
 
+TEST_F(OutputTest, ParksBuffersWhileNotExecuting) {
+  start();
+  deliverEvent(OMX_EventCmdComplete, OMX_CommandStateSet, OMX_StatePause);
+  feedThrough("a");
+  feedThrough("b");  // the pass of "a" is over
+  EXPECT_EQ(fills(), kOutputs);
+  deliverEvent(OMX_EventCmdComplete, OMX_CommandStateSet, OMX_StateExecuting);
+  feedThrough("c");
+  waitForFills(kOutputs + 1);
+  EXPECT_EQ(_session->fillOutputBuffers(), OMXI_OK);  // picks the parked ones up
+  waitForBusy(1, kOutputs);
+}
+
 TEST_F(OutputTest, ABufferGivenBackInsideItsCallbackGoesBackOnceAndHasBeenReadBefore) {
   // A second fillBuffer would send the component a buffer that it has; and with the buffer the record's end
   // mark is cleared: looked at afterwards it would be gone, and the stream would never end.

@@ -28,11 +28,9 @@ class PortsTest : public SessionTest {
 
 TEST_F(PortsTest, PrintsAPortForDiagnosisAndKeepsItsFrameRate) {
   ASSERT_EQ(createEncoder(), OMXI_OK);
-  EXPECT_EQ(_session->setupPortParameters(0, 320, 240, 30), OMXI_OK);
   EXPECT_EQ(_session->setupPortParameters(0, 322, 242, -1), OMXI_OK);
   EXPECT_EQ(omx().calls().back().as<PortDefinition>()->format.video.xFramerate, 30u << 16);
   EXPECT_EQ(_session->debugPortParameters(0), OMXI_OK);
-  EXPECT_EQ(log().size(), 13u);
   EXPECT_EQ(log()[5], "E     nBufferSize member is 116886\n");
 }
 

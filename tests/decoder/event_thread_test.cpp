@@ -51,6 +51,7 @@ TEST_F(EventThreadTest, PortCompletionsInAWrongStateAreFailures) {
     messages().hold(commandComplete(OMX_CommandStateSet, OMX_StateExecuting));
     Later starting = beginInit();
     require(messages().waitForHeld(1), "the completion of Executing");
+    waitForSleeper(&SessionState::stateWaiters);
     _log.clear();
     handleEvent(OMX_EventPortSettingsChanged, 1, 0);  // ignored before it executes
     EXPECT_EQ(commands().back(), "sendCommand state 3");

@@ -249,8 +249,6 @@ TEST_F(SettingsEndTest, BeginNoFurtherStepOnceDeInitHasBegun) {
     messages().hold(commandComplete(OMX_CommandStateSet));
     Later ending = beginDeInit();
     require(messages().waitForHeld(2), "the component's way to Idle");
-    deliverEvent(OMX_EventPortSettingsChanged, 1, 0);  // nor a new reconfiguration
-    waitForEvents();
     EXPECT_TRUE(messages().release(1));
     require(messages().waitForHeld(2), "the component's way to Loaded");
     EXPECT_TRUE(messages().release(0));
@@ -260,6 +258,16 @@ TEST_F(SettingsEndTest, BeginNoFurtherStepOnceDeInitHasBegun) {
     EXPECT_EQ(commands(), (Trace{"sendCommand state 2", "sendCommand state 1"}));
     destroy();
   }
+  // Nor does a new reconfiguration begin.
+  startDecoder();
+  endOfOutput();
+  messages().hold(commandComplete(OMX_CommandStateSet, OMX_StateIdle));
+  Later ending = beginDeInit();
+  require(messages().waitForHeld(1), "the component's way to Idle");
+  handleEvent(OMX_EventPortSettingsChanged, 1, 0);
+  EXPECT_EQ(commands().back(), "sendCommand state 2");
+  messages().passAll();
+  EXPECT_EQ(ending.result(), OMXI_OK);
 }
 
 TEST_F(SettingsEndTest, ASettingAndTheWrappersEndExcludeEachOther) {

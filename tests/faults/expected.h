@@ -20,7 +20,7 @@ inline void PrintTo(const Subject& subject, std::ostream* stream) {
   *stream << subject.device << (subject.encoding ? " encoder" : " decoder");
 }
 
-// How a life differs from what it had to be; empty if it does not.
-std::string differences(const Subject& subject, const Fault& fault, const Outcome& outcome, LogLines log);
+// That a life was what it had to be.
+void expectAnswered(const Subject& subject, const Fault& fault, const Outcome& outcome, LogLines log);
 
 }  // namespace omxtest

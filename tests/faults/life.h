@@ -51,6 +51,9 @@ struct Outcome {
 };
 
 const char* name(Step step);
+inline void PrintTo(Step step, std::ostream* stream) {
+  *stream << name(step);
+}
 // A fault and where it happened, in words.
 std::string describe(const Fault& fault, const std::optional<Hit>& hit);
 

@@ -6,7 +6,6 @@
 #include <optional>
 #include <string>
 #include <string_view>
-#include <type_traits>
 #include <vector>
 
 #include <media/IOMX.h>
@@ -67,7 +66,6 @@ struct Call {
   // The record as a T; nothing if it is shorter.
   template <typename T>
   std::optional<T> as() const {
-    static_assert(std::is_trivially_copyable_v<T>);
     if (record.size() < sizeof(T)) return std::nullopt;
     T value;
     std::memcpy(&value, record.data(), sizeof(T));

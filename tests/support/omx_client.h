@@ -16,6 +16,7 @@
 #include <binder/MemoryDealer.h>
 #include <media/IOMX.h>
 #include <media/stagefright/MediaErrors.h>
+#include <utils/String8.h>
 
 #include "host/mediaserver/codec.h"
 #include "tests/support/call.h"
@@ -37,7 +38,19 @@ class CollectingObserver : public android::BnOMXObserver {
 
 // A message in a few words: "complete state 2", "complete disable 1", "error 0x80001012", "settings 1 0",
 // "flag 1 0x1", "emptied", "filled".
-std::string describe(const android::omx_message& message);
+inline std::string describe(const android::omx_message& message) {
+  static constexpr const char* kCommands[] = {"state", "flush", "disable", "enable", "mark"};
+  if (message.type == android::omx_message::EMPTY_BUFFER_DONE) return "emptied";
+  if (message.type == android::omx_message::FILL_BUFFER_DONE) return "filled";
+  const auto& [event, data1, data2] = message.u.event_data;
+  if (event == OMX_EventCmdComplete && data1 < std::size(kCommands))
+    return android::String8::format("complete %s %u", kCommands[data1], data2).string();
+  if (event == OMX_EventError) return android::String8::format("error 0x%x", data1).string();
+  if (event == OMX_EventPortSettingsChanged)
+    return android::String8::format("settings %u 0x%x", data1, data2).string();
+  if (event == OMX_EventBufferFlag) return android::String8::format("flag %u 0x%x", data1, data2).string();
+  return android::String8::format("event %u %u %u", static_cast<unsigned>(event), data1, data2).string();
+}
 
 enum class Giving { Use, Backup, Allocate };
 
@@ -115,7 +128,27 @@ class OmxClient {
   // How buffers of a port are given; default Use.
   void setGiving(OMX_U32 port, Giving giving) { _giving[port] = giving; }
   // Gives one buffer of the port's size, or of `size` bytes.
-  android::status_t give(OMX_U32 port, size_t size = 0);
+  android::status_t give(OMX_U32 port, size_t size = 0) {
+    Buffer buffer;
+    buffer.size = size != 0 ? size : definition(port).nBufferSize;
+    void* data = nullptr;
+    android::status_t status = kOk;
+    if (_giving[port] == Giving::Allocate) {
+      status = _omx->allocateBuffer(_node, port, buffer.size, &buffer.id, &data);
+    } else {
+      // The block keeps its dealer alive.
+      buffer.block = (new android::MemoryDealer(buffer.size, "OmxClient"))->allocate(buffer.size);
+      data = buffer.block->pointer();
+      status = _giving[port] == Giving::Use
+                   ? _omx->useBuffer(_node, port, buffer.block, &buffer.id)
+                   : _omx->allocateBufferWithBackup(_node, port, buffer.block, &buffer.id);
+    }
+    if (status != kOk) return status;
+    buffer.data = static_cast<uint8_t*>(data);
+    _buffers[port].push_back(buffer);
+    _given[buffer.id] = buffer;
+    return kOk;
+  }
   // Gives what the definition asks for.
   void populate(OMX_U32 port) {
     for (OMX_U32 left = definition(port).nBufferCountActual; left > 0; --left) EXPECT_EQ(give(port), kOk);
@@ -166,7 +199,13 @@ class OmxClient {
     expectComplete(kind, param);
   }
   // The outputs so far, as the client reads them.
-  std::vector<Packet> outputs() const;
+  std::vector<Packet> outputs() const {
+    std::vector<Packet> packets;
+    for (const android::omx_message& message : _observer->messages.all()) {
+      if (message.type == android::omx_message::FILL_BUFFER_DONE) packets.push_back(output(message));
+    }
+    return packets;
+  }
   // All messages in a few words.
   std::vector<std::string> heard() const {
     std::vector<std::string> words;
@@ -176,7 +215,16 @@ class OmxClient {
 
  protected:
   // A filled buffer.
-  Packet output(const android::omx_message& filled) const;
+  Packet output(const android::omx_message& filled) const {
+    const auto& data = filled.u.extended_buffer_data;
+    const uint8_t* const begin = _given.at(data.buffer).data + data.range_offset;
+    Packet packet;
+    packet.bytes.assign(begin, begin + data.range_length);
+    packet.timestamp = data.timestamp;
+    packet.flags = data.flags;
+    packet.offset = data.range_offset;
+    return packet;
+  }
 
  private:
   const android::sp<android::IOMX> _omx;
