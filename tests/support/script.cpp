@@ -98,8 +98,8 @@ class ScriptedCodec final : public Codec {
                                                               portOf(found->second.data()) == portOf(bytes));
     if (!answered && isStandard(index)) return {};
     if (answered) {
-      std::copy(found->second.begin() + kHeaderBytes,
-                found->second.begin() + std::min(size, found->second.size()), bytes + kHeaderBytes);
+      const size_t given = std::min(size, found->second.size());
+      std::memcpy(bytes + kHeaderBytes, found->second.data() + kHeaderBytes, given - kHeaderBytes);
     } else {
       std::fill(bytes + kRecordBytes, bytes + size, uint8_t{0});  // behind the port, which is the client's
     }
