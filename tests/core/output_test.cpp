@@ -9,14 +9,6 @@ using Texts = std::vector<std::string>;
 
 class OutputTest : public SessionTest {
  protected:
-  Gate& stopInCallback() {
-    Gate& gate = newGate();
-    _application.onOutput([&](const Output&) {
-      gate.pass();
-      return 0;
-    });
-    return gate;
-  }
   size_t fills() { return omx().count(Method::FillBuffer); }
 };
 
@@ -89,13 +81,17 @@ TEST_F(OutputTest, DeliversNothingThatComesAfterTheEnd) {
   // A component on its way to Idle gives its empty buffers back; whether the application saw them would
   // depend on how long its callback takes.
   start();
-  Gate& gate = stopInCallback();
+  Gate& gate = newGate();
+  Gate& last = newGate();
+  _application.onOutput([&](const Output& output) {
+    (output.bytes == "before" ? gate : last).pass();
+    return 0;
+  });
   componentProduces("before");
   gate.waitForArrival();
   componentProduces("the end", 0, OMX_BUFFERFLAG_EOS);
   require(messages().waitForDelivered(fillBufferDone(), 2), "the end");
   _session->returnIomxOutputBuffer(bufferId(1, 1));  // an application out of step; the picture stays
-  Gate& last = stopInCallback();
   gate.open();
   last.waitForArrival();
   componentProduces("after");

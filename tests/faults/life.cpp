@@ -33,7 +33,7 @@ class Life {
   ~Life() { hangReport() = nullptr; }
 
   Outcome live() {
-    if (create() && run()) {
+    if (take(Step::Create, [this] { return create(); }) && run()) {
       take(Step::Destroy,
            [session = std::exchange(_session, nullptr)] { return omx_interface_destroy(session); });
     }
@@ -112,13 +112,11 @@ class Life {
     require(ends([&] { return destruction.isDone() && call.isDone(); }), "the end of a destroyed session");
     _outcome.results[Step::Destroy] = destruction.result();
   }
-  bool create() {
-    return take(Step::Create, [this] {
-      int result = -1;
-      OmxVideoCodec codec = settings();
-      _session = _encoding ? encoder_create(&result, &codec) : decoder_create(&result, nullptr);
-      return result;
-    });
+  int create() {
+    int result = -1;
+    OmxVideoCodec codec = settings();
+    _session = _encoding ? encoder_create(&result, &codec) : decoder_create(&result, nullptr);
+    return result;
   }
   int configure() {
     omx_interface_register_input_callback(
