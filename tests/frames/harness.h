@@ -8,6 +8,7 @@
 
 #include <cstdint>
 #include <functional>
+#include <optional>
 #include <random>
 #include <string>
 
@@ -53,9 +54,8 @@ inline void onEveryTarget(const std::function<void()>& body) {
 }
 
 // A function from src to dst. expected: dst after the call; before it dst holds what dst is here.
-using Conversion = std::function<int(const std::uint8_t* src, std::uint8_t* dst)>;
-inline void expectConversion(const Conversion& call, const Bytes& src, const Bytes& dst,
-                             const Bytes& expected, int result) {
+inline void expectConversion(const std::function<int(const std::uint8_t* src, std::uint8_t* dst)>& call,
+                             const Bytes& src, const Bytes& dst, const Bytes& expected, int result) {
   onEveryTarget([&] {
     Bytes to = dst;
     EXPECT_EQ(call(src.data(), to.data()), result);
@@ -65,26 +65,21 @@ inline void expectConversion(const Conversion& call, const Bytes& src, const Byt
 }
 
 // A function that works on buffer in place.
-using InPlace = std::function<int(std::uint8_t* buffer)>;
-inline void expectInPlace(const InPlace& call, const Bytes& buffer, const Bytes& expected, int result) {
-  expectConversion([&](const std::uint8_t*, std::uint8_t* memory) { return call(memory); }, {}, buffer,
-                   expected, result);
+inline void expectInPlace(const std::function<int(std::uint8_t* buffer)>& call, const Bytes& buffer,
+                          const Bytes& expected, int result) {
+  expectConversion([&](auto*, auto* memory) { return call(memory); }, {}, buffer, expected, result);
 }
 
 // Every width from 1 past two of the longest vectors of any kernel, each with a few heights, and some odd
 // sizes.
 inline void forEachSize(const std::function<void(Size)>& body) {
   constexpr unsigned kWidest = 2 * 128 + 5;  // pairs of pixels in vectors of 64 bytes
+  std::vector<Size> sizes{{1, 67}, {2, 130}, {17, 131}, {66, 129}, {130, 66}, {176, 144}};
   for (unsigned width = 1; width <= kWidest; ++width) {
-    for (const unsigned height : {width % 7 + 1, width % 3 + 8}) {
-      body({width, height});
-      if (testing::Test::HasFailure()) return;
-    }
+    for (const unsigned height : {width % 7 + 1, width % 3 + 8}) sizes.push_back({width, height});
   }
-  for (const Size s :
-       {Size{1, 67}, Size{2, 130}, Size{17, 131}, Size{66, 129}, Size{130, 66}, Size{176, 144}}) {
-    body(s);
-    if (testing::Test::HasFailure()) return;
+  for (const Size s : sizes) {
+    if (!testing::Test::HasFailure()) body(s);
   }
 }
 

@@ -3,6 +3,7 @@
 #pragma once
 
 #include <cstdint>
+#include <functional>
 #include <vector>
 
 namespace reference {
@@ -25,17 +26,57 @@ class Bytes {
 struct Size {
   unsigned width, height;
   std::size_t area() const { return std::size_t{width} * height; }
+  std::size_t i420() const { return area() * 3 / 2; }
+  Size half() const { return {width / 2, height / 2}; }
+  Size even() const { return {width / 2 * 2, height / 2 * 2}; }
+  bool operator==(const Size&) const = default;
 };
 
-inline std::size_t i420Bytes(Size s) {
-  return s.area() * 3 / 2;
+// States what a function makes of `dst`, and returns what it does. The source is tightly packed; destination
+// rows may be a stride of pixels apart.
+using Conversion =
+    std::function<std::size_t(const Bytes& src, Bytes& dst, Size from, Size to, unsigned stride)>;
+
+enum class Chroma { kUThenV, kVThenU, kUvPairs, kVuPairs };
+
+// Where the third plane begins: three ways of counting the second.
+inline std::size_t vByArea(Size s) {
+  return s.area() + s.area() / 4;
+}
+inline std::size_t vByRows(Size s) {
+  return std::size_t{s.width} * (s.height + s.height / 4);
+}
+inline std::size_t vBySamples(Size s) {
+  return s.area() + s.half().area();
+}
+
+// Calls sample(x, y) row by row.
+template <typename Sample>
+void forEach(Size s, Sample sample) {
+  for (std::size_t y = 0; y < s.height; ++y) {
+    for (std::size_t x = 0; x < s.width; ++x) sample(x, y);
+  }
+}
+
+inline void fill(Bytes& dst, std::size_t from, std::size_t n, std::uint8_t value) {
+  for (std::size_t i = 0; i < n; ++i) dst[from + i] = value;
+}
+
+// A plane of `frame` samples at `to`, all `fill` but for the picture, whose rows lie `pitch` bytes apart.
+inline void place(const Bytes& src, std::size_t from, std::size_t pitch, Size picture, Bytes& dst,
+                  std::size_t to, Size frame, std::size_t left, std::size_t top, std::uint8_t fill) {
+  forEach(frame, [&](std::size_t x, std::size_t y) {
+    const bool inside = y >= top && y - top < picture.height && x >= left && x - left < picture.width;
+    dst[to + y * frame.width + x] = inside ? src[from + (y - top) * pitch + x - left] : fill;
+  });
 }
 
 // Centring along one axis: half of what is too much is skipped, half of what is missing is margin.
 struct Axis {
   Axis(unsigned from, unsigned to)
       : count(from < to ? from : to), skip((from - count) / 2), margin((to - count) / 2) {}
-  std::size_t count, skip, margin;
+  unsigned count;
+  std::size_t skip, margin;
 };
 
 }  // namespace reference

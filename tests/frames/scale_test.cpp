@@ -1,3 +1,5 @@
+// What scales, pads and cuts frames, and does not simply go from one frame to another.
+
 #include "omxbridge/frames/scale.h"
 
 #include <gtest/gtest.h>
@@ -6,6 +8,7 @@
 #include <tuple>
 #include <vector>
 
+#include "omxbridge/frames/pad.h"
 #include "tests/frames/harness.h"
 #include "tests/frames/reference_scale.h"
 
@@ -13,41 +16,6 @@ namespace frames_test {
 namespace {
 
 using namespace webrtc;
-
-struct InPlaceScaler {
-  std::string name;
-  int (*call)(unsigned width, unsigned height, unsigned char* buffer);
-  void (*reference)(Bytes& buffer, Size s);
-  int (*result)(Size s);
-};
-
-int halfRows(Size s) {
-  return static_cast<int>(s.width / 2 * s.height * 3);
-}
-
-const InPlaceScaler kInPlace[] = {
-    {"UpHalf ", ScaleI420UpHalfFrame, reference::upHalf,
-     [](Size s) { return static_cast<int>(reference::i420Bytes(s)); }},
-    {"DownHalf ", ScaleI420DownHalfFrame, reference::downHalf, halfRows},
-    {"Quarter ", ScaleI420FrameQuarter, reference::quarter, halfRows},
-};
-
-TEST(ScaleInPlace, EqualsReferenceForEverySize) {
-  Content content(31);
-  for (const InPlaceScaler& function : kInPlace) {
-    forEachSize([&](Size s) {
-      SCOPED_TRACE(function.name + text(s));
-      const Bytes buffer = content.bytes(reference::i420Bytes(s));
-      Bytes expected = buffer;
-      function.reference(expected, s);
-      expectInPlace([&](auto* memory) { return function.call(s.width, s.height, memory); }, buffer, expected,
-                    function.result(s));
-    });
-    EXPECT_EQ(function.call(0, 2, nullptr), -1);
-    EXPECT_EQ(function.call(2, 0, nullptr), -1);
-    EXPECT_EQ(function.call(0xFFFFFFFF, 0xFFFFFFFF, nullptr), -1);
-  }
-}
 
 // --- Scalers that may grow the buffer ---
 
@@ -58,86 +26,50 @@ struct Growing {
   Bytes (*reference)(const Bytes& src, Size s, Size& out);
 };
 
-template <unsigned kGroup>
-Bytes enlarged(const Bytes& src, Size s, Size& out) {
-  out = {s.width / kGroup * (kGroup + 1), s.height / kGroup * (kGroup + 1)};
-  return reference::enlarge(kGroup, src, s);
-}
-
 const Growing kGrowing[] = {
     {"Down1_3 ", ScaleI420Down1_3,
-     [](Size s) {
-       return s.width > 5 && s.height > 5 && s.width % 2 == 0 && s.height % 2 == 0 && s.height / 3 % 2 == 0;
-     },
+     [](Size s) { return s.width > 5 && s.height > 5 && s == s.even() && s.height / 3 % 2 == 0; },
      reference::third},
-    {"Up3_2 ", ScaleI420Up3_2, [](Size s) { return s.width % 4 == 0 && s.height % 4 == 0; }, enlarged<2>},
-    {"Up2 ", ScaleI420Up2, [](Size s) { return s.width % 2 == 0 && s.height % 2 == 0; }, enlarged<1>},
+    {"Up3_2 ", ScaleI420Up3_2, [](Size s) { return s.width % 4 == 0 && s.height % 4 == 0; },
+     reference::enlarged<2>},
+    {"Up2 ", ScaleI420Up2, [](Size s) { return s == s.even(); }, reference::enlarged<1>},
 };
 
-// A buffer from new[], as the functions want it.
-struct Owned {
-  explicit Owned(const Bytes& bytes) : memory(new unsigned char[bytes.size()]) {
-    std::copy_n(bytes.data(), bytes.size(), memory);
-  }
-  ~Owned() { delete[] memory; }
-  Owned(const Owned&) = delete;
-  unsigned char* memory;
-};
-
-// capacity: what the buffer has, at least the source frame.
-void expectGrown(const Growing& function, const Bytes& src, Size s, std::size_t capacity) {
+// In a buffer of so many bytes. What is refused leaves everything as it is.
+void expectGrown(Content& content, const Growing& function, Size s, std::size_t capacity) {
   SCOPED_TRACE(function.name + text(s) + " in " + std::to_string(capacity));
-  Size out{};
-  const Bytes expected = function.reference(src, s, out);
-  Bytes initial(capacity);
-  for (std::size_t i = 0; i < capacity; ++i) initial[i] = i < src.size() ? src[i] : 0x5A;
+  const Bytes initial = content.bytes(capacity);
+  const bool fits = function.accepts(s) && s.area() != 0 && capacity >= s.i420();
+  Size out{7, 8};
+  const Bytes expected = fits ? function.reference(initial, s, out) : initial;
   onEveryTarget([&] {
-    Owned buffer(initial);
-    unsigned char* const before = buffer.memory;
-    Size given{};
-    EXPECT_EQ(function.call(s.width, s.height, buffer.memory, static_cast<unsigned>(capacity), given.width,
-                            given.height),
-              static_cast<int>(expected.size()));
-    EXPECT_EQ(text(given), text(out));
-    EXPECT_EQ(buffer.memory == before, expected.size() <= capacity);
-    EXPECT_TRUE(std::equal(expected.data(), expected.data() + expected.size(), buffer.memory));
-    if (expected.size() >= capacity || expected.size() < src.size()) return;
-    EXPECT_TRUE(std::all_of(buffer.memory + expected.size(), buffer.memory + capacity,
-                            [](unsigned char b) { return b == 0x5A; }));
+    unsigned char* buffer = new unsigned char[capacity];
+    const unsigned char* const before = std::copy_n(initial.data(), capacity, buffer) - capacity;
+    Size given{7, 8};
+    const int result =
+        function.call(s.width, s.height, buffer, static_cast<unsigned>(capacity), given.width, given.height);
+    const std::unique_ptr<unsigned char[]> owner(buffer);
+    EXPECT_EQ(result, fits ? static_cast<int>(expected.size()) : -1);
+    EXPECT_EQ(given, out);
+    EXPECT_EQ(buffer == before, expected.size() <= capacity);
+    EXPECT_TRUE(std::equal(expected.data(), expected.data() + expected.size(), buffer));
+    // What lies behind both frames.
+    for (std::size_t i = std::max(expected.size(), s.i420()); i < capacity; ++i)
+      ASSERT_EQ(buffer[i], initial[i]) << "byte " << i;
   });
 }
 
-TEST(ScaleGrowing, EqualsReferenceAndGrowsWhereItMust) {
+TEST(ScaleGrowing, EqualsReferenceGrowsWhereItMustAndRefusesSizesThatDoNotSuit) {
   Content content(32);
   for (const Growing& function : kGrowing) {
-    unsigned scaled = 0;
     forEachSize([&](Size any) {
-      const Size s{any.width * 2, any.height * 2};
-      if (!function.accepts(s)) return;
-      const Bytes src = content.bytes(reference::i420Bytes(s));
-      expectGrown(function, src, s, src.size());
-      expectGrown(function, src, s, src.size() * 4 + 100);
-      ++scaled;
+      for (const Size s : {any, Size{any.width * 2, any.height * 2}}) {
+        expectGrown(content, function, s, s.i420());
+        if (function.accepts(s)) expectGrown(content, function, s, s.i420() * 4 + 100);
+        if (function.accepts(s)) expectGrown(content, function, s, s.i420() - 1);
+      }
     });
-    EXPECT_GT(scaled, 50u);
-  }
-}
-
-TEST(ScaleGrowing, RefusesWithoutTouchingAnything) {
-  const Bytes src = Content(33).bytes(1000);
-  for (const Growing& function : kGrowing) {
-    for (unsigned k = 0; k < 20 * 20; ++k) {
-      const Size s{k % 20, k / 20};
-      const bool fits = !function.accepts(s) || s.area() == 0;
-      Owned buffer(src);
-      unsigned char* const before = buffer.memory;
-      Size out{7, 8};
-      const auto size = fits ? 1000u : static_cast<unsigned>(reference::i420Bytes(s)) - 1;
-      EXPECT_EQ(function.call(s.width, s.height, buffer.memory, size, out.width, out.height), -1) << text(s);
-      EXPECT_EQ(buffer.memory, before);
-      EXPECT_EQ(text(out), text({7, 8}));
-      EXPECT_TRUE(std::equal(src.data(), src.data() + src.size(), buffer.memory));
-    }
+    for (unsigned k = 0; k < 20 * 20; ++k) expectGrown(content, function, {k % 20, k / 20}, 1000);
     unsigned char* none = nullptr;
     Size out{};
     EXPECT_EQ(function.call(48, 48, none, 1 << 20, out.width, out.height), -1);
@@ -149,11 +81,11 @@ TEST(ScaleGrowing, RefusesWithoutTouchingAnything) {
 
 void expectScaled(Content& content, Size from, Size to) {
   SCOPED_TRACE(text(from) + " to " + text(to));
-  const Bytes src = content.bytes(reference::i420Bytes(from));
+  const Bytes src = content.bytes(from.i420());
   const std::vector<int> expected = reference::bilinear(src, from, to);
   const Bytes dst = content.bytes(expected.size() + content.number(0, 1) * 16);
-  const std::size_t written = to.area() + std::size_t{to.width / 2} * (to.height / 2) * 2;
-  std::vector<Bytes> outputs;
+  const std::size_t written = to.area() + 2 * to.half().area();
+  std::optional<Bytes> first;
   onEveryTarget([&] {
     Bytes output = dst;
     unsigned char* destination = output.data();
@@ -163,15 +95,12 @@ void expectScaled(Content& content, Size from, Size to) {
     EXPECT_EQ(destination, output.data());
     EXPECT_EQ(size, dst.size());
     for (std::size_t i = 0; i < dst.size(); ++i) {
-      if (i >= written) {
-        ASSERT_EQ(output[i], dst[i]) << i;
-      } else if (expected[i] >= 0) {
-        ASSERT_EQ(output[i], expected[i]) << i;
-      }
+      const int wanted = i < written ? expected[i] : dst[i];
+      ASSERT_EQ(output[i], wanted >= 0 ? wanted : output[i]) << i;
     }
     // Bytes that nobody wrote are nobody's business, but they are the same everywhere.
-    outputs.push_back(output);
-    EXPECT_EQ(output, outputs.front());
+    if (!first) first = output;
+    EXPECT_EQ(output, *first);
   });
 }
 
@@ -190,9 +119,9 @@ TEST(ScaleBilinearArithmetic, EqualsReferenceForEveryWidth) {
 
 TEST(ScaleBilinearMemory, ReplacesADestinationThatIsTooSmallAndTakesTheSourceForOne) {
   const Size from{48, 20};
-  const Bytes src = Content(43).bytes(reference::i420Bytes(from));
+  const Bytes src = Content(43).bytes(from.i420());
   for (const Size to : {Size{31, 33}, Size{24, 10}, Size{72, 33}}) {
-    const std::size_t needed = reference::i420Bytes(to);
+    const std::size_t needed = to.i420();
     std::vector<Bytes> results;
     // One that is a byte too small, and the source itself.
     for (const std::size_t has : {needed - 1, src.size()}) {
@@ -205,7 +134,7 @@ TEST(ScaleBilinearMemory, ReplacesADestinationThatIsTooSmallAndTakesTheSourceFor
                 static_cast<int>(to.height));
       const std::unique_ptr<unsigned char[]> owner(destination);
       EXPECT_EQ(size, std::max(isSource ? has : 0, needed));
-      Bytes result(to.area() + std::size_t{to.width / 2} * (to.height / 2) * 2);
+      Bytes result(to.area() + 2 * to.half().area());
       std::copy_n(destination, result.size(), result.data());
       results.push_back(result);
       EXPECT_EQ(result, results.front());
@@ -242,6 +171,84 @@ TEST(Interpolator, TakesOnlyPairsThatItDoesNotSupport) {
     EXPECT_EQ(scaler.Set(2, 2, width, 2, type, type, method), -1);
   }
   EXPECT_EQ(scaler.Interpolate(src, destination, size), -2);
+}
+
+// --- Padding and cutting ---
+
+TEST(PadFrame, ChecksInOrder) {
+  std::uint8_t byte[1] = {};
+  EXPECT_EQ(PadI420Frame(nullptr, nullptr, 320, 240, 320, 240), 115200);
+  EXPECT_EQ(PadI420Frame(nullptr, byte, 2, 2, 4, 4), -1);
+  EXPECT_EQ(PadI420Frame(byte, nullptr, 2, 2, 4, 4), -1);
+  const unsigned refused[][4] = {{4, 2, 2, 4}, {2, 4, 4, 2}, {2, 2, 65536, 65536}};
+  for (const auto& s : refused) EXPECT_EQ(PadI420Frame(byte, byte, s[0], s[1], s[2], s[3]), -1);
+  EXPECT_EQ(PadI420Frame(115200, nullptr, nullptr, false), -1);
+  EXPECT_EQ(PadI420Frame(115201, nullptr, nullptr, true), -1);
+}
+
+TEST(PadFrame, FixedSizesAreCutAndPaddedButForFourBytes) {
+  Content content(52);
+  const auto expectFixed = [&](Size from, Size cut, Size to, std::size_t untouched) {
+    const Bytes src = content.bytes(from.i420()), dst = content.bytes(to.i420());
+    Bytes picture = src, expected = dst;
+    if (cut != from) reference::cut(picture, from, cut);
+    reference::pad(picture, expected, cut, to, to.width);
+    for (std::size_t i = untouched; i < untouched + 4 && i < dst.size(); ++i) expected[i] = dst[i];
+    const auto call = [&](auto* in, auto* out) {
+      return PadI420Frame(static_cast<unsigned>(src.size()), in, out, true);
+    };
+    expectConversion(call, src, dst, expected, static_cast<int>(dst.size()));
+  };
+  expectFixed({320, 240}, {320, 240}, {352, 288}, 352 * 288 * 5 / 4 + 1412);
+  expectFixed({160, 120}, {160, 112}, {176, 144}, 176 * 144 * 3 / 2);  // all of it is written
+}
+
+TEST(PadBottomRows, MovesChromaAndFillsInPlace) {
+  Content content(53);
+  for (unsigned k = 0; k < 400 && !HasFailure(); ++k) {
+    const Size s{content.number(1, 40), content.number(1, 40)};
+    const unsigned added = content.number(0, 40), newArea = s.width * (s.height + added);
+    const std::size_t q = s.area() / 4, samples = q + s.width * added / 4;
+    SCOPED_TRACE(text(s) + " and " + std::to_string(added));
+    const std::size_t v = newArea + newArea / 4;
+    const unsigned newSize = (s.height + added) * (s.width / 2 * 3);
+    const auto least = static_cast<unsigned>(std::max<std::size_t>(v + samples, newSize));
+    const auto capacity = static_cast<unsigned>(std::max<std::size_t>(least, s.i420()));
+    const Bytes frame = content.bytes(capacity);
+    Bytes expected = frame;
+    for (std::size_t i = 0; i < samples; ++i) expected[v + i] = i < q ? frame[s.area() + q + i] : 127;
+    for (std::size_t i = 0; i < samples; ++i) expected[newArea + i] = i < q ? frame[s.area() + i] : 127;
+    for (std::size_t i = s.area(); i < newArea; ++i) expected[i] = 0;
+    unsigned outSize = 99;
+    const auto add = [&](unsigned char* buffer, unsigned has) {
+      return PadI420BottomRows(buffer, has, s.width, s.height, static_cast<int>(added), outSize);
+    };
+    EXPECT_EQ(add(nullptr, least - 1), -1);
+    EXPECT_EQ(outSize, 99u);
+    expectInPlace([&](unsigned char* buffer) { return add(buffer, capacity); }, frame, expected, 0);
+    EXPECT_EQ(outSize, newSize);
+  }
+  unsigned outSize = 99;
+  EXPECT_EQ(PadI420BottomRows(nullptr, 1000, 4, 4, -1, outSize), -1);
+  EXPECT_EQ(PadI420BottomRows(nullptr, 1000, 0x80000000, 2, 0, outSize), -1);
+  EXPECT_EQ(PadI420BottomRows(nullptr, 1000, 0xFFFFFFFF, 0xFFFFFFFF, 0x7FFFFFFF, outSize), -1);
+}
+
+TEST(CutFrame, EqualsReferenceForEverySizeAndRefusesWhatIsNoCut) {
+  Content content(54);
+  forEachSize([&](Size from) {
+    const Size to{content.number(1, from.width), content.number(1, from.height)};
+    SCOPED_TRACE(text(from) + " to " + text(to));
+    const Bytes frame = content.bytes(from.i420());
+    Bytes expected = frame;
+    const std::size_t result = from == to ? to.i420() : reference::cut(expected, from, to);
+    expectInPlace(
+        [&](auto* memory) { return CutI420Frame(memory, from.width, from.height, to.width, to.height); },
+        frame, expected, static_cast<int>(result));
+  });
+  const unsigned refused[][4] = {
+      {0, 2, 2, 2}, {2, 2, 2, 0}, {4, 4, 6, 2}, {4, 4, 2, 6}, {0x10001, 0x10000, 0x10000, 0x10000}};
+  for (const auto& s : refused) EXPECT_EQ(CutI420Frame(nullptr, s[0], s[1], s[2], s[3]), -1);
 }
 
 }  // namespace
