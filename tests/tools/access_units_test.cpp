@@ -3,6 +3,7 @@
 
 #include <gtest/gtest.h>
 
+#include <numeric>
 #include <string>
 
 #include "host/mediaserver/components/annex_b.h"
@@ -83,9 +84,9 @@ const std::string kPrefix = "\x6E\x80\x80";
 using Units = std::vector<std::vector<std::string>>;
 
 struct Cut {
-  std::vector<std::string> units;
-  std::string failure;
-  std::optional<FrameRate> rate;
+  std::vector<std::string> units{};
+  std::string failure{};
+  std::optional<FrameRate> rate{};
 };
 
 Cut cut(const std::string& stream) {
@@ -94,12 +95,10 @@ Cut cut(const std::string& stream) {
   AccessUnitReader reader(std::move(bytes.value()));
   Cut result;
   std::vector<uint8_t> unit;
-  for (;;) {
-    const auto more = reader.next(unit);
-    if (!more.ok()) result.failure = more.failure().text;
-    if (!more.ok() || !more.value()) break;
+  auto more = reader.next(unit);
+  for (; more.ok() && more.value(); more = reader.next(unit))
     result.units.emplace_back(unit.begin(), unit.end());
-  }
+  if (!more.ok()) result.failure = more.failure().text;
   result.rate = reader.frameRate();
   return result;
 }
@@ -109,17 +108,15 @@ std::vector<std::string> withStartCodes(const Units& units) {
   std::vector<std::string> result;
   int number = 0;
   for (const auto& unit : units) {
-    std::string bytes;
-    for (const std::string& nal : unit) bytes += std::string(number++ % 3 == 1 ? 2 : 3, '\0') + '\1' + nal;
-    result.push_back(bytes);
+    result.emplace_back();
+    for (const std::string& nal : unit)
+      result.back() += std::string(number++ % 3 == 1 ? 2 : 3, '\0') + '\1' + nal;
   }
   return result;
 }
 
 std::string joined(const std::vector<std::string>& parts) {
-  std::string result;
-  for (const std::string& part : parts) result += part;
-  return result;
+  return std::accumulate(parts.begin(), parts.end(), std::string());
 }
 
 TEST(AccessUnits, EndWhereThePictureEnds) {
@@ -128,14 +125,10 @@ TEST(AccessUnits, EndWhereThePictureEnds) {
     const char* name;
     Units units;
   } cases[] = {
-      {"a slice a picture",
-       {{sps(), pps(), idr}, {slice({.frame = 1, .order = 2})}, {slice({.frame = 2, .order = 4})}}},
-      {"several slices",
-       {{sps(), pps(), idr, slice({.first = 40, .idr = true})},
-        {slice({.frame = 1}), slice({.first = 50, .frame = 1}), slice({.first = 60, .frame = 1})}}},
       {"slices in any order",
        {{sps(), pps(), slice({.first = 40, .idr = true}), idr},
-        {slice({.first = 9, .frame = 1}), slice({.first = 0, .frame = 1})}}},
+        {slice({.first = 9, .frame = 1}), slice({.first = 0, .frame = 1})},
+        {slice({.frame = 2})}}},
       {"a lost first slice", {{sps(), pps(), idr}, {slice({.first = 30, .frame = 1, .order = 2})}}},
       {"redundant slices", {{sps(), pps(), idr, idr, idr}, {slice({.frame = 1})}}},
       {"key frames side by side", {{sps(), pps(), idr}, {slice({.idr = true, .idrId = 1})}, {idr}}},
@@ -169,10 +162,9 @@ TEST(AccessUnits, EndWhereThePictureEnds) {
 }
 
 TEST(AccessUnits, EndWithEachFieldAndGoByTheFirstMacroblockWithoutParameters) {
-  const std::string top = slice({.idr = true, .field = 0}, true);
-  const std::string bottom = slice({.frame = 0, .order = 1, .field = 1}, true);
-  const std::string frame = slice({.frame = 1, .order = 2}, true);
-  const auto fields = withStartCodes({{sps(true), pps(), top}, {bottom}, {frame}});
+  const auto fields = withStartCodes({{sps(true), pps(), slice({.idr = true, .field = 0}, true)},
+                                      {slice({.frame = 0, .order = 1, .field = 1}, true)},
+                                      {slice({.frame = 1, .order = 2}, true)}});
   EXPECT_EQ(cut(joined(fields)).units, fields);
   const std::string idr = slice({.idr = true});
   const auto expected =
@@ -192,17 +184,6 @@ TEST(AccessUnits, SurviveStreamsThatAreDamagedOrNone) {
     const Cut result = cut(none);
     EXPECT_TRUE(result.units.empty());
     EXPECT_NE(result.failure.find("Annex B"), std::string::npos) << result.failure;
-  }
-  // Cut at every byte, and with every byte broken: no more than the reader's own checks are asked here.
-  for (size_t i = 0; i < good.size(); ++i) {
-    const Cut shortened = cut(good.substr(0, i));
-    EXPECT_LE(shortened.units.size(), 2U);
-    EXPECT_LE(joined(shortened.units).size(), i);
-    for (const char broken : {'\0', '\xFF', '\1'}) {
-      std::string damaged = good;
-      damaged[i] = broken;
-      EXPECT_LE(joined(cut(damaged).units).size(), good.size());
-    }
   }
 }
 

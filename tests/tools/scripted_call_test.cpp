@@ -21,8 +21,8 @@ using tooltest::contentOf;
 using tooltest::TemporaryDirectory;
 
 constexpr Size kSize{64, 48};
-const std::vector<uint8_t> kSliceHeader{0, 0, 0, 1, 0x65, 0x88};
-const std::vector<uint8_t> kParameters{0, 0, 0, 1, 0x67, 66, 0, 31, 0, 0, 0, 1, 0x68, 1};
+constexpr std::string_view kSliceHeader{"\0\0\0\1\x65\x88", 6};
+constexpr std::string_view kParameters{"\0\0\0\1\x67\x42\0\x1F\0\0\0\1\x68\1", 14};
 
 // Gray pictures, one after the other, until it is told to end.
 class GraySource : public FrameSource {
@@ -61,16 +61,13 @@ struct CallRig {
   }
 
   static Packet coded(const Packet& input) {
-    Packet output = input;
-    if (!input.bytes.empty())
-      output.bytes.insert(output.bytes.begin(), kSliceHeader.begin(), kSliceHeader.end());
-    return output;
+    const std::string header(input.bytes.empty() ? std::string_view() : kSliceHeader);
+    return Packet(header + input.text(), input.timestamp, input.flags);
   }
   static Packet decoded(const Packet& input) {
-    Packet output = input;
-    const size_t picture = std::min(output.bytes.size(), pictureBytes(kSize));
-    output.bytes.erase(output.bytes.begin(), output.bytes.end() - static_cast<ptrdiff_t>(picture));
-    return output;
+    const std::string text = input.text();
+    const size_t picture = std::min(text.size(), pictureBytes(kSize));
+    return Packet(text.substr(text.size() - picture), input.timestamp, input.flags);
   }
 
   Result<CallReport> run(GraySource& source) { return runCall(settings, source, enough); }
@@ -91,15 +88,11 @@ struct CallRig {
 
 TEST(ScriptedCall, EndsTheInputOnlyWhenThePicturesAreBack) {
   CallRig rig;
-  // The decoder takes longer, so that pictures wait for both.
-  const auto slowly = [](auto work, int milliseconds) {
-    return [=](const Packet& input) {
-      std::this_thread::sleep_for(std::chrono::milliseconds(milliseconds));
-      return std::vector<Packet>{work(input)};
-    };
-  };
-  rig.server.encoder().onInput(slowly(&CallRig::coded, 2));
-  rig.server.decoder().onInput(slowly(&CallRig::decoded, 5));
+  // Slow enough that pictures wait for the decoder.
+  rig.server.decoder().onInput([](const Packet& input) {
+    std::this_thread::sleep_for(std::chrono::milliseconds(5));
+    return std::vector<Packet>{CallRig::decoded(input)};
+  });
   std::vector<size_t> filledAtEnd;
   rig.server.omx().before(omxtest::Method::EmptyBuffer, [&](const omxtest::Call& call) {
     if ((call.flags & OMX_BUFFERFLAG_EOS) == 0) return;
@@ -110,8 +103,7 @@ TEST(ScriptedCall, EndsTheInputOnlyWhenThePicturesAreBack) {
   GraySource source(30);
   EXPECT_EQ(rig.figures(source).framesDecoded, 30U);
   ASSERT_EQ(filledAtEnd.size(), 2U);
-  for (const size_t filled : filledAtEnd)
-    EXPECT_GE(filled, 29U) << "but for the last one, just being handled";
+  EXPECT_GE(std::min(filledAtEnd[0], filledAtEnd[1]), 29U) << "but for the last one, just being handled";
 }
 
 TEST(ScriptedCall, CountsWhatTheEncoderDropsAndStillEnds) {
@@ -135,18 +127,12 @@ TEST(ScriptedCall, SendsParametersThatComeAloneWithTheNextPicture) {
   rig.settings.streamPath = rig.directory.file("coded.264");
   rig.server.encoder().onInput([](const Packet& input) {
     std::vector<Packet> outputs{CallRig::coded(input)};
-    if (input.timestamp == 0) {
-      Packet parameters;
-      parameters.bytes = kParameters;
-      parameters.flags = OMX_BUFFERFLAG_CODECCONFIG;
-      outputs.insert(outputs.begin(), parameters);
-    }
+    if (input.timestamp == 0) outputs.emplace(outputs.begin(), kParameters, 0, OMX_BUFFERFLAG_CODECCONFIG);
     return outputs;
   });
   GraySource source(5);
   const auto report = rig.run(source);
   ASSERT_TRUE(report.ok()) << report.failure().text;
-  EXPECT_EQ(report.value().figures.framesEncoded, 5U);
   EXPECT_EQ(report.value().figures.framesDecoded, 5U);
   ASSERT_TRUE(report.value().sequence);
   EXPECT_EQ(toText(*report.value().sequence), "Baseline, level 3.1");
@@ -211,9 +197,9 @@ TEST(ScriptedCall, FailsWithAMessageAndLeavesNoFile) {
          rig.server.encoder().editPort(mediaserver::kOutputPort,
                                        [](auto& port) { port.nBufferSize = 80'000; });
          rig.server.encoder().onInput([](const Packet& input) {
-           Packet output = CallRig::coded(input);
-           output.bytes.resize(70'000);
-           return std::vector<Packet>{output};
+           std::vector<Packet> outputs{CallRig::coded(input)};
+           outputs[0].bytes.resize(70'000);
+           return outputs;
          });
        },
        ExitCode::Failed, "a coded picture of 70000 bytes is larger than the input buffers of the decoder"},
