@@ -17,9 +17,7 @@ using android::sp;
 using android::wp;
 
 struct Life {
-  std::atomic<int> firstRefs{0};
-  std::atomic<int> lastRefs{0};
-  std::atomic<int> destroyed{0};
+  std::atomic<int> firstRefs{0}, lastRefs{0}, destroyed{0};
 };
 
 class Interface : public virtual RefBase {
@@ -30,15 +28,14 @@ class Interface : public virtual RefBase {
 class Object : public Interface {
  public:
   explicit Object(Life* life) : _life(life) {}
-
   int value() const override { return 42; }
 
-  std::function<void()> atDestruction;
+  std::function<void()> atDestruction = [] {};
   sp<Object> next;
 
  protected:
   ~Object() override {
-    if (atDestruction) atDestruction();
+    atDestruction();
     ++_life->destroyed;
   }
   void onFirstRef() override {
@@ -61,20 +58,15 @@ TEST(StrongPointer, TellsOfTheFirstAndLastReferenceAndTakesTheNewBeforeItDropsTh
     const sp<Object> third = std::move(head);
     EXPECT_EQ(third->getStrongCount(), 2);
     EXPECT_TRUE(head == nullptr && head == NULL && second == third && third.get() == second);
-    EXPECT_EQ(second->value(), 42);
-    EXPECT_EQ(life.destroyed, 0);
+    EXPECT_TRUE(second->value() == 42 && life.destroyed == 0);
   }
-  EXPECT_EQ(life.firstRefs, 1);
-  EXPECT_EQ(life.lastRefs, 1);
-  EXPECT_EQ(life.destroyed, 1);
+  EXPECT_TRUE(life.firstRefs == 1 && life.lastRefs == 1 && life.destroyed == 1);
   sp<Object> head = new Object(&life);
   head->next = new Object(&life);
   head = head->next;  // The only other reference to the new one dies with the old one.
   EXPECT_EQ(life.destroyed, 2);
   // A destructor that looks at the pointer that is being changed sees its new value.
   const Object* seen = head.get();
-  const sp<Object>& alias = head;
-  head = alias;
   head->atDestruction = [&] { seen = head.get(); };
   head = nullptr;
   EXPECT_EQ(seen, nullptr);
@@ -93,8 +85,7 @@ TEST(WeakPointer, PromotesExactlyWhileTheObjectLivesOrBeforeItWasHeld) {
   EXPECT_EQ(weak.promote(), nullptr);
   weak = new Object(&life);
   EXPECT_NE(weak.promote(), nullptr);
-  EXPECT_EQ(life.firstRefs, 2);
-  EXPECT_EQ(life.destroyed, 2);
+  EXPECT_TRUE(life.firstRefs == 2 && life.destroyed == 2);
 }
 
 TEST(WeakPointer, PromotionRacesTheLastRelease) {
@@ -113,8 +104,7 @@ TEST(WeakPointer, PromotionRacesTheLastRelease) {
     start.arrive_and_wait();
     strong.clear();
     promoter.join();
-    ASSERT_EQ(life.destroyed, 1);
-    ASSERT_EQ(life.lastRefs, 1);
+    ASSERT_TRUE(life.destroyed == 1 && life.lastRefs == 1);
   }
 }
 
