@@ -35,10 +35,11 @@ class Input {
     return kind == 3 ? size() : kind == 2 ? width + number(0, 40) : kind == 1 ? width : 0;
   }
   Size frame() { return {size(), size()}; }
+  // At least one: an address is never null.
   Bytes bytes(uint64_t size) {
-    Bytes result(size);
+    Bytes result(std::max<uint64_t>(size, 1));
     const auto first = _data.ConsumeIntegral<uint8_t>();
-    for (uint64_t i = 0; i < size; ++i) result[i] = static_cast<uint8_t>(first + i * 7);
+    for (uint64_t i = 0; i < result.size(); ++i) result[i] = static_cast<uint8_t>(first + i * 7);
     return result;
   }
 

@@ -7,11 +7,10 @@
 #include <array>
 #include <atomic>
 #include <chrono>
-#include <condition_variable>
 #include <cstdint>
 #include <cstdlib>
-#include <mutex>
 #include <string>
+#include <thread>
 #include <vector>
 
 #include <binder/MemoryDealer.h>
@@ -32,64 +31,28 @@ using mediaserver::kPortCount;
 
 constexpr int kMostCalls = 200;
 constexpr size_t kLargestBlock = 8 << 20;
-// Enough for a component's answer; nothing depends on it.
-constexpr std::chrono::milliseconds kPatience{20};
+constexpr int kPatience = 20;  // milliseconds: enough for a component's answer; nothing depends on it
 
 void require(bool holds) {
   if (!holds) std::abort();
 }
 
-class Observer : public android::BnOMXObserver {
- public:
+struct Observer : android::BnOMXObserver {
   void onMessage(const android::omx_message& /*message*/) override {
-    const std::lock_guard<std::mutex> lock(_mutex);
-    require(!_silent);
-    ++_heard;
-    _changed.notify_all();
+    require(!silent);
+    ++heard;
   }
-  void waitForMore() {
-    std::unique_lock<std::mutex> lock(_mutex);
-    _changed.wait_for(lock, kPatience, [this] { return _heard > _seen; });
-    _seen = _heard;
-  }
-  // Its node is gone: no message may come any more.
-  void silence() {
-    const std::lock_guard<std::mutex> lock(_mutex);
-    _silent = true;
-  }
-
- private:
-  std::mutex _mutex;
-  std::condition_variable _changed;
-  uint64_t _heard = 0;
-  uint64_t _seen = 0;
-  bool _silent = false;
+  std::atomic<uint64_t> heard{0};
+  std::atomic<bool> silent{false};  // its node is gone: no message may come any more
 };
 
+// Besides those of videos, which follow each other.
 constexpr OMX_INDEXTYPE kIndices[] = {
-    OMX_IndexParamPortDefinition,
-    OMX_IndexParamVideoPortFormat,
-    OMX_IndexParamVideoInit,
-    OMX_IndexParamCompBufferSupplier,
-    OMX_IndexParamStandardComponentRole,
-    OMX_IndexParamVideoAvc,
-    OMX_IndexParamVideoBitrate,
-    OMX_IndexParamVideoProfileLevelCurrent,
-    OMX_IndexParamVideoProfileLevelQuerySupported,
-    OMX_IndexParamVideoQuantization,
-    OMX_IndexParamVideoErrorCorrection,
-    OMX_IndexParamVideoIntraRefresh,
-    OMX_IndexConfigVideoBitrate,
-    OMX_IndexConfigVideoFramerate,
-    OMX_IndexConfigVideoIntraVOPRefresh,
-    OMX_IndexConfigVideoAVCIntraPeriod,
-    OMX_IndexConfigCommonRotate,
-    OMX_IndexConfigCommonOutputCrop,
-    mediaserver::kQcomPortDefinitionIndex,
-    mediaserver::kQcomIntraPeriodIndex,
-    mediaserver::kQcomPictureOrderIndex,
-    mediaserver::kStoreMetaDataIndex,
-};
+    OMX_IndexParamPortDefinition,          OMX_IndexParamVideoInit,
+    OMX_IndexParamCompBufferSupplier,      OMX_IndexParamStandardComponentRole,
+    OMX_IndexConfigCommonRotate,           OMX_IndexConfigCommonOutputCrop,
+    mediaserver::kQcomPortDefinitionIndex, mediaserver::kQcomIntraPeriodIndex,
+    mediaserver::kQcomPictureOrderIndex,   mediaserver::kStoreMetaDataIndex};
 
 struct Given {
   IOMX::buffer_id id;
@@ -131,40 +94,44 @@ class Client {
   void freeNode() {
     if (_observer == nullptr) return;
     require(_omx->freeNode(_node) == android::OK);
-    _observer->silence();
+    _observer->silent = true;
     _observer.clear();
     require(_omx->freeNode(_node) != android::OK);
     for (auto& buffers : _buffers) buffers.clear();
   }
 
   void freeSometimes() {
-    if (_data.ConsumeIntegralInRange(0, 3) == 0) freeNode();
+    if (number(0, 3) == 0) freeNode();
   }
 
+  // For more than has been heard.
   void waitForMore() {
-    if (_observer != nullptr) _observer->waitForMore();
+    if (_observer == nullptr) return;
+    for (int i = 0; i < kPatience && _observer->heard == _seen; ++i)
+      std::this_thread::sleep_for(std::chrono::milliseconds(1));
+    _seen = _observer->heard;
   }
 
-  OMX_U32 anyPort() { return _data.ConsumeIntegralInRange<OMX_U32>(0, kPortCount); }
+  OMX_U32 number(OMX_U32 low, OMX_U32 high) { return _data.ConsumeIntegralInRange(low, high); }
+  OMX_U32 word() { return _data.ConsumeIntegral<OMX_U32>(); }
+  bool rarely() { return number(0, 15) == 0; }
+  OMX_U32 anyPort() { return number(0, kPortCount); }
 
   void command() {
-    const int command = _data.ConsumeIntegralInRange(0, 5);
-    const auto parameter = _data.ConsumeIntegralInRange(0, 15) == 0 ? _data.ConsumeIntegral<OMX_S32>()
-                                                                    : _data.ConsumeIntegralInRange(-1, 6);
-    static_cast<void>(_omx->sendCommand(_node, static_cast<OMX_COMMANDTYPE>(command), parameter));
+    const auto command = static_cast<OMX_COMMANDTYPE>(number(0, 5));
+    _omx->sendCommand(_node, command, static_cast<OMX_S32>(rarely() ? word() : number(0, 7) - 1));
   }
 
   mediaserver::PortDefinition definition(OMX_U32 port) {
     mediaserver::PortDefinition definition{};
     definition.nPortIndex = port;
-    static_cast<void>(
-        _omx->getParameter(_node, OMX_IndexParamPortDefinition, &definition, sizeof(definition)));
+    _omx->getParameter(_node, OMX_IndexParamPortDefinition, &definition, sizeof(definition));
     return definition;
   }
 
   // As a decent client starts, from whatever state it is in.
   void start() {
-    static_cast<void>(_omx->sendCommand(_node, OMX_CommandStateSet, OMX_StateIdle));
+    _omx->sendCommand(_node, OMX_CommandStateSet, OMX_StateIdle);
     for (OMX_U32 port = 0; port < kPortCount; ++port) {
       const mediaserver::PortDefinition wanted = definition(port);
       while (_buffers[port].size() < std::min<size_t>(wanted.nBufferCountActual, 32)) {
@@ -174,24 +141,25 @@ class Client {
       }
     }
     waitForMore();
-    static_cast<void>(_omx->sendCommand(_node, OMX_CommandStateSet, OMX_StateExecuting));
+    _omx->sendCommand(_node, OMX_CommandStateSet, OMX_StateExecuting);
     waitForMore();
-    for (const Given& buffer : _buffers[mediaserver::kOutputPort])
-      static_cast<void>(_omx->fillBuffer(_node, buffer.id));
+    for (const Given& buffer : _buffers[mediaserver::kOutputPort]) _omx->fillBuffer(_node, buffer.id);
   }
 
   void record() {
-    const OMX_INDEXTYPE index = _data.ConsumeIntegralInRange(0, 15) == 0
-                                    ? static_cast<OMX_INDEXTYPE>(_data.ConsumeIntegral<uint32_t>())
-                                    : _data.PickValueInArray(kIndices);
-    const int call = _data.ConsumeIntegralInRange(0, 3);
-    std::vector<uint8_t> bytes = _data.ConsumeBytes<uint8_t>(_data.ConsumeIntegralInRange<size_t>(0, 256));
+    const OMX_U32 video = number(OMX_IndexParamVideoPortFormat, OMX_IndexConfigVideoNalSize);
+    const OMX_INDEXTYPE other = _data.PickValueInArray(kIndices);
+    const bool isVideo = _data.ConsumeBool();
+    const OMX_INDEXTYPE index =
+        rarely() || isVideo ? static_cast<OMX_INDEXTYPE>(isVideo ? video : word()) : other;
+    std::vector<uint8_t> bytes = _data.ConsumeBytes<uint8_t>(number(0, 256));
     bytes.shrink_to_fit();
     void* const memory = bytes.empty() ? nullptr : bytes.data();
-    if (call == 0) static_cast<void>(_omx->getParameter(_node, index, memory, bytes.size()));
-    if (call == 1) static_cast<void>(_omx->setParameter(_node, index, memory, bytes.size()));
-    if (call == 2) static_cast<void>(_omx->getConfig(_node, index, memory, bytes.size()));
-    if (call == 3) static_cast<void>(_omx->setConfig(_node, index, memory, bytes.size()));
+    const OMX_U32 call = number(0, 3);
+    if (call == 0) _omx->getParameter(_node, index, memory, bytes.size());
+    if (call == 1) _omx->setParameter(_node, index, memory, bytes.size());
+    if (call == 2) _omx->getConfig(_node, index, memory, bytes.size());
+    if (call == 3) _omx->setConfig(_node, index, memory, bytes.size());
   }
 
   void definePort() {
@@ -200,16 +168,15 @@ class Client {
     OMX_U32* const words[] = {
         &wanted.nBufferCountActual, &wanted.nBufferSize, &video.nFrameWidth, &video.nFrameHeight,
         &video.nSliceHeight,        &video.xFramerate,   &video.nBitrate};
-    *_data.PickValueInArray(words) = _data.ConsumeBool() ? _data.ConsumeIntegralInRange<OMX_U32>(0, 400)
-                                                         : _data.ConsumeIntegral<OMX_U32>();
+    *_data.PickValueInArray(words) = _data.ConsumeBool() ? number(0, 400) : word();
     if (_data.ConsumeBool()) video.eCompressionFormat = static_cast<OMX_VIDEO_CODINGTYPE>(anyPort() * 3);
-    static_cast<void>(_omx->setParameter(_node, OMX_IndexParamPortDefinition, &wanted, sizeof(wanted)));
+    _omx->setParameter(_node, OMX_IndexParamPortDefinition, &wanted, sizeof(wanted));
   }
 
   // `size` 0: any.
   void give(OMX_U32 port, size_t size) {
-    const int how = _data.ConsumeIntegralInRange(0, 2);
-    if (size == 0) size = _data.ConsumeIntegralInRange<size_t>(0, 1 << 18);
+    const OMX_U32 how = number(0, 2);
+    if (size == 0) size = number(0, 1 << 18);
     if (size > kLargestBlock) return;
     Given given{nullptr, nullptr, nullptr, size};
     android::status_t status = android::OK;
@@ -232,14 +199,13 @@ class Client {
 
   // One of the client's own, mostly.
   Given anyBuffer() {
-    const auto& buffers = _buffers[_data.ConsumeIntegralInRange<size_t>(0, kPortCount - 1)];
-    if (buffers.empty() || _data.ConsumeIntegralInRange(0, 15) == 0)
-      return {reinterpret_cast<IOMX::buffer_id>(_data.ConsumeIntegralInRange<uintptr_t>(0, 1000)), nullptr,
-              nullptr, 0};
-    return buffers[_data.ConsumeIntegralInRange<size_t>(0, buffers.size() - 1)];
+    const auto& buffers = _buffers[number(0, kPortCount - 1)];
+    const auto wrong = reinterpret_cast<IOMX::buffer_id>(uintptr_t{number(0, 1000)});
+    if (buffers.empty() || rarely()) return {wrong, nullptr, nullptr, 0};
+    return buffers[number(0, static_cast<OMX_U32>(buffers.size()) - 1)];
   }
 
-  void fillBuffer() { static_cast<void>(_omx->fillBuffer(_node, anyBuffer().id)); }
+  void fillBuffer() { _omx->fillBuffer(_node, anyBuffer().id); }
 
   void freeBuffer() {
     const OMX_U32 port = anyPort();
@@ -250,23 +216,18 @@ class Client {
 
   void emptyBuffer() {
     const Given chosen = anyBuffer();
-    const bool fits = _data.ConsumeIntegralInRange(0, 7) != 0;
-    auto offset = _data.ConsumeIntegral<OMX_U32>();
-    auto length = _data.ConsumeIntegral<OMX_U32>();
-    if (fits) {
-      offset = 0;
-      length = static_cast<OMX_U32>(_data.ConsumeBool() ? chosen.size : length % (chosen.size + 1));
-    }
+    const bool fits = number(0, 7) != 0;
+    const OMX_U32 any = word();
+    const OMX_U32 part = _data.ConsumeBool() ? static_cast<OMX_U32>(chosen.size)
+                                             : static_cast<OMX_U32>(any % (chosen.size + 1));
     // Not while the component may read it.
     if (chosen.block != nullptr && _data.ConsumeBool()) {
-      const std::vector<uint8_t> bytes =
-          _data.ConsumeBytes<uint8_t>(_data.ConsumeIntegralInRange<size_t>(0, 4096));
+      const std::vector<uint8_t> bytes = _data.ConsumeBytes<uint8_t>(number(0, 4096));
       std::copy_n(bytes.begin(), std::min(bytes.size(), chosen.size), chosen.bytes);
     }
-    const auto flags = _data.ConsumeIntegralInRange(0, 3) == 0 ? _data.ConsumeIntegral<OMX_U32>()
-                                                               : OMX_U32{OMX_BUFFERFLAG_ENDOFFRAME};
-    static_cast<void>(
-        _omx->emptyBuffer(_node, chosen.id, offset, length, flags, _data.ConsumeIntegral<int16_t>()));
+    const OMX_U32 flags = number(0, 3) == 0 ? word() : OMX_U32{OMX_BUFFERFLAG_ENDOFFRAME};
+    const auto time = _data.ConsumeIntegral<int16_t>();
+    _omx->emptyBuffer(_node, chosen.id, fits ? 0 : word(), fits ? part : any, flags, time);
   }
 
   void oddCalls() {
@@ -274,19 +235,20 @@ class Client {
     OMX_INDEXTYPE index{};
     OMX_U32 word = 0;
     const OMX_BOOL enable = _data.ConsumeBool() ? OMX_TRUE : OMX_FALSE;
-    static_cast<void>(_omx->getState(_node, &state));
-    static_cast<void>(_omx->getState(_node, nullptr));
-    static_cast<void>(_omx->storeMetaDataInBuffers(_node, anyPort(), enable));
-    static_cast<void>(_omx->enableGraphicBuffers(_node, anyPort(), enable));
-    static_cast<void>(_omx->getGraphicBufferUsage(_node, anyPort(), &word));
-    static_cast<void>(_omx->useBuffer(_node, anyPort(), nullptr, nullptr));
-    static_cast<void>(_omx->getExtensionIndex(_node, _data.ConsumeRandomLengthString(64).c_str(), &index));
+    _omx->getState(_node, &state);
+    _omx->getState(_node, nullptr);
+    _omx->storeMetaDataInBuffers(_node, anyPort(), enable);
+    _omx->enableGraphicBuffers(_node, anyPort(), enable);
+    _omx->getGraphicBufferUsage(_node, anyPort(), &word);
+    _omx->useBuffer(_node, anyPort(), nullptr, nullptr);
+    _omx->getExtensionIndex(_node, _data.ConsumeRandomLengthString(64).c_str(), &index);
   }
 
   const sp<IOMX> _omx;
   const omxhost::Device& _device;
   FuzzedDataProvider& _data;
   sp<Observer> _observer;
+  uint64_t _seen = 0;
   IOMX::node_id _node = nullptr;
   std::array<std::vector<Given>, kPortCount + 1> _buffers;  // the last: of a port that is not there
 };
