@@ -3,7 +3,10 @@
 
 #include <gtest/gtest.h>
 
+#include <map>
 #include <numeric>
+#include <optional>
+#include <sstream>
 #include <string>
 
 #include "host/mediaserver/components/annex_b.h"
@@ -57,31 +60,63 @@ std::string pps(uint32_t id = 0) {
 }
 
 struct Slice {
-  uint32_t first = 0;
-  uint32_t frame = 0;
-  uint32_t order = 0;
-  uint32_t pps = 0;
-  bool idr = false;
-  uint32_t idrId = 0;
+  uint32_t frame = 0, order = 0, pps = 0;
+  std::optional<uint32_t> idr{};  // its id
   bool reference = true;
-  int field = -1;  // 0 top, 1 bottom; only with interlaced parameters
+  std::optional<uint32_t> field{};  // 0 top, 1 bottom; only with interlaced parameters
+  bool interlaced = field.has_value();
 };
 
-std::string slice(const Slice& fields, bool interlaced = false) {
+std::string slice(const Slice& fields, uint32_t first) {
   Fields bits;
-  bits.ue(fields.first).ue(7).ue(fields.pps).u(6, fields.frame);
-  if (interlaced) bits.u(1, fields.field >= 0 ? 1 : 0);
-  if (fields.field >= 0) bits.u(1, fields.field == 1 ? 1 : 0);
-  if (fields.idr) bits.ue(fields.idrId);
+  bits.ue(first).ue(7).ue(fields.pps).u(6, fields.frame);
+  if (fields.interlaced) bits.u(1, fields.field ? 1 : 0);
+  if (fields.field) bits.u(1, *fields.field);
+  if (fields.idr) bits.ue(*fields.idr);
   bits.u(8, fields.order).u(16, 0xFFFF);
   return bits.nal(fields.idr ? 0x65 : fields.reference ? 0x61 : 0x01);
 }
 
-const std::string kDelimiter = "\x09\xF0";
-const std::string kSei = std::string("\x06\x05\x01\x80", 4);
-const std::string kPrefix = "\x6E\x80\x80";
+const std::map<char, std::string> kOthers = {{'S', sps()},
+                                             {'H', sps(false, kHigh)},
+                                             {'F', sps(true)},
+                                             {'P', pps()},
+                                             {'Q', pps(1)},
+                                             {'D', "\x09\xF0"},
+                                             {'M', std::string("\x06\x05\x01\x80", 4)},
+                                             {'X', "\x6E\x80\x80"},
+                                             {'E', "\x0A"}};
+const std::map<char, Slice> kSlices = {{'i', {.idr = 0}},
+                                       {'j', {.idr = 1}},
+                                       {'k', {.pps = 1, .idr = 0}},
+                                       {'a', {.frame = 1}},
+                                       {'b', {.frame = 2, .order = 4}},
+                                       {'m', {.order = 2, .reference = false}},
+                                       {'n', {.order = 4, .reference = false}},
+                                       {'z', {}},
+                                       {'t', {.idr = 0, .field = 0}},
+                                       {'u', {.order = 1, .field = 1}},
+                                       {'w', {.frame = 1, .order = 2, .interlaced = true}}};
 
-using Units = std::vector<std::vector<std::string>>;
+// The units of a stream, with start codes of either length in turn. A letter stands for each NAL unit: small
+// ones for slices, with the first macroblock behind them; S, H and F sequence parameters, P and Q picture
+// parameters, D a delimiter, M a message, X a prefix, E the end of a sequence. Bars lie between units.
+std::vector<std::string> units(const std::string& text) {
+  std::vector<std::string> result(1);
+  std::istringstream words(text);
+  int number = 0;
+  for (std::string word; words >> word;) {
+    if (word == "|") {
+      result.emplace_back();
+      continue;
+    }
+    const auto first = static_cast<uint32_t>(std::atoi(word.c_str() + 1));
+    const std::string nal =
+        kOthers.contains(word[0]) ? kOthers.at(word[0]) : slice(kSlices.at(word[0]), first);
+    result.back() += std::string(number++ % 3 == 1 ? 2 : 3, '\0') + '\1' + nal;
+  }
+  return result;
+}
 
 struct Cut {
   std::vector<std::string> units{};
@@ -103,84 +138,43 @@ Cut cut(const std::string& stream) {
   return result;
 }
 
-// The stream with start codes of either length, in turn.
-std::vector<std::string> withStartCodes(const Units& units) {
-  std::vector<std::string> result;
-  int number = 0;
-  for (const auto& unit : units) {
-    result.emplace_back();
-    for (const std::string& nal : unit)
-      result.back() += std::string(number++ % 3 == 1 ? 2 : 3, '\0') + '\1' + nal;
-  }
-  return result;
-}
-
 std::string joined(const std::vector<std::string>& parts) {
   return std::accumulate(parts.begin(), parts.end(), std::string());
 }
 
 TEST(AccessUnits, EndWhereThePictureEnds) {
-  const std::string idr = slice({.idr = true});
-  const struct {
-    const char* name;
-    Units units;
-  } cases[] = {
-      {"slices in any order",
-       {{sps(), pps(), slice({.first = 40, .idr = true}), idr},
-        {slice({.first = 9, .frame = 1}), slice({.first = 0, .frame = 1})},
-        {slice({.frame = 2})}}},
-      {"a lost first slice", {{sps(), pps(), idr}, {slice({.first = 30, .frame = 1, .order = 2})}}},
-      {"redundant slices", {{sps(), pps(), idr, idr, idr}, {slice({.frame = 1})}}},
-      {"key frames side by side", {{sps(), pps(), idr}, {slice({.idr = true, .idrId = 1})}, {idr}}},
-      {"no references",
-       {{sps(), pps(), idr},
-        {slice({.order = 2, .reference = false})},
-        {slice({.order = 4, .reference = false})}}},
-      {"parameter sets again",
-       {{sps(), pps(), idr}, {sps(), pps(), slice({.idr = true, .idrId = 1})}, {sps(), idr}}},
-      {"other picture parameters", {{sps(), pps(), pps(1), idr}, {slice({.pps = 1, .idr = true})}}},
-      {"delimiters and messages",
-       {{kDelimiter, sps(), pps(), kSei, idr},
-        {kDelimiter, slice({.frame = 1})},
-        {kSei, slice({.frame = 2})},
-        {kDelimiter, kSei, slice({.frame = 3})}}},
-      {"prefixes before each slice",
-       {{sps(), pps(), kPrefix, idr, kPrefix, slice({.first = 9, .idr = true})},
-        {kPrefix, slice({.frame = 1})},
-        {kPrefix, kSei, slice({.frame = 2})}}},
-      {"end of sequence", {{sps(), pps(), idr, "\x0A"}, {sps(), pps(), idr}}},
-      {"a scaling list",
-       {{sps(false, kHigh), pps(), idr}, {slice({.frame = 1}), slice({.first = 5, .frame = 1})}}},
+  const std::pair<const char*, const char*> cases[] = {
+      {"slices in any order", "S P i40 i | a9 a | b"},
+      {"a lost first slice", "S P i | b30"},
+      {"redundant slices", "S P i i i | a"},
+      {"key frames side by side", "S P i | j | i"},
+      {"no references", "S P i | m | n"},
+      {"parameter sets again", "S P i | S P j | S i"},
+      {"other picture parameters", "S P Q i | k"},
+      {"delimiters and messages", "D S P M i | D a | M b | D M a"},
+      {"prefixes before each slice", "S P X i X i9 | X a | X M b"},
+      {"end of sequence", "S P i E | S P i"},
+      {"a scaling list", "H P i | a a5"},
+      {"fields", "F P t | u | w"},
   };
-  for (const auto& each : cases) {
-    const std::vector<std::string> expected = withStartCodes(each.units);
+  for (const auto& [name, stream] : cases) {
+    const std::vector<std::string> expected = units(stream);
     const Cut result = cut(joined(expected));
-    EXPECT_EQ(result.units, expected) << each.name;
-    EXPECT_EQ(result.failure, "") << each.name;
-    EXPECT_EQ(result.rate, (FrameRate{25, 1})) << each.name;
+    EXPECT_EQ(result.units, expected) << name;
+    EXPECT_EQ(result.failure, "") << name;
+    EXPECT_EQ(result.rate, (FrameRate{25, 1})) << name;
   }
+  // Without parameters the first macroblock tells.
+  EXPECT_EQ(cut(joined(units("i i7 | z | z"))).units, units("i i7 | z | z"));
+  EXPECT_EQ(cut(joined(units("i i7 | z | z"))).rate, std::nullopt);
 }
 
-TEST(AccessUnits, EndWithEachFieldAndGoByTheFirstMacroblockWithoutParameters) {
-  const auto fields = withStartCodes({{sps(true), pps(), slice({.idr = true, .field = 0}, true)},
-                                      {slice({.frame = 0, .order = 1, .field = 1}, true)},
-                                      {slice({.frame = 1, .order = 2}, true)}});
-  EXPECT_EQ(cut(joined(fields)).units, fields);
-  const std::string idr = slice({.idr = true});
-  const auto expected =
-      withStartCodes({{idr, slice({.first = 7, .idr = true})}, {slice({.frame = 0})}, {slice({})}});
-  EXPECT_EQ(cut(joined(expected)).units, expected);
-  EXPECT_EQ(cut(joined(expected)).rate, std::nullopt);
-}
-
-TEST(AccessUnits, SurviveStreamsThatAreDamagedOrNone) {
-  const auto units = withStartCodes({{sps(), pps(), slice({.idr = true})}, {slice({.frame = 1})}});
-  const std::string good = joined(units);
-  EXPECT_EQ(cut("garbage" + good).units, units);
+TEST(AccessUnits, AreFoundBehindGarbageAndMissedWhereThereAreNone) {
+  const std::string good = joined(units("S P i | a"));
+  EXPECT_EQ(cut("garbage" + good).units, units("S P i | a"));
   EXPECT_EQ(cut(std::string(100000, '\0') + good).units.size(), 2U);
-  for (const std::string& none : {std::string(), std::string("\0\0\1", 3), std::string(100, '\0'),
-                                  std::string(200000, 'x'), "\0\0\1" + sps() + std::string("\0\0\1\x68", 4),
-                                  joined(withStartCodes({{sps(), pps(), kSei, kDelimiter}}))}) {
+  for (const std::string& none :
+       {std::string(), std::string(200000, 'x'), std::string(100, '\0'), joined(units("S P M D"))}) {
     const Cut result = cut(none);
     EXPECT_TRUE(result.units.empty());
     EXPECT_NE(result.failure.find("Annex B"), std::string::npos) << result.failure;
@@ -190,10 +184,10 @@ TEST(AccessUnits, SurviveStreamsThatAreDamagedOrNone) {
 TEST(AccessUnits, AreReadOverTheEdgesOfTheBuffer) {
   constexpr size_t kChunk = 65536;
   // Each start code lies a byte further to the front of an edge than the one before.
-  std::vector<std::string> expected = withStartCodes({{sps(), pps(), slice({.idr = true})}});
+  std::vector<std::string> expected = units("S P i");
   expected[0].resize(kChunk + 4, 'x');
   for (uint32_t i = 1; i < 12; ++i) {
-    expected.push_back(std::string("\0\0\1", 3) + slice({.frame = i}));
+    expected.push_back(std::string("\0\0\1", 3) + slice({.frame = i}, 0));
     expected.back().resize(kChunk - 1, 'y');
   }
   EXPECT_EQ(cut(joined(expected)).units, expected);

@@ -28,10 +28,9 @@ TEST(CommandLine, TellsOfItselfAndOfTheDevices) {
     EXPECT_EQ(run.err, "");
     EXPECT_TRUE(contains(run.out, each.part)) << run.out;
   }
-  const auto devices = report({"devices", "-d", "omap4"})["devices"];
-  for (const auto& device : devices) {
-    EXPECT_EQ(device["chosen"], device["name"] == "omap4");
-    EXPECT_TRUE(!device["chosen"] || device["decoder"] == "OMX.TI.DUCATI1.VIDEO.DECODER==");
+  for (const auto& device : report({"devices", "-d", "omap4"})["devices"]) {
+    const bool isOmap4 = device["decoder"] == "OMX.TI.DUCATI1.VIDEO.DECODER==";
+    EXPECT_TRUE(device["chosen"] == isOmap4 && isOmap4 == (device["name"] == "omap4")) << device;
   }
   EXPECT_EQ(report({"components", "-d", "omap4"})["device"], "omap4");
   const Ended noServer =
@@ -56,12 +55,9 @@ TEST(CommandLine, NamesWhatItDoesNotUnderstandOrFindsWrong) {
       {{"call", "--loud"}, kUsage, "--loud"},
       {{"call", "a", "b"}, kUsage, "b"},
       {{"call", "--size", "640"}, kUsage, "\"640\" is not a size as 640x480"},
-      {{"call", "--size", "641x480"}, kUsage, "641x480 is an odd size"},
       {{"call", "--fps", "0"}, kUsage, "\"0\" is not a rate"},
       {{"call", "--bitrate", "1G"}, kUsage, "\"1G\" is not a rate from 1k to 1000M"},
-      {{"call", "--profile", "extended"}, kUsage, "is not baseline, main or high"},
       {{"call", "--frames", "99999999999999999999"}, kUsage, "is not a number from 1 on"},
-      {{"call", "--refs", "17"}, kUsage, "is not a number from 1 to 16"},
       {{"call", "--device", "nokia"}, kUsage, "no device \"nokia\"; there are msm7x30, "},
       {{"call", "-o", "-", "--stream", "-"}, kUsage, "cannot both go to -"},
       {{"call", "-o", "-", "--json"}, kUsage, "--json needs standard output for itself"},
@@ -70,18 +66,15 @@ TEST(CommandLine, NamesWhatItDoesNotUnderstandOrFindsWrong) {
       {{"call", "--loss", "101%"}, kUsage, "is not a share of packets"},
       {{"call", "--delay", "11s"}, kUsage, "is not a time up to 10s"},
       {{"decode"}, kUsage, "INPUT is required"},
-      {{"call", directory.file("missing")}, kInput, "missing"},
       {{"call", text}, kInput, "notes.txt"},
       {{"call", empty}, kInput, "empty"},
       {{"call", "-"}, kInput, "standard input"},
       {{"call", directory.file("")}, kInput, directory.file("")},
-      {{"call", "-o", directory.file("no/a.y4m")}, kOutput, "no/a.y4m"},
       {{"call", "-o", "/dev/full"}, kOutput, "/dev/full"},
       {{"call", "--at", "1s", "fps=60"}, kUsage, "fps=60 is more than the input has"},
       {{"call", "-d", "exynos4"}, kDevice, "exynos4"},
       {{"call", "-s", "8192x16", "-n", "1"}, kDevice, "8192x16"},
       {{"convert", small, "--cut", "96x96"}, kUsage, "is larger than the picture, which is 64x48"},
-      {{"convert", small, "--pad", "32x96"}, kUsage, "--pad 32x96 is smaller"},
       {{"convert", small, "--scale", "33x32"}, kUsage, "\"33x32\" is not an even size"},
       {{"convert", small, "--rotate", "45"}, kUsage, "\"45\" is not 0, 90, 180 or 270"},
       {{"compare", small, large}, kInput, "the pictures differ in size, 64x48 and 96x64"},
