@@ -73,32 +73,32 @@ TEST_F(Commands, FlushAndIdleReturnWhatThePortsHoldBeforeTheyComplete) {
   const struct {
     OMX_COMMANDTYPE command;
     OMX_U32 param;
-    bool paused;
-    const char* heard;
+    Words heard;
   } cases[] = {
-      {OMX_CommandFlush, kInputPort, false, " emptied emptied complete flush 0"},
-      {OMX_CommandFlush, kOutputPort, false, " filled filled complete flush 1"},
-      {OMX_CommandFlush, OMX_ALL, false, " emptied emptied complete flush 0 filled filled complete flush 1"},
-      {OMX_CommandStateSet, OMX_StateIdle, true, " emptied emptied filled filled complete state 2"},
+      {OMX_CommandFlush, kInputPort, {"emptied", "emptied", "complete flush 0"}},
+      {OMX_CommandFlush, kOutputPort, {"filled", "filled", "complete flush 1"}},
+      {OMX_CommandFlush,
+       OMX_ALL,
+       {"emptied", "emptied", "complete flush 0", "filled", "filled", "complete flush 1"}},
+      {OMX_CommandStateSet, OMX_StateIdle, {"emptied", "emptied", "filled", "filled", "complete state 2"}},
   };
+  decoder.holdInput();
   for (const auto& test : cases) {
-    SCOPED_TRACE(test.heard);
-    decoder.holdInput();
+    SCOPED_TRACE(::testing::PrintToString(test.heard));
+    const bool paused = test.command == OMX_CommandStateSet;
     const auto node = running();
-    if (test.paused) node->complete(OMX_CommandStateSet, OMX_StatePause);
+    if (paused) node->complete(OMX_CommandStateSet, OMX_StatePause);
     node->messages().clear();
     node->empty(0, "a");
     node->empty(1, "b");
     EXPECT_EQ(node->command(test.command, test.param), android::OK);
     node->expect(commandComplete(test.command), test.param == OMX_ALL ? 2 : 1);
-    std::string heard;
-    for (const std::string& each : node->heard()) heard += " " + each;
-    EXPECT_EQ(heard, test.heard);
+    EXPECT_EQ(node->heard(), test.heard);
     for (const Packet& output : node->outputs()) EXPECT_TRUE(output.bytes.empty());
     // What came back can be sent again.
-    if (test.paused) node->complete(OMX_CommandStateSet, OMX_StateExecuting);
-    EXPECT_EQ(node->empty(0, "c"), okIf(test.paused || test.param != kOutputPort));
-    EXPECT_EQ(node->fill(0), okIf(test.paused || test.param != kInputPort));
+    if (paused) node->complete(OMX_CommandStateSet, OMX_StateExecuting);
+    EXPECT_EQ(node->empty(0, "c"), okIf(paused || test.param != kOutputPort));
+    EXPECT_EQ(node->fill(0), okIf(paused || test.param != kInputPort));
     EXPECT_TRUE(decoder.inputs().empty());
   }
 }

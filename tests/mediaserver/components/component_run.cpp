@@ -99,17 +99,6 @@ void ComponentRun::await(const std::function<bool()>& condition) {
   }
 }
 
-void ComponentRun::reopenInput(const std::function<void()>& change) {
-  await([this] { return std::find(_inputFree.begin(), _inputFree.end(), false) == _inputFree.end(); });
-  EXPECT_EQ(command(OMX_CommandPortDisable, kInputPort), kOk);
-  freeBuffers(kInputPort);
-  expectComplete(OMX_CommandPortDisable, kInputPort);
-  change();
-  EXPECT_EQ(command(OMX_CommandPortEnable, kInputPort), kOk);
-  populate(kInputPort);
-  expectComplete(OMX_CommandPortEnable, kInputPort);
-}
-
 void ComponentRun::send(const std::vector<uint8_t>& bytes, int64_t timestamp, OMX_U32 flags) {
   const auto free = [this] { return std::find(_inputFree.begin(), _inputFree.end(), true); };
   await([&] { return free() != _inputFree.end(); });

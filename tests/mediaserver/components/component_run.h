@@ -29,7 +29,6 @@ using omxtest::kOk;
 using omxtest::kUnknownError;
 using omxtest::kUnsupported;
 using omxtest::makeRecord;
-using Options = std::map<std::string, std::string>;
 using Errors = std::vector<std::string>;
 using NalTypes = std::vector<unsigned>;
 
@@ -59,8 +58,6 @@ class ComponentRun : public omxtest::OmxClient {
   void send(const std::vector<uint8_t>& bytes, int64_t timestamp, OMX_U32 flags = OMX_BUFFERFLAG_ENDOFFRAME);
   // Sends the end mark and waits until it comes out.
   void finish();
-  // Disables the input port, changes something, and enables it again with new buffers.
-  void reopenInput(const std::function<void()>& change);
   // Lets the component work until `count` outputs have come.
   void awaitOutputs(size_t count) {
     await([&] { return outputs.size() >= count; });
@@ -127,16 +124,11 @@ class EncoderRun : public ComponentRun {
   explicit EncoderRun(const char* device)
       : ComponentRun(*omxhost::findDevice(device), omxhost::findDevice(device)->encoderComponent,
                      omxtest::Giving::Use) {}
+  // Both ports have that size, as wrappers do it.
   EncoderRun(const char* device, uint32_t width, uint32_t height, uint32_t framesPerSecond = 25)
       : EncoderRun(device) {
-    setSize(width, height, framesPerSecond);
-  }
-
-  // Both ports, as wrappers do it.
-  void setSize(uint32_t width, uint32_t height, uint32_t framesPerSecond = 25) {
-    for (const OMX_U32 port : {kInputPort, kOutputPort}) {
+    for (const OMX_U32 port : {kInputPort, kOutputPort})
       EXPECT_EQ(resize(port, width, height, framesPerSecond), kOk);
-    }
   }
   void setBitRate(uint32_t bitsPerSecond) {
     auto record = makeRecord<OMX_VIDEO_PARAM_BITRATETYPE>(kOutputPort);
@@ -144,16 +136,16 @@ class EncoderRun : public ComponentRun {
     record.nTargetBitrate = bitsPerSecond;
     EXPECT_EQ(set(OMX_IndexParamVideoBitrate, record), kOk);
   }
-  // Changes the AVC record as it is.
-  android::status_t setAvc(const std::function<void(OMX_VIDEO_PARAM_AVCTYPE&)>& change) {
-    OMX_VIDEO_PARAM_AVCTYPE record = avc();
-    change(record);
-    return set(OMX_IndexParamVideoAvc, record);
-  }
   OMX_VIDEO_PARAM_AVCTYPE avc() {
     auto record = makeRecord<OMX_VIDEO_PARAM_AVCTYPE>(kOutputPort);
     EXPECT_EQ(get(OMX_IndexParamVideoAvc, &record), kOk);
     return record;
+  }
+  // Changes the record as it is.
+  android::status_t setAvc(const std::function<void(OMX_VIDEO_PARAM_AVCTYPE&)>& change) {
+    OMX_VIDEO_PARAM_AVCTYPE record = avc();
+    change(record);
+    return set(OMX_IndexParamVideoAvc, record);
   }
 
   // Configurations, on the port that wrappers use.
@@ -183,12 +175,6 @@ class EncoderRun : public ComponentRun {
     return found;
   }
   std::vector<Unit> units() const { return {outputs.begin(), outputs.end()}; }
-  // Of `count` outputs from `first` on.
-  double bits(size_t first, size_t count) const {
-    size_t bytes = 0;
-    for (size_t i = first; i < first + count; ++i) bytes += outputs.at(i).bytes.size();
-    return static_cast<double>(bytes) * 8;
-  }
 
  private:
   uint32_t _next = 0;

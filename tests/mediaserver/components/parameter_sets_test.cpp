@@ -20,25 +20,19 @@ TEST(SequenceSet, IsReadAsTheEncoderWroteIt) {
   const char* const kEverything =
       "nal-hrd=vbr:vbv-maxrate=200:vbv-bufsize=100:cqm=jvt:overscan=show:colorprim=bt709:chromaloc=1:sar=40/"
       "33";
-  struct {
-    Options options;
-    int profile;
-    uint32_t references;
-    uint32_t reorder;
-  } const cases[] = {
-      {{{"profile", "main"}, {"bf", "1"}, {"refs", "2"}}, 77, 2, 1},
-      {{{"bf", "3"}, {"b-pyramid", "normal"}, {"refs", "4"}}, 100, 4, 2},
-      {{{"bf", "0"}, {"b", "100000"}, {"x264-params", kEverything}}, 100, 3, 0},
-  };
-  for (const auto& each : cases) {
-    const std::vector<Unit> units = encode({"libx264", each.options}, scenes(98, 54, 2));
+  // Profile, reference frames and reordering.
+  const std::tuple<std::string, int, uint32_t, uint32_t> cases[] = {
+      {"profile=main bf=1 refs=2", 77, 2, 1},
+      {"bf=3 b-pyramid=normal refs=4", 100, 4, 2},
+      {std::string("bf=0 b=100000 x264-params=") + kEverything, 100, 3, 0}};
+  for (const auto& [options, profile, references, reorder] : cases) {
+    const std::vector<Unit> units = encode("libx264", options, scenes(98, 54, 2));
     const std::vector<uint8_t> nal = nals(units.front().bytes).at(0);
     const auto set = readSequenceSet(nal);
     ASSERT_TRUE(set);
-    EXPECT_EQ(set->profileIdc, each.profile);
-    EXPECT_EQ(set->referenceFrames, each.references);
-    EXPECT_EQ(set->reorderFrames, std::optional(each.reorder));
-    EXPECT_EQ(set->macroblocks, 28U);
+    EXPECT_TRUE(set->profileIdc == profile && set->macroblocks == 28U) << profile;
+    EXPECT_EQ(set->referenceFrames, references);
+    EXPECT_EQ(set->reorderFrames, std::optional(reorder));
     // A higher profile is declared, and everything else stays.
     std::vector<uint8_t> raised;
     appendSequenceSet(nal, kProfileHigh, &raised);
@@ -46,14 +40,12 @@ TEST(SequenceSet, IsReadAsTheEncoderWroteIt) {
     EXPECT_EQ(std::exchange(again.profileIdc, set->profileIdc), kProfileHigh);
     EXPECT_EQ(again, *set);
     // Whatever is cut off or flipped is read to some end.
-    for (size_t size = 0; size < nal.size(); ++size) {
-      static_cast<void>(readSequenceSet(Bytes(nal).first(size)));
+    for (size_t bit = 0; bit < nal.size() * 8; ++bit) {
+      static_cast<void>(readSequenceSet(Bytes(nal).first(bit / 8)));
       std::vector<uint8_t> damaged = nal;
-      for (int bit = 0; bit < 8; ++bit) {
-        damaged[size] = static_cast<uint8_t>(damaged[size] ^ 1 << bit);
-        const auto read = readSequenceSet(damaged);
-        EXPECT_TRUE(!read || reorderDepth(*read) <= 16);
-      }
+      damaged[bit / 8] = static_cast<uint8_t>(damaged[bit / 8] ^ 1 << bit % 8);
+      const auto read = readSequenceSet(damaged);
+      EXPECT_TRUE(!read || reorderDepth(*read) <= 16);
     }
   }
 }

@@ -46,23 +46,16 @@ uint8_t* Picture::plane(int index) {
 
 Picture scene(uint32_t width, uint32_t height, uint32_t number) {
   Picture picture(width, height);
-  uint8_t* luma = picture.plane(0);
-  const uint32_t ballX = number * 5 % width;
-  const uint32_t ballY = number * 3 % height;
-  for (uint32_t y = 0; y < height; ++y) {
-    for (uint32_t x = 0; x < width; ++x) {
-      const bool ball = x - ballX < 24 && y - ballY < 24;
-      *luma++ = ball ? texture(x - ballX + 500, y - ballY + 900) : texture(x + 2 * number, y + number);
-    }
+  const uint32_t ballX = number * 5 % width, ballY = number * 3 % height;
+  for (uint32_t i = 0; i < width * height; ++i) {
+    const uint32_t x = i % width, y = i / width;
+    const bool ball = x - ballX < 24 && y - ballY < 24;
+    picture.bytes[i] = ball ? texture(x - ballX + 500, y - ballY + 900) : texture(x + 2 * number, y + number);
   }
-  for (int plane = 1; plane < 3; ++plane) {
-    uint8_t* chroma = picture.plane(plane);
-    for (uint32_t y = 0; y < picture.chromaHeight(); ++y) {
-      for (uint32_t x = 0; x < picture.chromaWidth(); ++x) {
-        *chroma++ =
-            static_cast<uint8_t>(60 + (x + number) * 3 % 100 + static_cast<uint32_t>(plane) * 20 + y % 30);
-      }
-    }
+  const uint32_t columns = picture.chromaWidth(), samples = columns * picture.chromaHeight();
+  for (uint32_t i = 0; i < 2 * samples; ++i) {
+    const uint32_t x = i % columns, y = i % samples / columns, plane = i / samples;
+    picture.plane(1)[i] = static_cast<uint8_t>(80 + (x + number) * 3 % 100 + plane * 20 + y % 30);
   }
   return picture;
 }

@@ -6,8 +6,8 @@
 #include <cstring>
 
 extern "C" {
+#include <libavutil/dict.h>
 #include <libavutil/imgutils.h>
-#include <libavutil/opt.h>
 }
 
 #include "host/mediaserver/components/av.h"
@@ -19,14 +19,6 @@ using mediaserver::AvFrame;
 using mediaserver::AvPacket;
 
 namespace {
-
-void copyIn(const Picture& picture, AVFrame* frame) {
-  const uint8_t* planes[4] = {picture.plane(0), picture.plane(1), picture.plane(2), nullptr};
-  const int pitches[4] = {static_cast<int>(picture.width), static_cast<int>(picture.chromaWidth()),
-                          static_cast<int>(picture.chromaWidth()), 0};
-  av_image_copy(frame->data, frame->linesize, planes, pitches, AV_PIX_FMT_YUV420P, frame->width,
-                frame->height);
-}
 
 Picture copyOut(const AVFrame& frame) {
   Picture picture(static_cast<uint32_t>(frame.width), static_cast<uint32_t>(frame.height));
@@ -44,34 +36,34 @@ std::vector<Picture> scenes(uint32_t width, uint32_t height, uint32_t count) {
   return pictures;
 }
 
-std::vector<Unit> encode(const StreamOptions& options, const std::vector<Picture>& pictures) {
-  const AvContext context = mediaserver::makeContext(avcodec_find_encoder_by_name(options.encoder.c_str()));
-  if (context == nullptr) {
-    ADD_FAILURE() << "no encoder " << options.encoder;
-    return {};
-  }
+std::vector<Unit> encode(const std::string& encoder, const std::string& options,
+                         const std::vector<Picture>& pictures) {
+  const AvContext context = mediaserver::makeContext(avcodec_find_encoder_by_name(encoder.c_str()));
   context->width = static_cast<int>(pictures.front().width);
   context->height = static_cast<int>(pictures.front().height);
   context->pix_fmt = AV_PIX_FMT_YUV420P;
   context->time_base = {1, 25};
   context->gop_size = 30;
-  if (options.interlaced) context->flags |= AV_CODEC_FLAG_INTERLACED_DCT | AV_CODEC_FLAG_INTERLACED_ME;
-  for (const auto& [name, value] : options.options) {
-    EXPECT_GE(av_opt_set(context.get(), name.c_str(), value.c_str(), AV_OPT_SEARCH_CHILDREN), 0) << name;
-  }
-  EXPECT_GE(avcodec_open2(context.get(), nullptr, nullptr), 0) << options.encoder;
+  AVDictionary* wanted = nullptr;
+  EXPECT_GE(av_dict_parse_string(&wanted, options.c_str(), "=", " ", 0), 0);
+  EXPECT_GE(avcodec_open2(context.get(), nullptr, &wanted), 0) << encoder;
+  EXPECT_EQ(wanted, nullptr) << "not understood";
   const AvFrame frame(av_frame_alloc());
   const AvPacket packet(av_packet_alloc());
   frame->format = context->pix_fmt;
   frame->width = context->width;
   frame->height = context->height;
-  frame->interlaced_frame = frame->top_field_first = options.interlaced ? 1 : 0;
   EXPECT_GE(av_frame_get_buffer(frame.get(), 0), 0);
   std::vector<Unit> units;
   for (size_t i = 0; i <= pictures.size(); ++i) {
     if (i < pictures.size()) {
       EXPECT_GE(av_frame_make_writable(frame.get()), 0);
-      copyIn(pictures[i], frame.get());
+      const Picture& from = pictures[i];
+      const uint8_t* planes[4] = {from.plane(0), from.plane(1), from.plane(2), nullptr};
+      const int chroma = static_cast<int>(from.chromaWidth());
+      const int pitches[4] = {frame->width, chroma, chroma, 0};
+      av_image_copy(frame->data, frame->linesize, planes, pitches, AV_PIX_FMT_YUV420P, frame->width,
+                    frame->height);
       frame->pts = static_cast<int64_t>(i);
     }
     EXPECT_GE(avcodec_send_frame(context.get(), i < pictures.size() ? frame.get() : nullptr), 0);
@@ -116,12 +108,12 @@ std::vector<Decoded> decode(const std::string& decoder, const std::vector<Unit>&
   return pictures;
 }
 
-std::vector<Decoded> inDecodingOrder(std::vector<Decoded> pictures, const std::vector<Unit>& units) {
+std::vector<Decoded> inDecodingOrder(const std::vector<Decoded>& pictures, const std::vector<Unit>& units) {
   std::vector<Decoded> sorted;
   for (const Unit& unit : units) {
-    const auto found = std::find_if(pictures.begin(), pictures.end(),
-                                    [&](const Decoded& each) { return each.timestamp == unit.timestamp; });
-    if (found != pictures.end()) sorted.push_back(*found);
+    for (const Decoded& each : pictures) {
+      if (each.timestamp == unit.timestamp) sorted.push_back(each);
+    }
   }
   return sorted;
 }

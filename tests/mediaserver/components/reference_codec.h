@@ -2,7 +2,6 @@
 // libavcodec used directly, for streams to decode and for the pictures that they hold. One thread.
 
 #include <cstdint>
-#include <map>
 #include <string>
 #include <vector>
 
@@ -21,14 +20,10 @@ struct Decoded {
   int64_t timestamp = 0;
 };
 
-struct StreamOptions {
-  std::string encoder = "libx264";
-  std::map<std::string, std::string> options{};  // libavcodec's and the encoder's own
-  bool interlaced = false;
-};
-
-// Units in order of decoding. A failure is the test's.
-std::vector<Unit> encode(const StreamOptions& options, const std::vector<Picture>& pictures);
+// Units in order of decoding. `options`: libavcodec's and the encoder's own, "name=value name=value". A
+// failure is the test's.
+std::vector<Unit> encode(const std::string& encoder, const std::string& options,
+                         const std::vector<Picture>& pictures);
 std::vector<Picture> scenes(uint32_t width, uint32_t height, uint32_t count);
 
 // What libavcodec makes of the units, in display order, exactly cropped. `decoder`: "h264", "mpeg4", ...;
@@ -38,7 +33,7 @@ std::vector<Decoded> decode(const std::string& decoder, const std::vector<Unit>&
                             uint32_t height = 0);
 
 // The same in order of decoding: every unit makes one picture.
-std::vector<Decoded> inDecodingOrder(std::vector<Decoded> pictures, const std::vector<Unit>& units);
+std::vector<Decoded> inDecodingOrder(const std::vector<Decoded>& pictures, const std::vector<Unit>& units);
 
 // All units in one.
 std::vector<uint8_t> joined(const std::vector<Unit>& units);

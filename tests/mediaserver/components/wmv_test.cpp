@@ -8,8 +8,7 @@ namespace {
 
 using Bytes = std::vector<uint8_t>;
 
-constexpr uint8_t kWidth = 48;
-constexpr uint8_t kHeight = 32;
+constexpr uint8_t kWidth = 48, kHeight = 32;
 
 // The header's bits, and many more.
 Bytes picture(Bytes bytes, uint32_t seed) {
@@ -63,8 +62,9 @@ TEST(Wmv, TellsByItsHeadersHowItIsDecodedAndSurvivesThemCut) {
   ASSERT_EQ(two.size(), 2U);
   expectDecoded(advanced, two);
   for (size_t size = 1; size < 36; size += 3) {
-    const std::vector<uint8_t> header = fileHeader();
-    expectDecoded({{{header.begin(), header.begin() + static_cast<ptrdiff_t>(size)}, 0}}, {});
+    Bytes header = fileHeader();
+    header.resize(size);
+    expectDecoded({{header, 0}}, {});
   }
 }
 
