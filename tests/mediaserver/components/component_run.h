@@ -5,6 +5,7 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cstdint>
 #include <functional>
 #include <string>
@@ -13,10 +14,11 @@
 
 #include <omxhost/device.h>
 
-#include "host/mediaserver/components/sequence_set.h"
+#include "host/mediaserver/components/annex_b.h"
+#include "host/mediaserver/components/component_list.h"
 #include "host/mediaserver/components/vendor_records.h"
 #include "host/mediaserver/omx_server.h"
-#include "tests/mediaserver/components/reference_codec.h"
+#include "tests/mediaserver/components/reference.h"
 #include "tests/support/omx_client.h"
 
 namespace componenttest {
@@ -24,13 +26,11 @@ namespace componenttest {
 using mediaserver::kInputPort;
 using mediaserver::kOutputPort;
 using mediaserver::QcomOrder;
-using mediaserver::QcomPacking;
+using omxtest::Giving;
 using omxtest::kOk;
-using omxtest::kUnknownError;
 using omxtest::kUnsupported;
 using omxtest::makeRecord;
 using Errors = std::vector<std::string>;
-using NalTypes = std::vector<unsigned>;
 
 // Those that have components.
 constexpr const char* kDevices[] = {"msm7x30", "msm8x55", "msm8x60", "msm8960", "omap4", "msm-unknown"};
@@ -44,20 +44,42 @@ struct Output : Unit {
 
 class ComponentRun : public omxtest::OmxClient {
  public:
-  ComponentRun(const omxhost::Device& device, const char* component, omxtest::Giving output);
+  ComponentRun(const omxhost::Device& device, const char* component, Giving output)
+      : OmxClient(new mediaserver::OmxServer(mediaserver::componentsOf(device)), component),
+        traits(device.components) {
+    // As our wrappers do.
+    setGiving(kInputPort, isTi() ? Giving::Backup : Giving::Use);
+    setGiving(kOutputPort, isTi() ? Giving::Backup : output);
+  }
 
-  const omxhost::ComponentTraits& traits() const { return _traits; }
-  bool isTi() const { return _traits.vendor == omxhost::Vendor::Ti; }
+  bool isTi() const { return traits.vendor == omxhost::Vendor::Ti; }
 
   // Defines a port's pictures; rate 0: as it is.
-  android::status_t resize(OMX_U32 port, uint32_t width, uint32_t height, uint32_t framesPerSecond = 0);
+  android::status_t resize(OMX_U32 port, uint32_t width, uint32_t height, uint32_t framesPerSecond = 0) {
+    auto wanted = definition(port);
+    wanted.format.video.nFrameWidth = width;
+    wanted.format.video.nFrameHeight = height;
+    if (framesPerSecond != 0) wanted.format.video.xFramerate = framesPerSecond << 16;
+    return define(port, wanted);
+  }
 
   // Executing, with all output buffers given.
-  void start();
+  void start() {
+    toExecuting();
+    _handled = 0;
+    _ending = _ended = false;
+    _inputFree.assign(buffers(kInputPort).size(), true);
+    giveOutput();
+  }
   // Waits for a free input buffer.
-  void send(const std::vector<uint8_t>& bytes, int64_t timestamp, OMX_U32 flags = OMX_BUFFERFLAG_ENDOFFRAME);
-  // Sends the end mark and waits until it comes out.
-  void finish();
+  void send(const std::vector<uint8_t>& bytes, int64_t timestamp, OMX_U32 flags = OMX_BUFFERFLAG_ENDOFFRAME) {
+    const auto free = [this] { return std::find(_inputFree.begin(), _inputFree.end(), true); };
+    await([&] { return free() != _inputFree.end(); });
+    const auto index = static_cast<size_t>(free() - _inputFree.begin());
+    _inputFree.at(index) = false;
+    const std::string_view text(reinterpret_cast<const char*>(bytes.data()), bytes.size());
+    EXPECT_EQ(empty(index, text, flags, timestamp), kOk);
+  }
   // Lets the component work until `count` outputs have come.
   void awaitOutputs(size_t count) {
     await([&] { return outputs.size() >= count; });
@@ -65,46 +87,102 @@ class ComponentRun : public omxtest::OmxClient {
   void awaitEnd() {
     await([this] { return _ended; });
   }
+  // Sends the end mark and waits until it comes out.
+  void finish() {
+    send({}, -1, OMX_BUFFERFLAG_EOS);
+    _ending = true;
+    awaitEnd();
+  }
 
+  const omxhost::ComponentTraits& traits;
   std::vector<Output> outputs;  // those with bytes
   Errors errors;
   size_t reconfigurations = 0;
 
  private:
-  void await(const std::function<bool()>& condition);
-  bool handleNext();
-  void onEvent(const android::omx_message& message);
-  void onFilled(const android::omx_message& message);
-  size_t indexOf(OMX_U32 port, android::IOMX::buffer_id id) const;
+  void giveOutput() {
+    fillAll();
+    _outputsOut = buffers(kOutputPort).size();
+  }
 
-  const omxhost::ComponentTraits& _traits;
+  size_t indexOf(OMX_U32 port, BufferId id) const {
+    size_t index = 0;
+    while (buffers(port).at(index).id != id) ++index;
+    return index;
+  }
+
+  void await(const std::function<bool()>& condition) {
+    while (!condition()) {
+      const bool more = messages().waitFor(omxtest::anyMessage(), _handled + 1);
+      ASSERT_TRUE(more) << "nothing more comes after " << ::testing::PrintToString(heard());
+      const android::omx_message message = messages().all()[_handled++];
+      if (message.type == android::omx_message::EVENT) onEvent(message);
+      if (message.type == android::omx_message::FILL_BUFFER_DONE) onFilled(message);
+      if (message.type == android::omx_message::EMPTY_BUFFER_DONE)
+        _inputFree.at(indexOf(kInputPort, message.u.buffer_data.buffer)) = true;
+    }
+  }
+
+  void onFilled(const android::omx_message& message) {
+    const auto& data = message.u.extended_buffer_data;
+    --_outputsOut;
+    if (data.range_length > 0) {
+      const auto whole = makeRecord<OMX_CONFIG_RECTTYPE>(kOutputPort);
+      outputs.push_back(
+          {{output(message).bytes, data.timestamp}, data.flags, definition(kOutputPort), whole});
+      static_cast<void>(getConfig(OMX_IndexConfigCommonOutputCrop, &outputs.back().crop));
+    }
+    if ((data.flags & OMX_BUFFERFLAG_EOS) != 0) _ended = true;
+    if (_reconfiguring) {
+      if (_outputsOut == 0) freeBuffers(kOutputPort);
+    } else if (!_ending) {
+      EXPECT_EQ(fill(indexOf(kOutputPort, data.buffer)), kOk);
+      ++_outputsOut;
+    }
+  }
+
+  void onEvent(const android::omx_message& message) {
+    const std::string what = omxtest::describe(message);
+    if (what.starts_with("error")) errors.push_back(what);
+    if (what == "complete disable 1") {
+      EXPECT_EQ(command(OMX_CommandPortEnable, kOutputPort), kOk);
+      populate(kOutputPort);
+    } else if (what == "complete enable 1") {
+      _reconfiguring = false;
+      giveOutput();
+    } else if (what.starts_with("settings 1")) {
+      const OMX_U32 changed = message.u.event_data.data2;
+      if (changed != 0 && changed != OMX_IndexParamPortDefinition) return;
+      ++reconfigurations;
+      _reconfiguring = true;
+      EXPECT_EQ(command(OMX_CommandPortDisable, kOutputPort), kOk);
+    }
+  }
+
   size_t _handled = 0;  // messages
   std::vector<bool> _inputFree;
   size_t _outputsOut = 0;  // with the component
-  bool _reconfiguring = false;
-  bool _ending = false;
-  bool _ended = false;
+  bool _reconfiguring = false, _ending = false, _ended = false;
 };
 
 class DecoderRun : public ComponentRun {
  public:
   explicit DecoderRun(const char* device)
       : ComponentRun(*omxhost::findDevice(device), omxhost::findDevice(device)->decoderComponent,
-                     omxtest::Giving::Backup) {}
-  DecoderRun(const char* device, QcomOrder order) : DecoderRun(device) { EXPECT_EQ(setOrder(order), kOk); }
+                     Giving::Backup) {}
 
   android::status_t setOrder(QcomOrder order) {
     auto record = makeRecord<mediaserver::QcomPictureOrder>(kInputPort);
     record.eOutputPictureOrder = static_cast<OMX_U32>(order);
     return set(mediaserver::kQcomPictureOrderIndex, record);
   }
-  android::status_t setPacking(QcomPacking packing) {
-    auto record = makeRecord<mediaserver::QcomPortDefinition>(kInputPort);
-    record.nFramePackingFormat = static_cast<OMX_U32>(packing);
-    return set(mediaserver::kQcomPortDefinitionIndex, record);
-  }
   // 0: the size stays.
-  void setInput(OMX_VIDEO_CODINGTYPE coding, uint32_t width = 0, uint32_t height = 0);
+  void setInput(OMX_VIDEO_CODINGTYPE coding, uint32_t width = 0, uint32_t height = 0) {
+    auto wanted = definition(kInputPort);
+    wanted.format.video.eCompressionFormat = coding;
+    EXPECT_EQ(define(kInputPort, wanted), kOk);
+    EXPECT_TRUE(width == 0 || resize(kInputPort, width, height) == kOk);
+  }
   // One buffer a unit.
   void sendAll(const std::vector<Unit>& units) {
     for (const Unit& unit : units) send(unit.bytes, unit.timestamp);
@@ -116,14 +194,23 @@ class DecoderRun : public ComponentRun {
     finish();
   }
   // The outputs.
-  std::vector<Decoded> pictures() const;
+  std::vector<Decoded> pictures() const {
+    std::vector<Decoded> pictures;
+    for (const Output& output : outputs) {
+      const auto& video = output.definition.format.video;
+      pictures.push_back({unpackOutput(output.bytes, traits.decoderOutput, video.nFrameWidth,
+                                       video.nFrameHeight, output.crop),
+                          output.timestamp});
+    }
+    return pictures;
+  }
 };
 
 class EncoderRun : public ComponentRun {
  public:
   explicit EncoderRun(const char* device)
       : ComponentRun(*omxhost::findDevice(device), omxhost::findDevice(device)->encoderComponent,
-                     omxtest::Giving::Use) {}
+                     Giving::Use) {}
   // Both ports have that size, as wrappers do it.
   EncoderRun(const char* device, uint32_t width, uint32_t height, uint32_t framesPerSecond = 25)
       : EncoderRun(device) {
@@ -147,7 +234,6 @@ class EncoderRun : public ComponentRun {
     change(record);
     return set(OMX_IndexParamVideoAvc, record);
   }
-
   // Configurations, on the port that wrappers use.
   template <typename Record, typename Value>
   android::status_t change(OMX_INDEXTYPE index, Value Record::*field, std::type_identity_t<Value> value) {
@@ -155,17 +241,18 @@ class EncoderRun : public ComponentRun {
     record.*field = value;
     return setConfig(index, record);
   }
-  android::status_t rotate(int32_t degrees) {
-    return change(OMX_IndexConfigCommonRotate, &OMX_CONFIG_ROTATIONTYPE::nRotation, degrees);
-  }
 
   // One picture in the device's layout, and its access unit.
-  Output& encode(const Picture& picture);
+  Output& encode(const Picture& picture) {
+    const size_t before = outputs.size();
+    send(packInput(picture, traits.encoderInput), static_cast<int64_t>(before) * 1000);
+    awaitOutputs(before + 1);
+    return outputs.back();
+  }
   // Pictures of the scene from where it was.
   void encodeScene(uint32_t width, uint32_t height, uint32_t count) {
     for (uint32_t i = 0; i < count; ++i) encode(scene(width, height, _next++));
   }
-
   // Where in the outputs the key frames are, by their flags.
   std::vector<size_t> keyFrames() const {
     std::vector<size_t> found;
@@ -181,12 +268,29 @@ class EncoderRun : public ComponentRun {
 };
 
 // Size, bytes and, unless told otherwise, time stamp of every picture.
-void expectSame(const std::vector<Decoded>& got, const std::vector<Decoded>& wanted, bool timed = true);
+inline void expectSame(const std::vector<Decoded>& got, const std::vector<Decoded>& wanted,
+                       bool timed = true) {
+  ASSERT_EQ(got.size(), wanted.size());
+  for (size_t i = 0; i < got.size(); ++i) {
+    EXPECT_TRUE(got[i].picture == wanted[i].picture)
+        << "picture " << i << ": " << got[i].picture.width << "x" << got[i].picture.height << " for "
+        << wanted[i].picture.width << "x" << wanted[i].picture.height;
+    EXPECT_TRUE(!timed || got[i].timestamp == wanted[i].timestamp) << "picture " << i;
+  }
+}
 
 // A stream's NAL units.
-std::vector<std::vector<uint8_t>> nals(const std::vector<uint8_t>& stream);
-NalTypes nalTypes(const std::vector<uint8_t>& unit);
-// The first sequence set in an access unit; a stream without one is the test's failure.
-mediaserver::SequenceSet sequenceSet(const std::vector<uint8_t>& unit);
+inline std::vector<std::vector<uint8_t>> nals(const std::vector<uint8_t>& stream) {
+  std::vector<std::vector<uint8_t>> found;
+  mediaserver::Bytes rest(stream);
+  for (auto nal = mediaserver::takeNal(&rest); !nal.empty(); nal = mediaserver::takeNal(&rest))
+    found.emplace_back(nal.begin(), nal.end());
+  return found;
+}
+inline std::vector<unsigned> nalTypes(const std::vector<uint8_t>& unit) {
+  std::vector<unsigned> types;
+  for (const auto& nal : nals(unit)) types.push_back(mediaserver::nalType(nal));
+  return types;
+}
 
 }  // namespace componenttest

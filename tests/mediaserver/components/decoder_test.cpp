@@ -1,7 +1,6 @@
 // Decoding: the pictures are libavcodec's own, for all kinds of streams, in the order that was asked for;
 // what ports and rectangles say of their sizes, and what happens when the stream changes them.
 
-#include "host/mediaserver/components/annex_b.h"
 #include "tests/mediaserver/components/component_run.h"
 
 namespace componenttest {
@@ -45,7 +44,8 @@ TEST_P(Streams, ComeOutAsLibavcodecDecodesThemOnEveryDevice) {
     expectSame(display.pictures(), displayed);
     EXPECT_EQ(display.errors, Errors{});
     if (display.isTi()) continue;
-    DecoderRun run(device, QcomOrder::Decode);
+    DecoderRun run(device);
+    EXPECT_EQ(run.setOrder(QcomOrder::Decode), kOk);
     run.setInput(stream.coding, stream.width, stream.height);
     run.start();
     for (size_t i = 0; i < units.size(); ++i) {
@@ -65,8 +65,11 @@ TEST(Decoder, FindsPicturesInAnyPieces) {
   const std::vector<Decoded> wanted = inDecodingOrder(decode("h264", units), units);
   const std::vector<uint8_t> stream = joined(units);
   for (const size_t piece : {stream.size(), size_t{1500}, size_t{37}}) {
-    DecoderRun run("msm8x60", QcomOrder::Decode);
-    ASSERT_EQ(run.setPacking(QcomPacking::Arbitrary), kOk);
+    DecoderRun run("msm8x60");
+    EXPECT_EQ(run.setOrder(QcomOrder::Decode), kOk);
+    auto packing = makeRecord<mediaserver::QcomPortDefinition>(kInputPort);
+    packing.nFramePackingFormat = static_cast<OMX_U32>(mediaserver::QcomPacking::Arbitrary);
+    EXPECT_EQ(run.set(mediaserver::kQcomPortDefinitionIndex, packing), kOk);
     run.start();
     for (size_t at = 0; at < stream.size(); at += piece) {
       const auto begin = stream.begin() + static_cast<ptrdiff_t>(at);
@@ -90,7 +93,8 @@ TEST(Decoder, TakesParameterSetsApartAndSkipsWhatComesBeforeAKeyFrame) {
   }
   for (const OMX_U32 flags : {OMX_BUFFERFLAG_CODECCONFIG, OMX_BUFFERFLAG_ENDOFFRAME}) {
     for (const QcomOrder order : {QcomOrder::Display, QcomOrder::Decode}) {
-      DecoderRun run("msm8960", order);
+      DecoderRun run("msm8960");
+      EXPECT_EQ(run.setOrder(order), kOk);
       run.start();
       run.send(sets, 0, flags);
       run.send(rest, 0);

@@ -1,4 +1,4 @@
-#include "tests/mediaserver/components/reference_codec.h"
+#include "tests/mediaserver/components/reference.h"
 
 #include <gtest/gtest.h>
 
@@ -17,8 +17,33 @@ namespace componenttest {
 using mediaserver::AvContext;
 using mediaserver::AvFrame;
 using mediaserver::AvPacket;
+using omxhost::PictureLayout;
 
 namespace {
+
+size_t roundUp(size_t value, size_t multiple) {
+  return (value + multiple - 1) / multiple * multiple;
+}
+
+// Noise that can be followed from picture to picture: squares of 8 pixels.
+uint8_t texture(uint32_t x, uint32_t y) {
+  uint32_t hash = x / 8 * 374761393U + y / 8 * 668265263U;
+  hash = (hash ^ hash >> 13) * 1274126177U;
+  return static_cast<uint8_t>(40 + (hash ^ hash >> 16) % 160);
+}
+
+// The position of a byte in a tiled plane that begins at `start`: number of the tile, then row by row.
+size_t tiled(size_t start, size_t x, size_t y, size_t tilesPerRow, size_t tileRows) {
+  const size_t column = x / 64;
+  const size_t row = y / 32;
+  size_t number = row * tilesPerRow + column;
+  if (row % 2 != 0) {
+    number = (row - 1) * tilesPerRow + column + column / 4 * 4 + 2;
+  } else if (row + 1 < tileRows) {
+    number += (column + 2) / 4 * 4;
+  }
+  return start + number * 2048 + y % 32 * 64 + x % 64;
+}
 
 Picture copyOut(const AVFrame& frame) {
   Picture picture(static_cast<uint32_t>(frame.width), static_cast<uint32_t>(frame.height));
@@ -29,6 +54,81 @@ Picture copyOut(const AVFrame& frame) {
 }
 
 }  // namespace
+
+Picture::Picture(uint32_t columns, uint32_t rows) : width(columns), height(rows) {
+  bytes.resize(size_t{width} * height + 2 * size_t{chromaWidth()} * chromaHeight());
+}
+
+uint8_t* Picture::plane(int index) {
+  const size_t luma = size_t{width} * height;
+  const size_t chroma = size_t{chromaWidth()} * chromaHeight();
+  return bytes.data() + (index == 0 ? 0 : index == 1 ? luma : luma + chroma);
+}
+
+Picture scene(uint32_t width, uint32_t height, uint32_t number) {
+  Picture picture(width, height);
+  const uint32_t ballX = number * 5 % width, ballY = number * 3 % height;
+  for (uint32_t i = 0; i < width * height; ++i) {
+    const uint32_t x = i % width, y = i / width;
+    const bool ball = x - ballX < 24 && y - ballY < 24;
+    picture.bytes[i] = ball ? texture(x - ballX + 500, y - ballY + 900) : texture(x + 2 * number, y + number);
+  }
+  const uint32_t columns = picture.chromaWidth(), samples = columns * picture.chromaHeight();
+  for (uint32_t i = 0; i < 2 * samples; ++i) {
+    const uint32_t x = i % columns, y = i % samples / columns, plane = i / samples;
+    picture.plane(1)[i] = static_cast<uint8_t>(80 + (x + number) * 3 % 100 + plane * 20 + y % 30);
+  }
+  return picture;
+}
+
+std::vector<uint8_t> packInput(const Picture& picture, PictureLayout layout, uint32_t pitch) {
+  if (pitch == 0) pitch = picture.width;
+  const bool aligned = layout == PictureLayout::SemiPlanarAligned;
+  const size_t luma = size_t{pitch} * picture.height;
+  std::vector<uint8_t> bytes(roundUp(luma, aligned ? 2048 : 1) + luma / 2);
+  uint8_t* const chroma = bytes.data() + bytes.size() - luma / 2;
+  for (size_t y = 0; y < picture.height; ++y) {
+    std::copy_n(picture.plane(0) + y * picture.width, picture.width, &bytes[y * pitch]);
+  }
+  for (const int plane : {1, 2}) {
+    const uint8_t* from = picture.plane(plane);
+    for (size_t y = 0; y < picture.chromaHeight(); ++y) {
+      for (size_t x = 0; x < picture.chromaWidth(); ++x) {
+        chroma[y * pitch + 2 * x + (plane == 2 ? 1 : 0)] = *from++;
+      }
+    }
+  }
+  return bytes;
+}
+
+Picture unpackOutput(const std::vector<uint8_t>& bytes, PictureLayout layout, uint32_t frameWidth,
+                     uint32_t frameHeight, const OMX_CONFIG_RECTTYPE& crop) {
+  Picture picture(crop.nWidth, crop.nHeight);
+  const size_t tilesPerRow = roundUp(frameWidth, 128) / 64;
+  const size_t lumaRows = roundUp(frameHeight, 32) / 32;
+  const size_t chromaRows = roundUp(frameHeight, 64) / 64;
+  const size_t tiledChroma = roundUp(tilesPerRow * lumaRows * 2048, 8192);
+  const auto left = static_cast<size_t>(crop.nLeft);
+  const auto top = static_cast<size_t>(crop.nTop);
+  // Chroma rows follow those of luma.
+  const auto at = [&](size_t x, size_t y, bool isLuma) {
+    if (layout != PictureLayout::Tiled) {
+      return bytes.at((isLuma ? top + y : frameHeight + top / 2 + y) * frameWidth + left + x);
+    }
+    return bytes.at(isLuma ? tiled(0, x, y, tilesPerRow, lumaRows)
+                           : tiled(tiledChroma, x, y, tilesPerRow, chromaRows));
+  };
+  uint8_t* to = picture.plane(0);
+  for (uint32_t y = 0; y < picture.height; ++y) {
+    for (uint32_t x = 0; x < picture.width; ++x) *to++ = at(x, y, true);
+  }
+  for (const uint32_t plane : {0U, 1U}) {
+    for (uint32_t y = 0; y < picture.chromaHeight(); ++y) {
+      for (uint32_t x = 0; x < picture.chromaWidth(); ++x) *to++ = at(2 * x + plane, y, false);
+    }
+  }
+  return picture;
+}
 
 std::vector<Picture> scenes(uint32_t width, uint32_t height, uint32_t count) {
   std::vector<Picture> pictures;
