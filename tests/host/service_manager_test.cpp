@@ -46,27 +46,6 @@ TEST(Interface, IsReachedThroughItsBinderAndThroughNoOther) {
   EXPECT_EQ(observer->getStrongCount(), 2) << "binder and interface are one object with one count";
 }
 
-TEST(Interface, TellsThoseWhoAskedOfItsDeathOnce) {
-  struct Recipient : IBinder::DeathRecipient {
-    void binderDied(const android::wp<IBinder>& who) override {
-      EXPECT_EQ(who.promote(), nullptr);
-      dead.push_back(who);
-    }
-    std::vector<android::wp<IBinder>> dead;
-  };
-  const sp<Recipient> asked = new Recipient(), withdrew = new Recipient();
-  sp<Recipient> gone = new Recipient();
-  sp<IBinder> binder = (new Observer())->asBinder();
-  const android::wp<IBinder> identity = binder;
-  for (const sp<Recipient>& each : {asked, withdrew, gone}) EXPECT_EQ(binder->linkToDeath(each), android::OK);
-  gone.clear();
-  EXPECT_EQ(binder->unlinkToDeath(withdrew, &binder), android::NAME_NOT_FOUND) << "another cookie";
-  EXPECT_EQ(binder->unlinkToDeath(withdrew), android::OK);
-  binder.clear();
-  EXPECT_EQ(asked->dead, std::vector<android::wp<IBinder>>{identity});
-  EXPECT_TRUE(withdrew->dead.empty());
-}
-
 TEST(ServiceManager, FindsReplacesListsAndRemoves) {
   const sp<IBinder> first = (new PlayerService())->asBinder(), second = (new PlayerService())->asBinder();
   const auto manager = defaultServiceManager();

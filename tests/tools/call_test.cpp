@@ -58,7 +58,7 @@ TEST_P(CallOn, WritesAStreamThatDecodesToThePicturesItWrote) {
 TEST_P(CallOn, CarriesOutChangesAtThePictureTheyAreMeantFor) {
   const TemporaryDirectory directory;
   const std::string pictures = directory.file("a.y4m");
-  const json figures = report({"call",     "-d",   GetParam(), "-s",        "192x128", "-n",    "120",
+  const json figures = report({"call",     "-d",   GetParam(), "-s",        "200x120", "-n",    "120",
                                "-b",       "200k", "--at",     "2s",        "fps=15",  "--at",  "1s",
                                "keyframe", "--at", "3000ms",   "rotate=90", "-o",      pictures});
   EXPECT_EQ(figures["frames_in"], 90);
@@ -66,7 +66,7 @@ TEST_P(CallOn, CarriesOutChangesAtThePictureTheyAreMeantFor) {
   EXPECT_EQ(figures["key_frames"], json({0, 30, 75}));
   EXPECT_EQ(figures["changes"][0], json({{"seconds", 1.0}, {"change", "keyframe"}}));
   EXPECT_GE(figures["psnr_y"], leastPsnr) << "compared with pictures turned in the same way";
-  EXPECT_EQ(picturesIn(pictures, 192 * 128 * 3 / 2), 90);
+  EXPECT_EQ(picturesIn(pictures, 200 * 120 * 3 / 2), 90);
 }
 
 INSTANTIATE_TEST_SUITE_P(Device, CallOn, testing::Values("msm7x30", "msm8x55", "msm8x60", "msm8960", "omap4"),

@@ -86,26 +86,6 @@ struct CallRig {
   std::stop_source enough;
 };
 
-TEST(ScriptedCall, EndsTheInputOnlyWhenThePicturesAreBack) {
-  CallRig rig;
-  // Slow enough that pictures wait for the decoder.
-  rig.server.decoder().onInput([](const Packet& input) {
-    std::this_thread::sleep_for(std::chrono::milliseconds(5));
-    return std::vector<Packet>{CallRig::decoded(input)};
-  });
-  std::vector<size_t> filledAtEnd;
-  rig.server.omx().before(omxtest::Method::EmptyBuffer, [&](const omxtest::Call& call) {
-    if ((call.flags & OMX_BUFFERFLAG_EOS) == 0) return;
-    filledAtEnd.push_back(rig.server.messages().deliveredCount([&](const android::omx_message& message) {
-      return omxtest::fillBufferDone()(message) && message.node == call.node;
-    }));
-  });
-  GraySource source(30);
-  EXPECT_EQ(rig.figures(source).framesDecoded, 30U);
-  ASSERT_EQ(filledAtEnd.size(), 2U);
-  EXPECT_GE(std::min(filledAtEnd[0], filledAtEnd[1]), 29U) << "but for the last one, just being handled";
-}
-
 TEST(ScriptedCall, CountsWhatTheEncoderDropsAndStillEnds) {
   CallRig rig;
   rig.server.encoder().onInput([](const Packet& input) {
