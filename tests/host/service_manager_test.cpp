@@ -46,6 +46,20 @@ TEST(Interface, IsReachedThroughItsBinderAndThroughNoOther) {
   EXPECT_EQ(observer->getStrongCount(), 2) << "binder and interface are one object with one count";
 }
 
+TEST(Interface, TellsOfItsDeathThoseWhoStillAsk) {
+  struct Recipient : IBinder::DeathRecipient {
+    void binderDied(const android::wp<IBinder>& /*who*/) override { ++deaths; }
+    int deaths = 0;
+  };
+  const sp<Recipient> asked = new Recipient(), withdrew = new Recipient();
+  sp<IBinder> binder = (new Observer())->asBinder();
+  for (const sp<Recipient>& each : {asked, withdrew}) EXPECT_EQ(binder->linkToDeath(each), android::OK);
+  EXPECT_EQ(binder->unlinkToDeath(withdrew, &binder), android::NAME_NOT_FOUND) << "another cookie";
+  EXPECT_EQ(binder->unlinkToDeath(withdrew), android::OK);
+  binder.clear();
+  EXPECT_TRUE(asked->deaths == 1 && withdrew->deaths == 0);
+}
+
 TEST(ServiceManager, FindsReplacesListsAndRemoves) {
   const sp<IBinder> first = (new PlayerService())->asBinder(), second = (new PlayerService())->asBinder();
   const auto manager = defaultServiceManager();
