@@ -23,39 +23,6 @@ class SettingsChange : public NodeTest {
   const Match changed = eventIs(OMX_EventPortSettingsChanged);
 };
 
-TEST_F(SettingsChange, GoesThroughDisableAndEnableAndLosesNoPicture) {
-  const auto node = running();
-  decoder.holdOutput();
-  decoder.produce(Packet("last of the old size"));
-  decoder.announce(
-      [](PortDefinition& output) {
-        output.nBufferSize = 256;
-        output.nBufferCountActual = 3;
-      },
-      OMX_IndexParamPortDefinition);
-  decoder.passOutput();
-  node->expect(fillBufferDone());
-  EXPECT_EQ(node->fill(0), android::OK);
-  node->expect(changed);
-  // The codec goes on working; what it makes waits.
-  node->empty(0, std::string(64, 'L'));
-  node->empty(1, "second");
-  node->expect(emptyBufferDone(), 2);
-  settle(node.get());
-  ASSERT_EQ(node->outputs().size(), 1u);
-  EXPECT_EQ(node->outputs()[0].text(), "last of the old size");
-  EXPECT_EQ(node->definition(kOutputPort).nBufferSize, 256u);
-
-  node->messages().clear();
-  reallocate(node.get(), 2);
-  EXPECT_EQ(node->heard(), (Words{"filled", "filled", "complete disable 1", "complete enable 1"}));
-  node->messages().clear();
-  node->fillAll();
-  node->expect(fillBufferDone(), 2);
-  EXPECT_EQ(node->outputs()[0].text() + node->outputs()[1].text(), std::string(64, 'L') + "second");
-  EXPECT_EQ(decoder.configured().at(kOutputPort).nBufferCountActual, 3u);
-}
-
 // The definition describes what the client is reading until it has read that. Time alone helps with one that
 // keeps its output.
 TEST_F(SettingsChange, WaitsForAReaderUntilItHasSentBackFreedOrKeptWhatItReads) {
