@@ -105,7 +105,7 @@ class ComponentRun : public omxtest::OmxClient {
     _outputsOut = buffers(kOutputPort).size();
   }
 
-  size_t indexOf(OMX_U32 port, BufferId id) const {
+  size_t indexOf(OMX_U32 port, android::IOMX::buffer_id id) const {
     size_t index = 0;
     while (buffers(port).at(index).id != id) ++index;
     return index;
