@@ -18,32 +18,33 @@ bool makesABuffer(const Call& call) {
   return call.method >= Method::UseBuffer && call.method <= Method::AllocateBufferWithBackup;
 }
 
-std::string detailsOf(const Call& call, const std::string& buffer) {
+}  // namespace
+
+std::string describe(const Call& call, const std::string& buffer) {
   static constexpr const char* kCommands[] = {"state", "flush", "disable", "enable", "mark"};
   const Method method = call.method;
-  if (method == Method::AllocateNode) return " " + call.text;
+  const std::string what = name(method);
+  if (method == Method::AllocateNode) return what + " " + call.text;
   if (method == Method::SendCommand) {
-    return String8::format(" %s %d", kCommands[call.command], call.param).string();
+    return what + String8::format(" %s %d", kCommands[call.command], call.param).string();
   }
   if (method >= Method::GetParameter && method <= Method::SetConfig) {
     // The record's port, and what is unusual about its size and version.
     const Words record = words(call.record);
     std::string text =
-        String8::format(" %x port %u", static_cast<unsigned>(call.index), record.at(2)).string();
+        what + String8::format(" %x port %u", static_cast<unsigned>(call.index), record.at(2)).string();
     if (record[0] != call.size) text += " size word " + std::to_string(record[0]);
     if (record[1] != kVersion) text += " version " + std::to_string(record[1]);
     return text;
   }
-  if (makesABuffer(call)) return " " + buffer + " of " + std::to_string(call.size);
-  if (method == Method::FreeBuffer) return " " + std::to_string(call.port) + " " + buffer;
-  if (method == Method::FillBuffer) return " " + buffer;
-  if (method != Method::EmptyBuffer) return "";
-  return String8::format(" %s %u+%u flags 0x%x time %lld", buffer.c_str(), call.offset, call.length,
-                         call.flags, static_cast<long long>(call.timestamp))
-      .string();
+  if (makesABuffer(call)) return what + " " + buffer + " of " + std::to_string(call.size);
+  if (method == Method::FreeBuffer) return what + " " + std::to_string(call.port) + " " + buffer;
+  if (method == Method::FillBuffer) return what + " " + buffer;
+  if (method != Method::EmptyBuffer) return what;
+  return what + String8::format(" %s %u+%u flags 0x%x time %lld", buffer.c_str(), call.offset, call.length,
+                                call.flags, static_cast<long long>(call.timestamp))
+                    .string();
 }
-
-}  // namespace
 
 LogLines logLines(const omxhost::LogCapture& capture) {
   LogLines lines;
@@ -80,8 +81,7 @@ Trace SessionTest::trace(size_t from) {
     if (makesABuffer(call)) {
       names[call.buffer] = (call.port == 0 ? "in" : "out") + std::to_string(made[call.port]++);
     }
-    lines.push_back(name(call.method) + detailsOf(call, names[call.buffer]) +
-                    (call.status != android::OK ? " failed" : ""));
+    lines.push_back(describe(call, names[call.buffer]) + (call.status != android::OK ? " failed" : ""));
   }
   lines.erase(lines.begin(), lines.begin() + static_cast<ptrdiff_t>(std::min(from, lines.size())));
   return lines;

@@ -29,6 +29,9 @@ using LogLines = std::vector<std::string>;
 // as "4/tag text". Exact, blanks and line ends included.
 LogLines logLines(const omxhost::LogCapture& capture);
 
+// A call in a few words, with `buffer` for the name of the one it concerns: "fillBuffer out0".
+std::string describe(const Call& call, const std::string& buffer = "");
+
 // --- Records that a session sends to its component ---
 
 using Words = std::vector<OMX_U32>;

@@ -45,25 +45,19 @@ class Life {
  private:
   // --- The fault
 
-  template <typename... Words>
-  size_t countAlike(Words... words) {
-    return ++_alike[{static_cast<OMX_U32>(words)...}];
-  }
+  Hit seen(const std::string& what) { return {_step, what, ++_alike[what]}; }
   bool refuses(const Call& call) {
     const std::lock_guard<std::mutex> lock(_mutex);
-    const auto record = call.as<std::array<OMX_U32, 3>>();  // size, version, port
-    const OMX_U32 port = record.has_value() ? record->at(2) : call.port;
-    const size_t nth = countAlike(call.method, port, call.index, call.command, call.param);
+    const Hit hit = seen(describe(call));
     if (++_outcome.calls != _fault.number || _fault.kind != Kind::Refused) return false;
-    _outcome.hit = Hit{_step, nth, call, port, {}};
+    _outcome.hit = hit;
     return true;
   }
   Fate fate(android::omx_message& message) {
     const std::lock_guard<std::mutex> lock(_mutex);
-    const size_t nth = countAlike(-1, message.type);
+    const Hit hit = seen(describe(message));
     if (++_outcome.messages != _fault.number || _fault.kind == Kind::Refused) return Fate::Pass;
-    _outcome.hit = Hit{_step, nth, {}, 0, message};
-    if (_fault.kind == Kind::Doubled) return Fate::Repeat;
+    _outcome.hit = hit;
     if (_fault.kind != Kind::Forged) return Fate::Hold;
     if (anyEvent()(message)) message.node = kNobody;
     if (emptyBufferDone()(message)) message.u.buffer_data.buffer = kNobody;
@@ -100,11 +94,10 @@ class Life {
     settle();
     return _session != nullptr;
   }
-  // What the call waits for does not come. It gets what was kept from it; or the session is destroyed.
+  // What the call waits for does not come: the session's destruction has to end it.
   void help(Step step, const Later& call) {
-    const bool again = std::exchange(_outcome.stuck, step).has_value();
-    if (release(Kind::Withheld) && ends([&] { return call.isDone(); })) return;
-    _outcome.hung = again || _fault.kind == Kind::Withheld || _session == nullptr;
+    require(_session != nullptr, "the end of a destruction");
+    _outcome.stuck = step;
     enter(Step::Destroy);
     Later destruction("destruction", [session = std::exchange(_session, nullptr)] {
       return omx_interface_destroy(session);
@@ -167,14 +160,8 @@ class Life {
   static int onOutput(void* /*first*/, void* /*data*/, unsigned int length, void* /*bufferId*/, void* context,
                       unsigned int /*timestamp*/) {
     auto& self = *static_cast<Life*>(context);
-    std::unique_lock<std::mutex> lock(self._mutex);
+    const std::lock_guard<std::mutex> lock(self._mutex);
     if (length > 0) ++self._outcome.pictures;
-    const bool repeated = self._fault.kind == Kind::Doubled && self._outcome.hit.has_value();
-    lock.unlock();
-    // What the second of a doubled message does must not depend on how quickly the first is dealt with.
-    if (repeated) {
-      static_cast<void>(self._server.messages().waitForDelivered(anyMessage(), self._fault.number + 1));
-    }
     return 0;
   }
 
@@ -182,10 +169,10 @@ class Life {
   const Fault _fault;
   const bool _encoding;
   void* _session = nullptr;
-  std::mutex _mutex;                                // guards what calls and messages note:
-  Step _step = Step::Create;                        // the present one
-  std::map<std::array<OMX_U32, 5>, size_t> _alike;  // how many of each in this step
-  Outcome _outcome;                                 // its results are the test's alone
+  std::mutex _mutex;                     // guards what calls and messages note:
+  Step _step = Step::Create;             // the present one
+  std::map<std::string, size_t> _alike;  // how many of each in this step
+  Outcome _outcome;                      // its results are the test's alone
 };
 
 // How often each of the other threads has been switched away from, by thread. Empty when one is running.
@@ -216,12 +203,10 @@ const char* name(Step step) {
 }
 
 std::string describe(const Fault& fault, const std::optional<Hit>& hit) {
-  static constexpr const char* kKinds[] = {"no",   "refused", "withheld", "delayed",
-                                           "late", "doubled", "forged"};
-  std::string text = kKinds[static_cast<size_t>(fault.kind)];
-  if (!hit.has_value()) return text + " " + std::to_string(fault.number);
-  text += " " + (fault.kind == Kind::Refused ? name(hit->call.method) : describe(hit->message));
-  return text + " in " + name(hit->step) + ", the " + std::to_string(hit->nth) + ". of its like";
+  static constexpr const char* kKinds[] = {"no", "refused", "delayed", "late", "forged"};
+  const std::string text = std::string(kKinds[static_cast<size_t>(fault.kind)]) + " ";
+  if (!hit.has_value()) return text + std::to_string(fault.number);
+  return text + hit->what + " in " + name(hit->step) + ", the " + std::to_string(hit->nth) + ". of its like";
 }
 
 Outcome live(ScriptedMediaServer& server, const Fault& fault, bool encoding) {

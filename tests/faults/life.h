@@ -18,12 +18,10 @@ inline constexpr size_t kFrames = 2;  // of each feeding step
 // What goes wrong with an IOMX call, or with a message.
 enum class Kind {
   None,
-  Refused,   // the call
-  Withheld,  // the message, until a call cannot go on without it
-  Delayed,   // ... until nothing else moves any more
-  Late,      // ... until the session is gone
-  Doubled,   // twice in a row
-  Forged     // with the id of no buffer, an event with that of no node
+  Refused,  // the call
+  Delayed,  // the message comes when nothing else moves any more
+  Late,     // ... when the session is gone
+  Forged    // ... with the id of no buffer, an event with that of no node
 };
 
 struct Fault {
@@ -34,16 +32,13 @@ struct Fault {
 // Where the fault has happened.
 struct Hit {
   Step step{};
-  size_t nth = 0;  // of its like in that step, from 1
-  Call call;       // of a refused one
-  OMX_U32 port = 0;
-  android::omx_message message{};  // as the component sent it
+  std::string what;  // the call or the message in a few words
+  size_t nth = 0;    // of its like in that step, from 1
 };
 
 struct Outcome {
   std::map<Step, int> results;  // of the steps that were taken; of several calls the first that is not 0
-  std::optional<Step> stuck;    // the one that had to be helped: nobody was going to end its wait
-  bool hung = false;            // in spite of that
+  std::optional<Step> stuck;    // nobody was going to end its wait: the session was destroyed
   size_t pictures = 0;          // delivered
   size_t calls = 0;             // to IOMX
   size_t messages = 0;
