@@ -6,33 +6,20 @@
 
 #include <atomic>
 #include <new>
-#include <type_traits>
-
-#include "omxbridge/omxbridge.h"
 
 namespace faults {
 
 namespace {
 
-std::atomic<size_t> g_failing[3];  // by function; 0: none
+std::atomic<size_t> g_failing[2];  // by function; 0: none
 
 std::atomic<size_t>& failing(Failing function) {
   return g_failing[static_cast<size_t>(function)];
 }
 
-// Whether it is the product's code: others, the test's own among them, may ask for as many bytes.
-bool isProduct(void* code) {
-  Dl_info product = {};
-  Dl_info caller = {};
-  return dladdr(reinterpret_cast<void*>(&decoder_create), &product) != 0 && dladdr(code, &caller) != 0 &&
-         caller.dli_fbase == product.dli_fbase;
-}
-
-// True for the one allocation that is to fail.
-bool failsNow(Failing function, size_t size, void* caller) {
+bool memoryFailsNow(size_t size) {
   size_t expected = size;
-  return size != 0 && failing(function) == size && isProduct(caller) &&
-         failing(function).compare_exchange_strong(expected, 0);
+  return size != 0 && failing(Failing::Memory).compare_exchange_strong(expected, 0);
 }
 
 bool threadFailsNow() {
@@ -56,17 +43,8 @@ Fault::~Fault() {
 using faults::Failing;
 
 // Memory still comes from the library's (or a sanitizer's) own form, and goes back to it.
-void* operator new(size_t size) {
-  using New = void* (*)(size_t);
-  constexpr const char* kName = std::is_same_v<size_t, unsigned long> ? "_Znwm" : "_Znwj";
-  static const auto next = reinterpret_cast<New>(dlsym(RTLD_NEXT, kName));
-  if (faults::failsNow(Failing::New, size, __builtin_return_address(0))) throw std::bad_alloc();
-  return next(size);
-}
-
 void* operator new(size_t size, const std::nothrow_t& /*unused*/) noexcept {
-  return faults::failsNow(Failing::NothrowNew, size, __builtin_return_address(0)) ? nullptr
-                                                                                  : ::operator new(size);
+  return faults::memoryFailsNow(size) ? nullptr : ::operator new(size);
 }
 
 // Where a sanitizer is part of the executable, its own form is behind this name.

@@ -54,6 +54,9 @@ TEST_F(InputTest, SendsCopiesAndReservedBuffersTheLowestFirst) {
   EXPECT_EQ(script().inputs()[2].text(), std::string(kCapacity, 'x'));
   waitForBusy(0, 0);
   EXPECT_EQ(_application.inputCallbacks(), std::vector<void*>(4, _session.get()));
+  deliver(makeEmptyBufferDone(bufferId(0, 0)));  // once more
+  EXPECT_EQ(log().size(), 1u);
+  EXPECT_NE(log()[0].find("yet received an EMPTY_BUFFER_DONE."), std::string::npos);
   // A send leaves its length in the record; the buffer holds as much as before.
   EXPECT_EQ(feed(std::string(kCapacity, 'y')), 0);
 }

@@ -43,7 +43,7 @@ TEST_F(OutputTest, DeliversWhatTheComponentMakesInOrder) {
   waitForBusy(1, kOutputs);
   Later ending = beginDeInit();
   waitForSleeper(&SessionState::endOfOutputWaiters);
-  const faults::Fault failed(faults::Failing::NothrowNew, sizeof(SimpleNode));
+  const faults::Fault failed(faults::Failing::Memory, sizeof(SimpleNode));
   componentProduces("the end", 0, OMX_BUFFERFLAG_EOS);
   EXPECT_EQ(ending.result(), OMXI_ERR_ALLOCATE_MEMORY);
 }
@@ -79,7 +79,7 @@ TEST_F(OutputTest, LeavesABufferWithTheApplicationUntilItComesBack) {
 
 TEST_F(OutputTest, DeliversNothingThatComesAfterTheEnd) {
   // A component on its way to Idle gives its empty buffers back; whether the application saw them would
-  // depend on how long its callback takes.
+  // depend on how long its callback takes, which no message waits for.
   start();
   Gate& gate = newGate();
   Gate& last = newGate();
@@ -103,19 +103,6 @@ TEST_F(OutputTest, DeliversNothingThatComesAfterTheEnd) {
   EXPECT_EQ(log(), LogLines{"W OMXINTERFACE - ===DataOutputThread over! enc thread!\n"});
 }
 
-TEST_F(OutputTest, ParksBuffersWhileNotExecuting) {
-  start();
-  deliverEvent(OMX_EventCmdComplete, OMX_CommandStateSet, OMX_StatePause);
-  feedThrough("a");
-  feedThrough("b");  // the pass of "a" is over
-  EXPECT_EQ(fills(), kOutputs);
-  deliverEvent(OMX_EventCmdComplete, OMX_CommandStateSet, OMX_StateExecuting);
-  feedThrough("c");
-  waitForFills(kOutputs + 1);
-  EXPECT_EQ(_session->fillOutputBuffers(), OMXI_OK);  // picks the parked ones up
-  waitForBusy(1, kOutputs);
-}
-
 TEST_F(OutputTest, ABufferGivenBackInsideItsCallbackGoesBackOnceAndHasBeenReadBefore) {
   // A second fillBuffer would send the component a buffer that it has; and with the buffer the record's end
   // mark is cleared: looked at afterwards it would be gone, and the stream would never end.
@@ -128,29 +115,6 @@ TEST_F(OutputTest, ABufferGivenBackInsideItsCallbackGoesBackOnceAndHasBeenReadBe
   componentProduces("the end", 0, OMX_BUFFERFLAG_EOS);
   EXPECT_EQ(deInit(), OMXI_OK);
   EXPECT_EQ(fills(), kOutputs + 4);
-}
-
-TEST_F(OutputTest, ACallbackMayWaitForAnInputBuffer) {
-  // If queueing the second picture had to wait for the callback's end, neither would ever come.
-  start();
-  holdInputAllBut(0);
-  Gate& returned = newGate();
-  std::atomic<int> fed{-9};
-  _application.onInput([&] { returned.open(); });
-  _application.onOutput([&](const Output& output) {
-    if (output.bytes == "first") {
-      returned.pass();
-      fed = feed("from the callback");
-    }
-    return 0;
-  });
-  componentProduces("first");
-  returned.waitForArrival();
-  componentProduces("second");
-  require(messages().waitForDelivered(fillBufferDone(), 2), "a filled buffer during a callback");
-  script().releaseInput(1);
-  _application.waitForOutputs(2);
-  EXPECT_EQ(fed, 0);
 }
 
 }  // namespace

@@ -144,15 +144,6 @@ Later SessionTest::beginDestroy() {
   return {"destruction", [session = _session.release()] { return delete session, 0; }};
 }
 
-Later SessionTest::beginDestroyOfBusySession() {
-  SessionState& state = *_session->_state;
-  Later destroyed = beginDestroy();
-  requireUnderLock(
-      state, [](SessionState& busy) { return busy.ending; }, "the destruction");
-  EXPECT_FALSE(destroyed.isDone());
-  return destroyed;
-}
-
 int SessionTest::feed(const std::string& text, int timestamp) {
   std::string bytes = text;
   return _session->sendInputData(bytes.data(), static_cast<unsigned int>(bytes.size()), timestamp);

@@ -103,9 +103,6 @@ class SessionTest : public ::testing::Test {
   void endOfStream(int timestamp = 0);
   // Destroys the session, from another thread. The pointer stays readable for calls in progress.
   Later beginDestroy();
-  // The same for a session that cannot be gone before the test lets something in progress end: comes back
-  // once destruction has begun.
-  Later beginDestroyOfBusySession();
   void destroy() { beginDestroy().result(); }
   Gate& newGate() { return _gates.emplace_back(); }  // lives as long as the session
 

@@ -5,11 +5,6 @@
 namespace omxtest {
 namespace {
 
-std::string queueGone(int line) {
-  return "E OmxInterfaceDecoder::EventMonitorThread ! _queueThreadMessages==NULL !line:" +
-         std::to_string(line) + "  \n";
-}
-
 using EventThreadTest = DecoderSessionTest;
 
 TEST_F(EventThreadTest, SaysWhichEventsItDoesNotHandle) {
@@ -19,7 +14,7 @@ TEST_F(EventThreadTest, SaysWhichEventsItDoesNotHandle) {
   handleEvent(OMX_EventPortSettingsChanged, 0, 0);
   handleEvent(OMX_EventPortSettingsChanged, 2, 0);
   handleEvent(OMX_EventCmdComplete, OMX_CommandFlush, 1);
-  const faults::Fault failed(faults::Failing::NothrowNew, sizeof(android::omx_message));
+  const faults::Fault failed(faults::Failing::Memory, sizeof(android::omx_message));
   handleEvent(OMX_EventBufferFlag, 1, 1);
   handleEvent(OMX_EventBufferFlag, 2, 2);
   const std::string inputPort = "E ERROR: PORT SETTING CHANGED - being called on INPUT PORT \n";
@@ -30,19 +25,6 @@ TEST_F(EventThreadTest, SaysWhichEventsItDoesNotHandle) {
   EXPECT_EQ(omx().count(), before);
   EXPECT_EQ(_session->threadError(), OMXI_OK);
   EXPECT_FALSE(_session->_portReconfiguring);
-}
-
-TEST_F(EventThreadTest, ARefusedDisableLeavesTheOutputDrainingUntilTheNextAnnouncement) {
-  startDecoder();
-  omx().fail(Method::SendCommand);
-  script().announce(320, 240);
-  require(omx().waitForCalls(Method::SendCommand, 3), "the disable");
-  waitForEvents();
-  EXPECT_TRUE(_session->_portReconfiguring);
-  handleEvent(OMX_EventPortSettingsChanged, 1, 0);
-  waitForFills(2 * kOutputBuffers);
-  feedThrough("delivered");
-  EXPECT_EQ(_application.outputs().back().info.width, 320u);
 }
 
 TEST_F(EventThreadTest, PortCompletionsInAWrongStateAreFailures) {
@@ -73,27 +55,6 @@ TEST_F(EventThreadTest, StartsAgainWithTheThreadsOfAFailedStart) {
   EXPECT_EQ(init(), OMXI_OK);
   EXPECT_TRUE(pthread_equal(thread, decoder()._eventThread));
   feedThrough("delivered");
-}
-
-TEST_F(EventThreadTest, AThreadFindsItsQueueGoneWhereverItIs) {
-  // In its wait, or not quite.
-  startDecoder();
-  destroy();
-  LogLines lines = log();
-  EXPECT_EQ(std::erase(lines, queueGone(305)) + std::erase(lines, queueGone(290)), 1u);
-  // In the middle of an event.
-  _log.clear();
-  startDecoder();
-  Gate& gate = newGate();
-  omx().before(Method::SendCommand, [&](const Call&) { gate.pass(); });
-  script().announce(320, 240);
-  gate.waitForArrival();
-  Later destroyed = beginDestroyOfBusySession();
-  gate.open();
-  destroyed.result();
-  lines = log();
-  EXPECT_EQ(std::erase(lines, queueGone(290)), 1u);
-  EXPECT_EQ(lines, LogLines{"W OMXINTERFACE - ===DataOutputThread over! dec thread!\n"});
 }
 
 }  // namespace

@@ -41,17 +41,6 @@ class NewSettingsTest : public DecoderSessionTest {
     waitForEvents();
     waitForBusy(1, kOutputBuffers);
   }
-  // The event thread has looked at every wake-up so far, and sleeps.
-  void requireAsleepForBuffers() {
-    requireEventually(
-        [this] {
-          // A test that keeps asking under the lock keeps the event thread from it.
-          if (!isIdle(_session->_semOutputBuffersReturned)) return false;
-          const SessionState::Lock held(_session->_state->lock);
-          return _session->_state->outputReturnWaiters == 1;
-        },
-        "an event thread that waits for the output buffers");
-  }
 };
 
 TEST_F(NewSettingsTest, ExchangeTheBuffers) {
@@ -136,7 +125,7 @@ TEST_F(NewSettingsTest, WaitForThePicturesOfTheOldSize) {
   announceAndDisable();
   deliverEvent(OMX_EventBufferFlag, 1, 16);
   requireEventually([this] { return _session->portBuffersHaveBeenReturned(1); }, "the buffers");
-  requireAsleepForBuffers();
+  waitForSleeper(&SessionState::outputReturnWaiters);
   EXPECT_EQ(freed(), 0u);
   EXPECT_EQ(log(), LogLines{});
   gate.open();
@@ -147,24 +136,6 @@ TEST_F(NewSettingsTest, WaitForThePicturesOfTheOldSize) {
   destroy();
   EXPECT_TRUE(_log.waitFor("Unknown Event (4, 1, 16)"));
   EXPECT_EQ(log().size(), 2u);  // with the output thread's end
-}
-
-TEST_F(NewSettingsTest, WaitForARefillThatIsUnderWay) {
-  // Freed now, the component would get a buffer that is gone; and when it refuses it, as it must, somebody
-  // has to wake the event thread, which waits for just that buffer.
-  startDecoder();
-  Gate& gate = newGate();
-  omx().before(Method::FillBuffer, [&](const Call&) { gate.pass(); });
-  ASSERT_EQ(feed("picture"), 0);
-  gate.waitForArrival();
-  announceAndDisable();
-  waitForBusy(1, 1);
-  requireAsleepForBuffers();
-  EXPECT_EQ(freed(), 0u);
-  gate.open();
-  requireReconfigured();
-  EXPECT_EQ(freed(), kOutputBuffers);
-  EXPECT_EQ(log(), LogLines{"E OMXINTERFACE - fillBuffer failed w/ error 0x80000000"});
 }
 
 TEST_F(NewSettingsTest, DoNotWaitForAnOutputThreadThatHasEnded) {
@@ -258,35 +229,6 @@ TEST_F(SettingsEndTest, BeginNoFurtherStepOnceDeInitHasBegun) {
     EXPECT_EQ(commands(), (Trace{"sendCommand state 2", "sendCommand state 1"}));
     destroy();
   }
-  // Nor does a new reconfiguration begin.
-  startDecoder();
-  endOfOutput();
-  omx().clearCalls();
-  messages().hold(commandComplete(OMX_CommandStateSet, OMX_StateIdle));
-  Later ending = beginDeInit();
-  require(messages().waitForHeld(1), "the component's way to Idle");
-  handleEvent(OMX_EventPortSettingsChanged, 1, 0);
-  messages().passAll();
-  EXPECT_EQ(ending.result(), OMXI_OK);
-  EXPECT_EQ(commands(), (Trace{"sendCommand state 2", "sendCommand state 1"}));
-}
-
-TEST_F(SettingsEndTest, ASettingAndTheWrappersEndExcludeEachOther) {
-  // Deleted now, the wrapper would be used after its end. Whoever comes later is told that there is none.
-  startDecoder();
-  endOfOutput();
-  Gate& gate = newGate();
-  omx().before(Method::SetParameter, [&](const Call&) { gate.pass(); });
-  Later setting("setPictureOrder()", [this] { return decoder().setPictureOrder(0); });
-  gate.waitForArrival();
-  Later ending = beginDeInit();
-  requireUnderLock([this](SessionState&) { return _session->_platformWrapper == nullptr; },
-                   "the wrapper's removal");
-  EXPECT_FALSE(ending.isDone());
-  EXPECT_EQ(decoder().setPictureOrder(1), OMXI_ERR_NO_PLATFORM_WRAPPER);
-  gate.open();
-  EXPECT_NE(setting.result(), OMXI_ERR_NO_PLATFORM_WRAPPER);
-  EXPECT_EQ(ending.result(), OMXI_OK);
 }
 
 }  // namespace
