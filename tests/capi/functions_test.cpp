@@ -10,14 +10,11 @@ namespace {
 using namespace omxtest;
 
 // The last that creation writes: the size that this generation's decoders begin with.
-void expectInputSize(ScriptedMediaServer& server, OMX_U32 width, OMX_U32 height) {
+std::pair<OMX_U32, OMX_U32> inputSize(ScriptedMediaServer& server) {
   const Call call = server.omx().calls(Method::SetParameter).back();
-  EXPECT_EQ(call.index, OMX_IndexParamPortDefinition);
-  const auto definition = call.as<OMX_PARAM_PORTDEFINITIONTYPE>();
-  EXPECT_EQ(definition->nPortIndex, 0U);
-  EXPECT_EQ(definition->format.video.nFrameWidth, width);
-  EXPECT_EQ(definition->format.video.nFrameHeight, height);
-  EXPECT_EQ(definition->format.video.xFramerate, 24U << 16);
+  const auto video = call.as<OMX_PARAM_PORTDEFINITIONTYPE>()->format.video;
+  EXPECT_EQ(video.xFramerate, 24U << 16);
+  return {video.nFrameWidth, video.nFrameHeight};
 }
 
 TEST(Create, BeginsSmallerOnAnOlderGeneration) {
@@ -25,7 +22,7 @@ TEST(Create, BeginsSmallerOnAnOlderGeneration) {
   void* const decoder = decoder_create(nullptr, "a name that does not matter");
   ASSERT_NE(decoder, nullptr);
   EXPECT_STREQ(static_cast<OmxInterface*>(decoder)->_componentName, "a name that does not matter");
-  expectInputSize(server, 640, 480);
+  EXPECT_EQ(inputSize(server), std::pair(640U, 480U));
   EXPECT_EQ(omx_interface_destroy(decoder), 0);
 }
 
@@ -33,21 +30,24 @@ TEST(Create, ReportsWhatFailsAndLeavesNothing) {
   omxhost::LogCapture log;
   ScriptedMediaServer server("msm8960");
   server.unregister();
-  const std::string noServer = "E OMXINTERFACE: CANNOT ACQUIRE MEDIA PLAYER SERVICE";
   const std::string build = std::string("4/zol-video enter hardCodec encoder_create: build time:");
   int result = -77;
   webrtc::VideoCodec codec = settings();
   EXPECT_EQ(decoder_create(&result, nullptr), nullptr);
   EXPECT_EQ(result, 3);
+  server.serve(nullptr);
   EXPECT_EQ(encoder_create(&result, &codec), nullptr);
   EXPECT_EQ(result, 3);
+  server.unregister();
   server.serve(&server.omx());
   EXPECT_EQ(encoder_create(&result, nullptr), nullptr);
   EXPECT_EQ(result, 28);
   EXPECT_EQ(
       logLines(log),
-      (LogLines{noServer, "E OMXINTERFACE - ERROR creating decoder: 3 (Could not Acquire iOMX Interface)",
-                build + g_strPrgCreatTime + " ", noServer,
+      (LogLines{"E OMXINTERFACE: CANNOT ACQUIRE MEDIA PLAYER SERVICE",
+                "E OMXINTERFACE - ERROR creating decoder: 3 (Could not Acquire iOMX Interface)",
+                build + g_strPrgCreatTime + " ",
+                "E OMXINTERFACE: MEDIA PLAYER SERVICE CANNOT GET IOMX INTERFACE",
                 "E OMXINTERFACE - ERROR creating encoder: 3 (Could not Acquire iOMX Interface)",
                 build + g_strPrgCreatTime + " ",
                 "E OMXINTERFACE - ERROR creating encoder: 28 (Invalid Encoding Parameters submitted.)"}));
@@ -87,7 +87,7 @@ TEST(Functions, ReachTheirOperations) {
   ScriptedMediaServer server("msm8960");
   void* const handle = decoder_create(nullptr, nullptr);
   ASSERT_NE(handle, nullptr);
-  expectInputSize(server, 1920, 1088);
+  EXPECT_EQ(inputSize(server), std::pair(1920U, 1088U));
   EXPECT_EQ(omx_interface_get_buffer_number(handle), 4);
   static std::atomic<void*> told{nullptr};
   EXPECT_EQ(omx_interface_register_input_callback(

@@ -87,18 +87,9 @@ Trace SessionTest::trace(size_t from) {
   return lines;
 }
 
-SessionTest::SessionTest(const char* device) : _server(device) {
-  hangReport() = [this] {
-    for (const Trace& lines : {trace(), log()}) {
-      for (const std::string& line : lines) fprintf(stderr, "%s\n", line.c_str());
-    }
-  };
-}
-
 SessionTest::~SessionTest() {
   for (Gate& gate : _gates) gate.open();
   if (_session != nullptr) destroy();
-  hangReport() = nullptr;
 }
 
 int SessionTest::createEncoder(webrtc::VideoCodec codec) {

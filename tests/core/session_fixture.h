@@ -76,7 +76,7 @@ class SessionTest : public ::testing::Test {
   static constexpr size_t kInputs = 4;   // buffers of the scripted components
   static constexpr size_t kOutputs = 6;  // of the encoder
 
-  explicit SessionTest(const char* device = "msm8960");
+  explicit SessionTest(const char* device = "msm8960") : _server(device) {}
   ~SessionTest() override;
 
   // A session in place of the former one, with the application registered; Create()'s result. An encoder's
