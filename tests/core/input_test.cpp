@@ -97,7 +97,9 @@ TEST_F(InputTest, ClosesWithTheEndMarkButForWhatWasReserved) {
     start();
     const Reserved first = reserve();
     const Reserved kept = reserve();
-    holdInputAllBut(2);
+    script().holdInput();
+    while (feed("held") == 0) {
+    }
     const size_t before = omx().count();
     Later ending = beginEndOfInput(-5);
     waitForSleeper(&SessionState::inputFreeWaiters);

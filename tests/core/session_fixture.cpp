@@ -146,11 +146,6 @@ void SessionTest::feedThrough(const std::string& text, int timestamp) {
   _application.waitForOutputs(before + 1);
 }
 
-void SessionTest::holdInputAllBut(size_t left) {
-  script().holdInput();
-  for (size_t i = left; i < kInputs; ++i) ASSERT_EQ(feed("held"), 0);
-}
-
 size_t SessionTest::busyCount(int port) const {
   const SessionState::Lock held(_session->_state->lock);
   const auto& records = _session->_portBuffers[port];

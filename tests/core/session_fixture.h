@@ -109,8 +109,6 @@ class SessionTest : public ::testing::Test {
   int feed(const std::string& text, int timestamp = 0);
   // Feeds and waits for the output.
   void feedThrough(const std::string& text, int timestamp = 0);
-  // Keeps the component from returning input, and gives it all but `left` buffers.
-  void holdInputAllBut(size_t left);
   // The component makes an output of its own accord.
   void componentProduces(const std::string& text, OMX_TICKS timestamp = 0, OMX_U32 flags = 0) {
     script().produce(Packet(text, timestamp, flags));

@@ -35,12 +35,6 @@ class NewSettingsTest : public DecoderSessionTest {
     EXPECT_EQ(_application.outputs().back().bytes, text);
     EXPECT_EQ(_application.outputs().back().info.width, width);
   }
-  // Until the port has come back, with all its buffers at the component.
-  void requireReconfigured() {
-    require(messages().waitForDelivered(commandComplete(OMX_CommandPortEnable)), "the port's return");
-    waitForEvents();
-    waitForBusy(1, kOutputBuffers);
-  }
 };
 
 TEST_F(NewSettingsTest, ExchangeTheBuffers) {
@@ -136,18 +130,6 @@ TEST_F(NewSettingsTest, WaitForThePicturesOfTheOldSize) {
   destroy();
   EXPECT_TRUE(_log.waitFor("Unknown Event (4, 1, 16)"));
   EXPECT_EQ(log().size(), 2u);  // with the output thread's end
-}
-
-TEST_F(NewSettingsTest, DoNotWaitForAnOutputThreadThatHasEnded) {
-  // What is queued after the end of the stream is delivered by nobody.
-  startDecoder();
-  endOfOutput();
-  waitForOutputThreadToEnd();
-  componentProduces("behind the end");
-  require(messages().waitForDelivered(fillBufferDone(), 2), "the picture");
-  script().announce(352, 288);
-  requireReconfigured();
-  EXPECT_EQ(_application.outputs().size(), 0u);
 }
 
 // --- The end of the session in the middle of them ---
