@@ -91,5 +91,28 @@ TEST_F(PortsTest, ARefusalKeepsTheBuffersMade) {
   EXPECT_EQ(_session->threadError(), OMXI_OK);
 }
 
+TEST_F(PortsTest, LetsNobodyFindARecordOnItsWayOut) {
+  // Whoever used one would use freed memory, or hand the component a buffer that is gone.
+  start();
+  _application.onOutput([](const Output&) { return 1; });
+  feedThrough("kept");
+  void* const kept = bufferId(1, 0);
+  void* handle = nullptr;
+  void* data = nullptr;
+  ASSERT_EQ(_session->reserveInputBuffer(&handle, &data), 0);
+  bool input = false;
+  omx().before(Method::FreeBuffer, [&](const Call&) {
+    _session->returnIomxOutputBuffer(kept);
+    if (!input) return;
+    EXPECT_EQ(_session->sendInputBuffer(handle, 1, 0), -1);
+    EXPECT_EQ(feed("x"), -1);
+  });
+  _session->freeBuffersOnPort(1);
+  input = true;
+  _session->freeBuffersOnPort(0);
+  EXPECT_EQ(omx().count(Method::FillBuffer), kOutputs);
+  EXPECT_EQ(omx().count(Method::EmptyBuffer), 1u);
+}
+
 }  // namespace
 }  // namespace omxtest
