@@ -1,9 +1,7 @@
-// Buffers at work: bytes on their way through a component, who holds what, and the end of a stream.
-
-#include <atomic>
+// Buffers at work: bytes on their way through a component, who holds what, the end of a stream, and new
+// settings in the middle of it.
 
 #include "tests/mediaserver/node_fixture.h"
-#include "tests/support/eventually.h"
 
 namespace omxtest {
 namespace {
@@ -71,6 +69,7 @@ TEST_F(Buffers, OutsideTheirRangeOrTwiceOrOnTheWrongPortOrTooEarlyAreRefused) {
   EXPECT_EQ(server->fillBuffer(node->node(), output), kUnknownError);
   EXPECT_EQ(server->freeBuffer(node->node(), kInputPort, output), kUnknownError);
   EXPECT_EQ(server->freeBuffer(node->node(), kOutputPort, output), android::OK);
+  node->expect(errorIs(OMX_ErrorPortUnpopulated));
   EXPECT_EQ(server->freeBuffer(node->node(), kOutputPort, output), kUnknownError);
   EXPECT_EQ(node->messages().count(emptyBufferDone()) + node->messages().count(fillBufferDone()), 0u);
 }
@@ -106,22 +105,28 @@ TEST_F(Buffers, EndOfStreamComesOutOnceAndLast) {
   }
 }
 
-TEST_F(Buffers, FreedWhileTheCodecWorksOnThemHarmNobody) {
-  const auto node = running();
-  std::atomic<bool> inside{false};
-  std::atomic<bool> goOn{false};
-  decoder.onInput([&](const Packet& input) {
-    inside = true;
-    EXPECT_TRUE(eventually([&] { return goOn.load(); }));
-    return std::vector<Packet>{input};
-  });
-  ASSERT_EQ(node->empty(0, "gone"), android::OK);
-  ASSERT_TRUE(eventually([&] { return inside.load(); }));
-  EXPECT_EQ(node->freeBuffer(kInputPort, 0), android::OK);
-  goOn = true;
-  node->expect(fillBufferDone());
-  settle(node.get());
-  EXPECT_EQ(node->messages().count(emptyBufferDone()), 0u) << "nobody owns it any more";
+// The definition describes what the client is reading until it has read that. Then nothing else is heard
+// before the client has answered.
+TEST_F(Buffers, HoldNewSettingsBackWhileTheyAreRead) {
+  const Match changed = eventIs(OMX_EventPortSettingsChanged);
+  const Match corrupt = errorIs(OMX_ErrorStreamCorrupt);
+  for (const bool freed : {false, true}) {
+    const auto node = running();
+    decoder.produce(Packet("being read"));
+    node->expect(fillBufferDone());
+    decoder.announce(320, 240);
+    settle(node.get());
+    EXPECT_EQ(node->messages().count(changed), 0u);
+    EXPECT_EQ(node->definition(kOutputPort).format.video.nFrameWidth, 176u);
+    EXPECT_EQ(freed ? node->freeBuffer(kOutputPort, 0) : node->fill(0), android::OK);
+    node->expect(changed);
+    EXPECT_EQ(node->definition(kOutputPort).format.video.nFrameWidth, 320u);
+    decoder.raiseError(OMX_ErrorStreamCorrupt);
+    settle(node.get());
+    EXPECT_EQ(node->messages().count(corrupt), 0u);
+    node->command(OMX_CommandPortDisable, kOutputPort);
+    node->expect(corrupt);
+  }
 }
 
 }  // namespace

@@ -57,18 +57,6 @@ TEST_F(Commands, ACodecThatDoesNotStartKeepsTheNodeInIdle) {
   node->complete(OMX_CommandStateSet, OMX_StateExecuting);
 }
 
-TEST_F(Commands, MistakesAreErrorsAsEventsOrAtOnce) {
-  const auto node = client();
-  for (OMX_U32 command = OMX_CommandFlush; command <= OMX_CommandMarkBuffer; ++command) {
-    EXPECT_EQ(node->command(static_cast<OMX_COMMANDTYPE>(command), 2), android::OK);
-    node->expect(errorIs(OMX_ErrorBadPortIndex), command);
-  }
-  EXPECT_EQ(node->command(OMX_CommandStateSet, 77), android::OK);
-  node->expect(errorIs(OMX_ErrorIncorrectStateTransition));
-  EXPECT_EQ(node->command(static_cast<OMX_COMMANDTYPE>(5), 0), kUnknownError);
-  EXPECT_EQ(node->state(), OMX_StateLoaded);
-}
-
 TEST_F(Commands, FlushAndIdleReturnWhatThePortsHoldBeforeTheyComplete) {
   const struct {
     OMX_COMMANDTYPE command;
@@ -134,7 +122,7 @@ TEST_F(Commands, PortsAreClosedAndOpenedWhenTheirBuffersAreGoneAndThere) {
   }
 }
 
-TEST_F(Commands, BuffersAreTakenWhereTheyAreDueAndAnUnexpectedFreeIsReported) {
+TEST_F(Commands, BuffersAreTakenWhereTheyAreDue) {
   const auto node = client();
   EXPECT_EQ(node->give(kInputPort), kUnknownError) << "in Loaded";
   node->command(OMX_CommandStateSet, OMX_StateIdle);
@@ -146,18 +134,6 @@ TEST_F(Commands, BuffersAreTakenWhereTheyAreDueAndAnUnexpectedFreeIsReported) {
   EXPECT_EQ(node->give(kInputPort), kUnknownError) << "more than the port has";
   node->populate(kOutputPort);
   node->expectComplete(OMX_CommandStateSet, OMX_StateIdle);
-  node->complete(OMX_CommandStateSet, OMX_StateExecuting);
-
-  node->fillAll();
-  decoder.holdOutput();
-  ASSERT_EQ(node->freeBuffer(kOutputPort, 0), android::OK);  // while the node holds it
-  node->expect(errorIs(OMX_ErrorPortUnpopulated));
-  EXPECT_EQ(node->messages().count(fillBufferDone()), 0u);
-  EXPECT_EQ(node->definition(kOutputPort).bPopulated, OMX_FALSE);
-  node->empty(0, "still there");
-  decoder.passOutput();
-  node->expect(fillBufferDone());
-  EXPECT_EQ(node->outputs().front().text(), "still there");
 }
 
 }  // namespace

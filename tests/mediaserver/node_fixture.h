@@ -40,15 +40,11 @@ class NodeTest : public ::testing::Test {
         });
       }
     }
-    serve(std::chrono::hours(1));
+    // Waits for ever for clients that keep their output.
+    server = new mediaserver::OmxServer({decoder.component(kDecoder), encoder.component(kEncoder)},
+                                        std::chrono::hours(1));
   }
   ~NodeTest() override { EXPECT_EQ(server->nodeCount(), 0u); }
-
-  // Another server, which waits that long for clients that keep their output. As a rule for ever.
-  void serve(std::chrono::milliseconds readingTime) {
-    server =
-        new mediaserver::OmxServer({decoder.component(kDecoder), encoder.component(kEncoder)}, readingTime);
-  }
 
   std::unique_ptr<OmxClient> client(const char* component = kDecoder) {
     return std::make_unique<OmxClient>(server, component);

@@ -9,7 +9,6 @@
 #include <cstdint>
 #include <functional>
 #include <string>
-#include <type_traits>
 #include <vector>
 
 #include <omxhost/device.h>
@@ -234,13 +233,6 @@ class EncoderRun : public ComponentRun {
     change(record);
     return set(OMX_IndexParamVideoAvc, record);
   }
-  // Configurations, on the port that wrappers use.
-  template <typename Record, typename Value>
-  android::status_t change(OMX_INDEXTYPE index, Value Record::*field, std::type_identity_t<Value> value) {
-    Record record = makeRecord<Record>(kOutputPort);
-    record.*field = value;
-    return setConfig(index, record);
-  }
 
   // One picture in the device's layout, and its access unit.
   Output& encode(const Picture& picture) {
@@ -249,22 +241,7 @@ class EncoderRun : public ComponentRun {
     awaitOutputs(before + 1);
     return outputs.back();
   }
-  // Pictures of the scene from where it was.
-  void encodeScene(uint32_t width, uint32_t height, uint32_t count) {
-    for (uint32_t i = 0; i < count; ++i) encode(scene(width, height, _next++));
-  }
-  // Where in the outputs the key frames are, by their flags.
-  std::vector<size_t> keyFrames() const {
-    std::vector<size_t> found;
-    for (size_t i = 0; i < outputs.size(); ++i) {
-      if ((outputs[i].flags & OMX_BUFFERFLAG_SYNCFRAME) != 0) found.push_back(i);
-    }
-    return found;
-  }
   std::vector<Unit> units() const { return {outputs.begin(), outputs.end()}; }
-
- private:
-  uint32_t _next = 0;
 };
 
 // Size, bytes and, unless told otherwise, time stamp of every picture.

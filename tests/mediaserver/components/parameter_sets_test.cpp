@@ -8,14 +8,6 @@ namespace {
 
 using namespace mediaserver;  // NOLINT(google-build-using-namespace): everything here is about it
 
-TEST(AnnexB, FindsUnitsBetweenStartCodes) {
-  using Nals = std::vector<std::vector<uint8_t>>;
-  for (const std::vector<uint8_t>& none : Nals{{}, {0, 0}, {0, 0, 1}}) EXPECT_EQ(nals(none), Nals{});
-  EXPECT_EQ(nals({9, 9, 0, 0, 1, 5, 0, 0, 0, 1, 6, 7, 0, 0}), (Nals{{5}, {6, 7}}));
-  EXPECT_EQ(nals({0, 0, 1, 0, 0, 1, 0, 0, 0, 1, 8, 1, 1}), (Nals{{8, 1, 1}}));
-  EXPECT_EQ(nals({0, 0, 0, 0, 1, 2, 0, 1, 0, 0, 2}), (Nals{{2, 0, 1, 0, 0, 2}}));
-}
-
 TEST(SequenceSet, IsReadAsTheEncoderWroteItAndRaisedToAHigherProfile) {
   const std::string everything =
       "nal-hrd=vbr:vbv-maxrate=200:vbv-bufsize=100:cqm=jvt:overscan=show:colorprim=bt709:chromaloc=1:sar=40/"

@@ -67,12 +67,8 @@ uint8_t* Picture::plane(int index) {
 
 Picture scene(uint32_t width, uint32_t height, uint32_t number) {
   Picture picture(width, height);
-  const uint32_t ballX = number * 5 % width, ballY = number * 3 % height;
-  for (uint32_t i = 0; i < width * height; ++i) {
-    const uint32_t x = i % width, y = i / width;
-    const bool ball = x - ballX < 24 && y - ballY < 24;
-    picture.bytes[i] = ball ? texture(x - ballX + 500, y - ballY + 900) : texture(x + 2 * number, y + number);
-  }
+  for (uint32_t i = 0; i < width * height; ++i)
+    picture.bytes[i] = texture(i % width + 2 * number, i / width + number);
   const uint32_t columns = picture.chromaWidth(), samples = columns * picture.chromaHeight();
   for (uint32_t i = 0; i < 2 * samples; ++i) {
     const uint32_t x = i % columns, y = i % samples / columns, plane = i / samples;
@@ -81,23 +77,12 @@ Picture scene(uint32_t width, uint32_t height, uint32_t number) {
   return picture;
 }
 
-std::vector<uint8_t> packInput(const Picture& picture, PictureLayout layout, uint32_t pitch) {
-  if (pitch == 0) pitch = picture.width;
-  const bool aligned = layout == PictureLayout::SemiPlanarAligned;
-  const size_t luma = size_t{pitch} * picture.height;
-  std::vector<uint8_t> bytes(roundUp(luma, aligned ? 2048 : 1) + luma / 2);
-  uint8_t* const chroma = bytes.data() + bytes.size() - luma / 2;
-  for (size_t y = 0; y < picture.height; ++y) {
-    std::copy_n(picture.plane(0) + y * picture.width, picture.width, &bytes[y * pitch]);
-  }
-  for (const int plane : {1, 2}) {
-    const uint8_t* from = picture.plane(plane);
-    for (size_t y = 0; y < picture.chromaHeight(); ++y) {
-      for (size_t x = 0; x < picture.chromaWidth(); ++x) {
-        chroma[y * pitch + 2 * x + (plane == 2 ? 1 : 0)] = *from++;
-      }
-    }
-  }
+std::vector<uint8_t> packInput(const Picture& picture, PictureLayout layout) {
+  const size_t samples = picture.luma().size() / 4;
+  const size_t chroma = roundUp(4 * samples, layout == PictureLayout::SemiPlanarAligned ? 2048 : 1);
+  std::vector<uint8_t> bytes(chroma + 2 * samples);
+  std::copy_n(picture.plane(0), 4 * samples, bytes.begin());
+  for (size_t i = 0; i < 2 * samples; ++i) bytes[chroma + i] = picture.plane(i % 2 == 0 ? 1 : 2)[i / 2];
   return bytes;
 }
 

@@ -31,8 +31,8 @@ struct Picture {
 // Picture `number` of a scene with texture that moves; the same for the same arguments.
 Picture scene(uint32_t width, uint32_t height, uint32_t number);
 
-// As an encoder's client sends it. `pitch` counts for the TI layout alone.
-std::vector<uint8_t> packInput(const Picture& picture, omxhost::PictureLayout layout, uint32_t pitch = 0);
+// As an encoder's client sends it; of an even size.
+std::vector<uint8_t> packInput(const Picture& picture, omxhost::PictureLayout layout);
 
 // The visible picture in a decoder's output.
 Picture unpackOutput(const std::vector<uint8_t>& bytes, omxhost::PictureLayout layout, uint32_t frameWidth,
