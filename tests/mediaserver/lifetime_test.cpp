@@ -11,24 +11,21 @@
 namespace omxtest {
 namespace {
 
-using android::omx_message;
 using NodeId = android::IOMX::node_id;
 using BufferId = android::IOMX::buffer_id;
 constexpr auto kAllPorts = static_cast<OMX_S32>(OMX_ALL);
 
-// Counts what arrives, can stop a delivery, and can free its node from inside one.
+// Counts what arrives, and stops a delivery until it may go on.
 class SlowObserver : public android::BnOMXObserver {
  public:
-  void onMessage(const omx_message& message) override {
+  void onMessage(const android::omx_message& /*message*/) override {
     ++begun;
     EXPECT_TRUE(eventually([this] { return goOn.load(); }));
-    EXPECT_TRUE(freeing == nullptr || freeing->freeNode(message.node) == android::OK);
     ++ended;
   }
   std::atomic<int> begun{0};
   std::atomic<int> ended{0};
   std::atomic<bool> goOn{false};
-  android::sp<android::IOMX> freeing;
 };
 
 class Lifetime : public NodeTest {
@@ -48,19 +45,12 @@ class Lifetime : public NodeTest {
 };
 
 TEST_F(Lifetime, WrongNamesIdsAndArgumentsAreRefused) {
-  android::List<android::IOMX::ComponentInfo> list;
-  list.push_back({});
-  ASSERT_EQ(server->listNodes(&list), android::OK);
-  EXPECT_EQ(list.size(), 2u);
-  EXPECT_STREQ(list.begin()->mName.string(), kDecoder);
-  EXPECT_EQ(server->listNodes(nullptr), kUnknownError);
   const android::sp<CollectingObserver> observer = new CollectingObserver;
   for (const char* name : {"Decoder", "decode", static_cast<const char*>(nullptr), kDecoder}) {
     NodeId none = this;
     EXPECT_EQ(server->allocateNode(name, name != kDecoder ? observer : nullptr, &none), kUnknownError);
     EXPECT_EQ(none, nullptr);
   }
-  EXPECT_EQ(server->allocateNode(kDecoder, observer, nullptr), kUnknownError);
   EXPECT_EQ(decoder.liveCodecs(), 0u);
 
   const auto node = running();
@@ -131,15 +121,6 @@ TEST_F(Lifetime, NothingIsDeliveredOnceFreeNodeHasReturnedAndSlownessIsNobodyEls
   freeing.join();
   EXPECT_EQ(observer->begun, observer->ended);
   EXPECT_EQ(observer->getStrongCount(), 1) << "nobody is left who could call";
-
-  // A node that is freed from inside its own delivery.
-  observer->freeing = server;
-  ASSERT_EQ(server->allocateNode(kDecoder, observer, &node), android::OK);
-  const int ended = observer->ended;
-  server->sendCommand(node, OMX_CommandFlush, kAllPorts);
-  EXPECT_TRUE(eventually([&] { return observer->ended > ended && observer->getStrongCount() == 1; }));
-  EXPECT_EQ(server->nodeCount(), 1u);
-  observer->freeing = nullptr;
 }
 
 }  // namespace

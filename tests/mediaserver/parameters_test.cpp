@@ -23,9 +23,7 @@ TEST_F(Parameters, ADefinitionTakesWhatClientsMayWriteAndKeepsTheRest) {
   wanted.nSize = 0;  // Kept: some clients send no size
   wanted.eDir = OMX_DirOutput;
   wanted.bEnabled = OMX_FALSE;
-  wanted.bPopulated = OMX_TRUE;
   wanted.nBufferCountMin = 7;
-  wanted.nBufferAlignment = 4096;
   wanted.nBufferCountActual = expected.nBufferCountActual = 3;
   auto& video = wanted.format.video;
   video.nFrameWidth = 64;
@@ -41,9 +39,6 @@ TEST_F(Parameters, ADefinitionTakesWhatClientsMayWriteAndKeepsTheRest) {
 
   wanted = expected;
   wanted.format.video.nFrameWidth = 32;
-  wanted.format.video.eCompressionFormat = OMX_VIDEO_CodingRV;
-  EXPECT_EQ(node->define(kInputPort, wanted), kUnsupported);
-  wanted.format.video.eCompressionFormat = expected.format.video.eCompressionFormat;
   wanted.nBufferCountActual = 0;
   EXPECT_EQ(node->define(kInputPort, wanted), kUnknownError);
   EXPECT_TRUE(inputIs(expected)) << "nothing of it was taken";

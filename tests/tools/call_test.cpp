@@ -54,17 +54,20 @@ TEST_P(CallOn, WritesAStreamThatDecodesToThePicturesItWrote) {
   EXPECT_EQ(directory.names().size(), 3U);
 }
 
-// Pictures 0 to 59 as configured, a key frame at 30; then half as many pictures; then turned on their side.
+// Pictures 0 to 59 as configured, a key frame at 30 and from there on three times the bits; then half as many
+// pictures; then turned on their side.
 TEST_P(CallOn, CarriesOutChangesAtThePictureTheyAreMeantFor) {
   const TemporaryDirectory directory;
   const std::string pictures = directory.file("a.y4m");
-  const json figures = report({"call",     "-d",   GetParam(), "-s",        "200x120", "-n",    "120",
-                               "-b",       "200k", "--at",     "2s",        "fps=15",  "--at",  "1s",
-                               "keyframe", "--at", "3000ms",   "rotate=90", "-o",      pictures});
+  const json figures =
+      report({"call",   "-d",        GetParam(), "-s",     "200x120", "-n", "120",         "-b",
+              "200k",   "--at",      "2s",       "fps=15", "--at",    "1s", "keyframe",    "--at",
+              "3000ms", "rotate=90", "-o",       pictures, "--at",    "1s", "bitrate=600k"});
   EXPECT_EQ(figures["frames_in"], 90);
   EXPECT_EQ(figures["frames_dropped"], 0);
   EXPECT_EQ(figures["key_frames"], json({0, 30, 75}));
   EXPECT_EQ(figures["changes"][0], json({{"seconds", 1.0}, {"change", "keyframe"}}));
+  EXPECT_NEAR(figures["bitrate_reached"], 500'000, 100'000);
   EXPECT_GE(figures["psnr_y"], leastPsnr) << "compared with pictures turned in the same way";
   EXPECT_EQ(picturesIn(pictures, 200 * 120 * 3 / 2), 90);
 }

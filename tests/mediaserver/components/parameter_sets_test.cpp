@@ -1,4 +1,4 @@
-// Byte streams, parameter sets and levels by themselves.
+// Parameter sets and levels by themselves.
 
 #include "host/mediaserver/components/sequence_set.h"
 #include "tests/mediaserver/components/component_run.h"
@@ -12,14 +12,12 @@ TEST(SequenceSet, IsReadAsTheEncoderWroteItAndRaisedToAHigherProfile) {
   const std::string everything =
       "nal-hrd=vbr:vbv-maxrate=200:vbv-bufsize=100:cqm=jvt:overscan=show:colorprim=bt709:chromaloc=1:sar=40/"
       "33";
-  const std::tuple<std::string, int, uint32_t, uint32_t> cases[] = {
-      {"profile=main bf=1 refs=2", 77, 2, 1},
-      {"bf=3 b-pyramid=normal refs=4 b=100000 x264-params=" + everything, 100, 4, 2}};
-  for (const auto& [options, profile, references, reorder] : cases) {
-    const std::vector<uint8_t> nal = nals(encode("libx264", options, scenes(98, 54, 2))[0].bytes).at(0);
+  for (const std::string& options :
+       {std::string("profile=main refs=4"), "refs=4 b=100000 x264-params=" + everything}) {
+    const std::vector<Unit> units = encode("libx264", options + " bf=3 b-pyramid=normal", scenes(98, 54, 2));
+    const std::vector<uint8_t> nal = nals(units[0].bytes).at(0);
     const SequenceSet set = readSequenceSet(nal).value();
-    EXPECT_TRUE(set.profileIdc == profile && set.macroblocks == 28U && set.referenceFrames == references);
-    EXPECT_EQ(set.reorderFrames, std::optional(reorder));
+    EXPECT_TRUE(set.macroblocks == 28U && set.referenceFrames == 4U && set.reorderFrames == 2U);
     std::vector<uint8_t> raised;
     appendSequenceSet(nal, kProfileHigh, &raised);
     SequenceSet again = readSequenceSet(nals(raised).at(0)).value();
