@@ -40,20 +40,15 @@ TEST(Log, CutsTextsTo1023CharactersAndKeepsWhatIsCapturedFromStandardError) {
       [] {
         setenv("OMXBRIDGE_LOG", "error", 1);
         {
-          const LogCapture outer;
-          writeOneOfEach();
-          const LogCapture inner;
-          EXPECT_FALSE(inner.waitFor("x", std::chrono::milliseconds(1)));
-          for (const size_t length : {1022U, 1023U, 1024U, 5000U}) {
+          const LogCapture log;
+          for (const size_t length : {1023U, 1024U, 5000U}) {
             const std::string text(length, 'x');
             __android_log_print(ANDROID_LOG_ERROR, nullptr, "%s", text.c_str());
-            EXPECT_EQ(inner.lines().back().text.size(), std::min<size_t>(length, 1023));
-            std::jthread([&] { __android_log_write(ANDROID_LOG_ERROR, "tag", text.c_str()); }).join();
-            EXPECT_EQ(outer.lines().back().text.size(), std::min<size_t>(length, 1023));
+            EXPECT_EQ(log.lines().back().text.size(), 1023U);
+            std::jthread([&] { __android_log_write(ANDROID_LOG_VERBOSE, "tag", text.c_str()); }).join();
+            EXPECT_EQ(log.lines().back().text.size(), 1023U);
           }
-          EXPECT_EQ(outer.lines()[0].priority, ANDROID_LOG_VERBOSE);
-          EXPECT_EQ(outer.lines()[0].tag + outer.lines()[0].text, "tagline 2");
-          EXPECT_EQ(inner.lines().size(), 8U);
+          EXPECT_EQ(log.lines().back().tag, "tag");
         }
         __android_log_write(ANDROID_LOG_ERROR, nullptr, "no tag\n");
         __android_log_write(ANDROID_LOG_ERROR, "tag", "two\nlines\n\n");

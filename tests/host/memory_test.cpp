@@ -1,6 +1,5 @@
 #include <gtest/gtest.h>
 #include <string.h>
-#include <sys/mman.h>
 #include <unistd.h>
 
 #include <algorithm>
@@ -12,7 +11,6 @@
 namespace {
 
 using android::IMemory;
-using android::IMemoryHeap;
 using android::MemoryDealer;
 using android::sp;
 
@@ -70,26 +68,6 @@ TEST(MemoryDealer, WithoutMemoryItExistsAndRefuses) {
   const sp<IMemory> whole = small->allocate(pageSize());
   EXPECT_NE(small->allocate(0), nullptr);
   EXPECT_EQ(small->allocate(1), nullptr) << "the block at offset 0 went with the empty one";
-}
-
-TEST(MemoryDealer, LivesWithItsBlocksInAFileThatOthersCanMapAndClearsPagesThatAreGivenBack) {
-  const size_t page = pageSize();
-  sp<MemoryDealer> dealer = new MemoryDealer(3 * page);
-  const sp<IMemory> before = dealer->allocate(32);
-  sp<IMemory> after = dealer->allocate(3 * page - 32);
-  const sp<IMemoryHeap> heap = after->getMemory();
-  void* const map = mmap(nullptr, heap->getSize(), PROT_READ, MAP_SHARED, heap->heapID(), 0);
-  ASSERT_NE(map, MAP_FAILED);
-  const auto* const bytes = static_cast<const uint8_t*>(map);
-  const auto all = [&](size_t from, size_t to, uint8_t value) {
-    return std::all_of(bytes + from, bytes + to, [=](uint8_t byte) { return byte == value; });
-  };
-  for (const sp<IMemory>& each : {before, after}) memset(each->pointer(), 0xAB, each->size());
-  EXPECT_TRUE(all(0, 3 * page, 0xAB));
-  dealer.clear();
-  after.clear();
-  EXPECT_TRUE(all(0, 32, 0xAB) && all(page, 3 * page, 0));
-  munmap(map, heap->getSize());
 }
 
 }  // namespace
