@@ -17,14 +17,8 @@ namespace {
 
 using android::defaultServiceManager;
 using android::IBinder;
-using android::interface_cast;
 using android::sp;
 using android::String16;
-
-class Observer : public android::BnOMXObserver {
- public:
-  void onMessage(const android::omx_message& /*msg*/) override {}
-};
 
 class PlayerService : public android::BnMediaPlayerService {
  public:
@@ -33,17 +27,6 @@ class PlayerService : public android::BnMediaPlayerService {
 
 sp<IBinder> lookUp(const char* name) {
   return defaultServiceManager()->getService(String16(name));
-}
-
-TEST(Interface, IsReachedThroughItsBinderAndThroughNoOther) {
-  const sp<Observer> observer = new Observer();
-  const sp<IBinder> binder = observer->asBinder();
-  EXPECT_EQ(interface_cast<android::IOMXObserver>(binder), observer);
-  EXPECT_EQ(interface_cast<android::IOMX>(binder), nullptr);
-  EXPECT_EQ(interface_cast<android::IOMXObserver>(sp<IBinder>()), nullptr);
-  EXPECT_EQ(binder->getInterfaceDescriptor(), String16("android.hardware.IOMXObserver"));
-  EXPECT_EQ(binder->localBinder()->pingBinder(), android::OK);
-  EXPECT_EQ(observer->getStrongCount(), 2) << "binder and interface are one object with one count";
 }
 
 TEST(ServiceManager, FindsReplacesListsAndRemoves) {

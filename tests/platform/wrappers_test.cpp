@@ -17,12 +17,17 @@ TEST(HardwareBaseVersionTest, FollowsThePropertyAndThenTheBuildId) {
     std::optional<std::string> buildId;
     int version;
   } cases[] = {
-      {"omap4430", std::nullopt, HW_VERSION_OMAP4},  {"OMAP4", "7630", HW_VERSION_OMAP4},
-      {"omap3630", "7630", HW_VERSION_MSM7X30},      {"omap3630", std::nullopt, HW_VERSION_UNKNOWN},
-      {"msm7x30", "7x30B-SCAQ", HW_VERSION_MSM7X30}, {"msm7x30", "7631", HW_VERSION_QCOM_OTHER},
-      {"msm7x30", "7640", HW_VERSION_QCOM_OTHER},    {"msm7x30", "8255", HW_VERSION_MSM8X55},
-      {"msm8660", "8260\n", HW_VERSION_MSM8X60},     {"msm8960", "8960", HW_VERSION_MSM8X60},
-      {"msm8960", "9960", HW_VERSION_QCOM_OTHER},    {"msm8960", "866", HW_VERSION_UNKNOWN},
+      {"OMAP4", "7630", HW_VERSION_OMAP4},
+      {"omap3630", "7630", HW_VERSION_MSM7X30},
+      {"omap3630", std::nullopt, HW_VERSION_UNKNOWN},
+      {"msm7x30", "7x30B-SCAQ", HW_VERSION_MSM7X30},
+      {"msm7x30", "7631", HW_VERSION_QCOM_OTHER},
+      {"msm7x30", "7640", HW_VERSION_QCOM_OTHER},
+      {"msm7x30", "8255", HW_VERSION_MSM8X55},
+      {"msm8660", "8260\n", HW_VERSION_MSM8X60},
+      {"msm8960", "8960", HW_VERSION_MSM8X60},
+      {"msm8960", "9960", HW_VERSION_QCOM_OTHER},
+      {"msm8960", "866", HW_VERSION_UNKNOWN},
   };
   for (const auto& each : cases) {
     property_set("ro.board.platform", each.property);
@@ -70,10 +75,6 @@ TEST_F(QcomWrapper, ConfiguresAnEncoderStepByStep) {
             }));
   EXPECT_EQ(words(calls[9].record),
             (Words{20, kVersion, 1, OMX_Video_ControlRateVariableSkipFrames, 500000}));
-  webrtc::VideoCodec codec = settings();
-  codec.codecType = webrtc::kVideoCodecOther;  // has no H.264 settings
-  ASSERT_EQ(createEncoder(codec), 0);
-  EXPECT_EQ(settingCalls().size(), calls.size() - 2);
 }
 
 using AvcSettings = EitherWrapper;
@@ -84,9 +85,8 @@ TEST_P(AvcSettings, FollowTheApplicationButOnAnMsm7x30) {
   // As the application says; nPFrames, eProfile, CABAC and 8x8 as they are written.
   const std::pair<webrtc::VideoCodecH264, Words> cases[] = {
       {{{}, 66, 30, {}, 0, 0, 0}, {29, 1, 0, 0}},
-      {{{}, 100, 0, {}, 0, 1, 1}, {0xFFFF, 8, 1, 1}},  // no further key frames
-      {{{}, 88, INT32_MIN, {}, 0, 0, 0}, {0x7FFFFFFF, own, 0, 0}},
-      {{{}, 77, 1, {}, 0, 0xC8, 0x80}, {0, 2, 0xC8, 0x80}}};  // flags other than 1
+      {{{}, 100, 0, {}, 0, 1, 1}, {0xFFFF, 8, 1, 1}},                            // no further key frames
+      {{{}, 88, INT32_MIN, {}, 0, 0xC8, 0x80}, {0x7FFFFFFF, own, 0xC8, 0x80}}};  // flags other than 1
   script().answer(OMX_IndexParamVideoAvc, patternRecord<108>(1));
   ASSERT_EQ(createEncoder(), 0);
   for (auto [h264, written] : cases) {
@@ -117,20 +117,19 @@ constexpr auto kTiSemiPlanar = static_cast<OMX_COLOR_FORMATTYPE>(0x7F000100);
 TEST_F(TiWrapper, ConfiguresAnEncoderStepByStep) {
   script().answer(OMX_IndexParamVideoAvc, patternRecord<108>(1));
   script().answer(OMX_IndexParamVideoProfileLevelCurrent, patternRecord<24>(1));
-  // Near misses in front of the match: another coding, a colour besides the coding.
-  script().setFormats(1, {{OMX_VIDEO_CodingH263, OMX_COLOR_FormatUnused},
-                          {OMX_VIDEO_CodingAVC, OMX_COLOR_FormatYUV420SemiPlanar},
+  // A near miss in front of the match.
+  script().setFormats(1, {{OMX_VIDEO_CodingAVC, OMX_COLOR_FormatYUV420SemiPlanar},
                           {OMX_VIDEO_CodingAVC, OMX_COLOR_FormatUnused}});
   webrtc::VideoCodec codec = settings();
   codec.width = 180;
   codec.codecSpecific.H264.entropyCoding = 0xC8;
   ASSERT_EQ(createEncoder(codec), 0);
   std::vector<Call> calls = settingCalls();
-  ASSERT_EQ(calls.size(), 17U);
+  ASSERT_EQ(calls.size(), 16U);
   EXPECT_EQ(calls[1].record, calls[0].record) << "the input's format is confirmed as it is";
-  for (const size_t i : {0U, 1U, 2U}) EXPECT_EQ(words(calls[2 + i].record)[3], i);
-  EXPECT_EQ(calls[5].record, calls[4].record) << "the output's third format is the one looked for";
-  calls.erase(calls.begin() + 2, calls.begin() + 4);
+  for (const size_t i : {0U, 1U}) EXPECT_EQ(words(calls[2 + i].record)[3], i);
+  EXPECT_EQ(calls[4].record, calls[3].record) << "the output's second format is the one looked for";
+  calls.erase(calls.begin() + 2);
   EXPECT_EQ(calls[5].record, edited<Definition>(calls[4], [](Definition& definition) {
               definition.nBufferSize = 180 * 144 * 3 / 2;
               auto& video = definition.format.video;
@@ -164,7 +163,6 @@ TEST_F(TiWrapper, ConfiguresAnEncoderStepByStep) {
 
   script().setFormats(1, {{OMX_VIDEO_CodingH263, OMX_COLOR_FormatUnused}});
   EXPECT_EQ(createEncoder(), -1);
-  EXPECT_EQ(settingCalls().size(), 4U);  // up to the list's end
 }
 
 TEST_F(TiWrapper, ComputesOnSignedWordsAndMapsProfilesAndRates) {
@@ -181,20 +179,12 @@ TEST_F(TiWrapper, ComputesOnSignedWordsAndMapsProfilesAndRates) {
     EXPECT_EQ(words(calls[9].record)[14], word);
     EXPECT_EQ(words(calls[11].record)[3], word);
   }
-  const std::tuple<uint16_t, uint16_t, OMX_U32, OMX_S32> sizes[] = {
-      {3, 1, 4, 16},                       // 9 halved
-      {40000, 20000, 0xC7868C00, 40000},   // 2400000000 as a signed word, halved
-      {65535, 65535, 0xFFFD0001, 65536}};  // wrapped
-  for (const auto& [width, height, bytes, stride] : sizes) {
-    webrtc::VideoCodec codec = settings();
-    codec.width = width;
-    codec.height = height;
-    omx().clearCalls();
-    static_cast<void>(encoder().configureEncoder(&codec));  // the component may refuse such a size
-    const auto definition = settingCalls().at(5).as<Definition>();
-    EXPECT_EQ(definition->nBufferSize, bytes);
-    EXPECT_EQ(definition->format.video.nStride, stride);
-  }
+  webrtc::VideoCodec codec = settings();
+  codec.width = 40000;
+  codec.height = 20000;
+  omx().clearCalls();
+  static_cast<void>(encoder().configureEncoder(&codec));  // the component may refuse such a size
+  EXPECT_EQ(settingCalls().at(5).as<Definition>()->nBufferSize, 0xC7868C00) << "half of a negative word";
 }
 
 TEST_F(TiWrapper, ChoosesTheDecodersOwnOutputLayout) {
@@ -212,8 +202,6 @@ TEST_F(TiWrapper, ChoosesTheDecodersOwnOutputLayout) {
               definition.format.video.eCompressionFormat = OMX_VIDEO_CodingUnused;
               definition.format.video.eColorFormat = kTiSemiPlanar;
             }));
-  EXPECT_EQ(decoder().setInputPackingFormat(1), 0);  // without a call
-  EXPECT_EQ(omx().count(), 9U);
 }
 
 struct Item {
@@ -227,7 +215,6 @@ const std::vector<Item> kQcomItems = {
     {CONFIG_BITRATE, 500000, 0x06000011, {16, kVersion, 1, 500000}},
     // The size word is the rate as a float.
     {CONFIG_FRAMERATE, 15, 0x06000012, {0x41700000, kVersion, 1, 0x000F0000}},
-    {CONFIG_FRAMERATE, 0xFFFFFFFF, 0x06000012, {0x4F800000, kVersion, 1, 0xFFFF8000}},  // saturates
     {CONFIG_INTRA_PERIOD, 30, 0x7F000007, {24, kVersion, 1, 1, 29, 0}},
     {CONFIG_INTRA_PERIOD, 0, 0x7F000007, {24, kVersion, 1, 1, 0xFFFFFFFF, 0}},
     {CONFIG_REQUEST_IFRAME, 77, 0x06000013, {16, kVersion, 1, 1}},
@@ -238,7 +225,6 @@ const std::vector<Item> kTiItems = {
     {CONFIG_BITRATE, 500000, 0x06000011, {16, kVersion, 1, 500000}},
     {CONFIG_FRAMERATE, 15, 0x06000012, {16, kVersion, 0, 0x000F0000}},  // of the input port
     {CONFIG_FRAMERATE, 1, 0x06000012, {16, kVersion, 0, 0x00020000}},
-    {CONFIG_FRAMERATE, 65537, 0x06000012, {16, kVersion, 0, 0x00010000}},
     {CONFIG_REQUEST_IFRAME, 77, 0x06000013, {16, kVersion, 1, 1}},
     {CONFIG_ROTATION, 270, 0x0700000B, {16, kVersion, 1, 270}},
 };
@@ -259,13 +245,9 @@ TEST_P(RuntimeItems, AreOneRecordEach) {
     EXPECT_EQ(words(calls[0].record), item.record);
   }
   omx().clearCalls();
-  for (const int type : {5, 6, 0x7FFFFFFF}) {
-    EXPECT_EQ(encoder().setConfig(static_cast<CONFIGTYPE>(type), 1), OMXI_ERR_SET_CONFIG);
-  }
-  if (isTi) {
-    EXPECT_EQ(encoder().setConfig(CONFIG_INTRA_PERIOD, 30), 0);  // without a call
-    EXPECT_EQ(omx().count(), 0U);
-  }
+  EXPECT_EQ(encoder().setConfig(static_cast<CONFIGTYPE>(6), 1), OMXI_ERR_SET_CONFIG);
+  EXPECT_TRUE(!isTi || encoder().setConfig(CONFIG_INTRA_PERIOD, 30) == 0);
+  EXPECT_EQ(omx().count(), 0U);
   EXPECT_EQ(log(), LogLines());
 }
 

@@ -42,14 +42,13 @@ class Fields {
 
 constexpr int kHigh = 100;
 
-// 6 bits of frame number, order type 0 with 8 bits; `interlaced` allows fields; 25 frames a second.
-std::string sps(bool interlaced = false, uint32_t profile = 66) {
+// 6 bits of frame number, order type 0 with 8 bits, 25 frames a second.
+std::string sps(uint32_t profile = 66) {
   Fields bits;
   bits.u(8, profile).u(8, 0).u(8, 31).ue(0);
   if (profile == kHigh)
     bits.ue(1).ue(0).ue(0).u(1, 0).u(1, 1).u(1, 1).ue(3).ue(20).u(7, 0);  // a scaling list: 2 more, 10 less
-  bits.ue(2).ue(0).ue(4).ue(1).u(1, 0).ue(10).ue(8).u(1, interlaced ? 0 : 1);
-  if (interlaced) bits.u(1, 0);
+  bits.ue(2).ue(0).ue(4).ue(1).u(1, 0).ue(10).ue(8).u(1, 1);
   bits.u(1, 1).u(1, 0);
   bits.u(1, 1).u(4, 0).u(1, 1).u(32, 1).u(32, 50).u(1, 1);  // timing
   return bits.nal(0x67);
@@ -63,29 +62,20 @@ struct Slice {
   uint32_t frame = 0, order = 0, pps = 0;
   std::optional<uint32_t> idr{};  // its id
   bool reference = true;
-  std::optional<uint32_t> field{};  // 0 top, 1 bottom; only with interlaced parameters
-  bool interlaced = field.has_value();
 };
 
 std::string slice(const Slice& fields, uint32_t first) {
   Fields bits;
   bits.ue(first).ue(7).ue(fields.pps).u(6, fields.frame);
-  if (fields.interlaced) bits.u(1, fields.field ? 1 : 0);
-  if (fields.field) bits.u(1, *fields.field);
   if (fields.idr) bits.ue(*fields.idr);
   bits.u(8, fields.order).u(16, 0xFFFF);
   return bits.nal(fields.idr ? 0x65 : fields.reference ? 0x61 : 0x01);
 }
 
-const std::map<char, std::string> kOthers = {{'S', sps()},
-                                             {'H', sps(false, kHigh)},
-                                             {'F', sps(true)},
-                                             {'P', pps()},
-                                             {'Q', pps(1)},
-                                             {'D', "\x09\xF0"},
-                                             {'M', std::string("\x06\x05\x01\x80", 4)},
-                                             {'X', "\x6E\x80\x80"},
-                                             {'E', "\x0A"}};
+const std::map<char, std::string> kOthers = {{'S', sps()},          {'H', sps(kHigh)},
+                                             {'P', pps()},          {'Q', pps(1)},
+                                             {'D', "\x09\xF0"},     {'M', std::string("\x06\x05\x01\x80", 4)},
+                                             {'X', "\x6E\x80\x80"}, {'E', "\x0A"}};
 const std::map<char, Slice> kSlices = {{'i', {.idr = 0}},
                                        {'j', {.idr = 1}},
                                        {'k', {.pps = 1, .idr = 0}},
@@ -93,13 +83,10 @@ const std::map<char, Slice> kSlices = {{'i', {.idr = 0}},
                                        {'b', {.frame = 2, .order = 4}},
                                        {'m', {.order = 2, .reference = false}},
                                        {'n', {.order = 4, .reference = false}},
-                                       {'z', {}},
-                                       {'t', {.idr = 0, .field = 0}},
-                                       {'u', {.order = 1, .field = 1}},
-                                       {'w', {.frame = 1, .order = 2, .interlaced = true}}};
+                                       {'z', {}}};
 
 // The units of a stream, with start codes of either length in turn. A letter stands for each NAL unit: small
-// ones for slices, with the first macroblock behind them; S, H and F sequence parameters, P and Q picture
+// ones for slices, with the first macroblock behind them; S and H sequence parameters, P and Q picture
 // parameters, D a delimiter, M a message, X a prefix, E the end of a sequence. Bars lie between units.
 std::vector<std::string> units(const std::string& text) {
   std::vector<std::string> result(1);
@@ -155,7 +142,6 @@ TEST(AccessUnits, EndWhereThePictureEnds) {
       {"prefixes before each slice", "S P X i X i9 | X a | X M b"},
       {"end of sequence", "S P i E | S P i"},
       {"a scaling list", "H P i | a a5"},
-      {"fields", "F P t | u | w"},
   };
   for (const auto& [name, stream] : cases) {
     const std::vector<std::string> expected = units(stream);

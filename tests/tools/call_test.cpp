@@ -101,17 +101,6 @@ TEST(Call, RecoversFromLossesTheSameWayEveryTimeAndReportsThem) {
   EXPECT_TRUE(contentOf(snapshot).starts_with("\x89PNG"));
 }
 
-TEST(Call, GoesOnWithACutInputAndSaysSo) {
-  const TemporaryDirectory directory;
-  report({"call", "-s", "64x48", "-n", "9", "-o", directory.file("a.y4m")});
-  const std::string content = contentOf(directory.file("a.y4m"));
-  const std::string cut = directory.write("cut.y4m", content.substr(0, content.size() - 100));
-  const Ended run = runTool({"call", cut});
-  EXPECT_EQ(run.exitCode, kInput);
-  EXPECT_TRUE(contains(run.err, "cut.y4m: ends in the middle of picture 8")) << run.err;
-  EXPECT_TRUE(contains(run.out, "Decoded        8")) << run.out;
-}
-
 TEST(Call, EndsCleanlyAtCtrlC) {
   const TemporaryDirectory directory;
   const std::string output = directory.file("a.y4m");
@@ -156,8 +145,10 @@ TEST(Decode, TakesDamageAndReportsPicturesThatChangeTheirSize) {
 
   std::string damaged = large;
   for (size_t i = damaged.size() / 4; i < damaged.size(); i += 97) damaged[i] = static_cast<char>(i);
-  const Ended run = runTool({"decode", directory.write("damaged.264", damaged), "--json"});
+  const Ended run = runTool({"decode", directory.write("damaged.264", damaged + small), "--json"});
   EXPECT_TRUE(run.exitCode == 0 || run.exitCode == kInput) << run.err;
+  const json after = json::parse(run.out, nullptr, false);
+  EXPECT_GE(after["frames_decoded"], 20) << "what comes behind the damage is not lost";
 }
 
 }  // namespace

@@ -53,9 +53,7 @@ TEST(CommandLine, NamesWhatItDoesNotUnderstandOrFindsWrong) {
   } cases[] = {
       {{}, kUsage, "subcommand is required"},
       {{"call", "--loud"}, kUsage, "--loud"},
-      {{"call", "a", "b"}, kUsage, "b"},
       {{"call", "--size", "640"}, kUsage, "\"640\" is not a size as 640x480"},
-      {{"call", "--fps", "0"}, kUsage, "\"0\" is not a rate"},
       {{"call", "--bitrate", "1G"}, kUsage, "\"1G\" is not a rate from 1k to 1000M"},
       {{"call", "--frames", "99999999999999999999"}, kUsage, "is not a number from 1 on"},
       {{"call", "--device", "nokia"}, kUsage, "no device \"nokia\"; there are msm7x30, "},
@@ -64,11 +62,8 @@ TEST(CommandLine, NamesWhatItDoesNotUnderstandOrFindsWrong) {
       {{"call", "--at", "soon", "keyframe"}, kUsage, "\"soon\" is not a time as 3s"},
       {{"call", "--at", "3s", "rotate=45"}, kUsage, "\"rotate=45\" is not a change as bitrate=300k"},
       {{"call", "--loss", "101%"}, kUsage, "is not a share of packets"},
-      {{"call", "--delay", "11s"}, kUsage, "is not a time up to 10s"},
-      {{"decode"}, kUsage, "INPUT is required"},
       {{"call", text}, kInput, "notes.txt"},
       {{"call", empty}, kInput, "empty"},
-      {{"call", "-"}, kInput, "standard input"},
       {{"call", directory.file("")}, kInput, directory.file("")},
       {{"call", "-o", "/dev/full"}, kOutput, "/dev/full"},
       {{"call", "--at", "1s", "fps=60"}, kUsage, "fps=60 is more than the input has"},
@@ -76,10 +71,7 @@ TEST(CommandLine, NamesWhatItDoesNotUnderstandOrFindsWrong) {
       {{"call", "-s", "8192x16", "-n", "1"}, kDevice, "8192x16"},
       {{"convert", small, "--cut", "96x96"}, kUsage, "is larger than the picture, which is 64x48"},
       {{"convert", small, "--scale", "33x32"}, kUsage, "\"33x32\" is not an even size"},
-      {{"convert", small, "--rotate", "45"}, kUsage, "\"45\" is not 0, 90, 180 or 270"},
       {{"compare", small, large}, kInput, "the pictures differ in size, 64x48 and 96x64"},
-      {{"compare", "-", "-"}, kUsage, "only one of the two"},
-      {{"call", large, "-s", "96x64"}, kInput, "leave --size out"},
       {{"encode", large, "-o", "/dev/full", "--format", "mp4"}, kOutput, "/dev/full: no space left"},
   };
   for (const auto& each : cases) {

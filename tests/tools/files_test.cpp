@@ -53,9 +53,7 @@ TEST(FrameSource, SaysWhatIsWrongWithAnInput) {
       {"YUV4MPEG2 " + std::string(5000, 'x'), {}, "", "no end of its Y4M header"},
       {"YUV4MPEG2 W4\n", {}, "", "no picture size"},
       {"YUV4MPEG2 W4 H-2\n", {}, "", "bad header word \"H-2\""},
-      {"YUV4MPEG2 W4 H99999999999\n", {}, "", "bad header word"},
       {"YUV4MPEG2 W8192 H8194\n", {}, "", "bad header word \"H8194\""},
-      {"YUV4MPEG2 W4 H2 F30:0\n", {}, "", "bad header word \"F30:0\""},
       {"YUV4MPEG2 W4 H2 C422\n", {}, "", "yuv420p"},
       {"YUV4MPEG2 W5 H2 F30:1\n", {}, "", "5x2 is an odd size"},
   };

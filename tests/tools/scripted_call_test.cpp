@@ -4,7 +4,6 @@
 
 #include <algorithm>
 #include <functional>
-#include <thread>
 
 #include <omxhost/log.h>
 
@@ -136,20 +135,6 @@ TEST(ScriptedCall, DropsInRealTimeWhatFindsNoFreeBuffer) {
   EXPECT_EQ(figures.framesDecoded + figures.framesDropped(), 30U);
   EXPECT_EQ(figures.framesOutOfOrder, 0U);
   EXPECT_EQ(figures.psnr, 100);
-}
-
-TEST(ScriptedCall, EndsEarlyWhileItWaitsForABuffer) {
-  CallRig rig;
-  rig.server.encoder().holdInput();
-  const std::jthread stopper([&rig] {
-    EXPECT_TRUE(rig.server.omx().waitForCalls(omxtest::Method::EmptyBuffer, 4));  // all buffers
-    rig.enough.request_stop();
-    rig.server.encoder().passInput();
-  });
-  GraySource source(1000);
-  const CallFigures figures = rig.figures(source);
-  EXPECT_GE(figures.framesDecoded, 4U);
-  EXPECT_EQ(figures.framesDropped(), 0U);
 }
 
 TEST(ScriptedCall, FailsWithAMessageAndLeavesNoFile) {
