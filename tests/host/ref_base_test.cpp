@@ -61,21 +61,6 @@ TEST(StrongPointer, TellsOfTheFirstAndLastReferenceAndTakesTheNewBeforeItDropsTh
   EXPECT_EQ(life.destroyed, 2);
 }
 
-TEST(WeakPointer, PromotesExactlyWhileTheObjectLivesOrBeforeItWasHeld) {
-  Life life;
-  wp<Object> weak;
-  EXPECT_EQ(weak.promote(), nullptr);
-  sp<Object> strong = new Object(&life);
-  weak = strong;
-  EXPECT_EQ(wp<Interface>(strong).promote(), strong);
-  EXPECT_EQ(strong->getStrongCount(), 1);
-  strong.clear();
-  EXPECT_EQ(weak.promote(), nullptr);
-  weak = new Object(&life);
-  EXPECT_NE(weak.promote(), nullptr);
-  EXPECT_TRUE(life.firstRefs == 2 && life.destroyed == 2);
-}
-
 TEST(WeakPointer, PromotionRacesTheLastRelease) {
   for (int round = 0; round < 3000; ++round) {
     Life life;

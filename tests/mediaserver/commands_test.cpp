@@ -80,7 +80,6 @@ TEST_F(Commands, FlushAndIdleReturnWhatThePortsHoldBeforeTheyComplete) {
     EXPECT_EQ(node->command(test.command, test.param), android::OK);
     node->expect(commandComplete(test.command), test.param == OMX_ALL ? 2 : 1);
     EXPECT_EQ(node->heard(), test.heard);
-    for (const Packet& output : node->outputs()) EXPECT_TRUE(output.bytes.empty());
     // What came back can be sent again.
     if (paused) node->complete(OMX_CommandStateSet, OMX_StateExecuting);
     EXPECT_EQ(node->empty(0, "c"), okIf(paused || test.param != kOutputPort));
