@@ -47,6 +47,18 @@ TEST(Encoder, EncodesOnePictureToOneUnitOnEveryDevice) {
   }
 }
 
+// The scene is the same but for its right edge. Rows without a gap are those of the sizes above.
+TEST(Encoder, SkipsTheGapBehindTiRows) {
+  EncoderRun run("omap4", 90, 48);
+  auto input = run.definition(kInputPort);
+  input.format.video.nStride = 96;
+  input.format.video.nSliceHeight = 0;
+  ASSERT_EQ(run.define(kInputPort, input), kOk);
+  run.start();
+  run.encode(scene(96, 48, 0));
+  expectLike(run.units(), {scene(90, 48, 0)}, 28);
+}
+
 TEST(Encoder, TakesSizesThatItCanEncode) {
   // Bytes of a picture; 0: refused.
   const std::tuple<const char*, uint32_t, uint32_t, uint32_t> cases[] = {
