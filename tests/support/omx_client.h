@@ -120,10 +120,6 @@ class OmxClient {
   android::status_t getConfig(OMX_INDEXTYPE index, Record* record) {
     return _omx->getConfig(_node, index, record, sizeof(*record));
   }
-  template <typename Record>
-  android::status_t setConfig(OMX_INDEXTYPE index, const Record& record) {
-    return _omx->setConfig(_node, index, &record, sizeof(record));
-  }
 
   // How buffers of a port are given; default Use.
   void setGiving(OMX_U32 port, Giving giving) { _giving[port] = giving; }

@@ -162,7 +162,6 @@ class ScriptedCodec final : public Codec {
   }
   Received receive(OutputSpace& output) override {
     const Lock lock(_script._mutex);
-    if (_script._outputHeld) return Received::Nothing;
     if (_line.empty()) return std::exchange(_draining, false) ? Received::Drained : Received::Nothing;
     if (_line.front().edit) return Received::NewGeometry;
     const Packet packet = std::move(_line.front().packet);

@@ -69,16 +69,12 @@ class Script {
   }
 
   // The component keeps all inputs (their EMPTY_BUFFER_DONE does not come) until `count` of them are let
-  // go, or all. The same for outputs: what it produces stays inside.
+  // go, or all.
   void holdInput() { releaseInput(0); }
   void releaseInput(std::optional<size_t> count) {
     change([&] { _inputBudget = count; });
   }
   void passInput() { releaseInput({}); }
-  void holdOutput(bool held = true) {
-    change([&] { _outputHeld = held; });
-  }
-  void passOutput() { holdOutput(false); }
 
   // What comes out of an input. An empty result: nothing (a dropped frame). Called on the worker thread.
   // Null: the default.
@@ -138,7 +134,6 @@ class Script {
   std::map<OMX_INDEXTYPE, std::vector<uint8_t>> _answers;
   OMX_ERRORTYPE _startFailure = OMX_ErrorNone;
   std::optional<size_t> _inputBudget;  // how many may pass; no number: all
-  bool _outputHeld = false;
   Transform _transform;
   std::set<ScriptedCodec*> _codecs;
   mediaserver::PortPair _configured{};
