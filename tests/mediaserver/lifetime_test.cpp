@@ -15,17 +15,19 @@ using NodeId = android::IOMX::node_id;
 using BufferId = android::IOMX::buffer_id;
 constexpr auto kAllPorts = static_cast<OMX_S32>(OMX_ALL);
 
-// Counts what arrives, and stops a delivery until it may go on.
+// Counts what arrives, can stop a delivery, and can free its node from inside one.
 class SlowObserver : public android::BnOMXObserver {
  public:
-  void onMessage(const android::omx_message& /*message*/) override {
+  void onMessage(const android::omx_message& message) override {
     ++begun;
     EXPECT_TRUE(eventually([this] { return goOn.load(); }));
+    EXPECT_TRUE(freeing == nullptr || freeing->freeNode(message.node) == android::OK);
     ++ended;
   }
   std::atomic<int> begun{0};
   std::atomic<int> ended{0};
   std::atomic<bool> goOn{false};
+  android::sp<android::IOMX> freeing;
 };
 
 class Lifetime : public NodeTest {
@@ -121,6 +123,15 @@ TEST_F(Lifetime, NothingIsDeliveredOnceFreeNodeHasReturnedAndSlownessIsNobodyEls
   freeing.join();
   EXPECT_EQ(observer->begun, observer->ended);
   EXPECT_EQ(observer->getStrongCount(), 1) << "nobody is left who could call";
+
+  // A node that is freed from inside its own delivery.
+  observer->freeing = server;
+  ASSERT_EQ(server->allocateNode(kDecoder, observer, &node), android::OK);
+  const int ended = observer->ended;
+  server->sendCommand(node, OMX_CommandFlush, kAllPorts);
+  EXPECT_TRUE(eventually([&] { return observer->ended > ended && observer->getStrongCount() == 1; }));
+  EXPECT_EQ(server->nodeCount(), 1u);
+  observer->freeing = nullptr;
 }
 
 }  // namespace
