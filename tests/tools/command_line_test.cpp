@@ -28,7 +28,8 @@ TEST(CommandLine, TellsOfItselfAndOfTheDevices) {
     EXPECT_EQ(run.err, "");
     EXPECT_TRUE(contains(run.out, each.part)) << run.out;
   }
-  for (const auto& device : report({"devices", "-d", "omap4"})["devices"]) {
+  const json listed = report({"devices", "-d", "omap4"});
+  for (const auto& device : listed["devices"]) {
     const bool isOmap4 = device["decoder"] == "OMX.TI.DUCATI1.VIDEO.DECODER==";
     EXPECT_TRUE(device["chosen"] == isOmap4 && isOmap4 == (device["name"] == "omap4")) << device;
   }
