@@ -58,7 +58,8 @@ TEST(MemoryDealer, WithoutMemoryItExistsAndRefuses) {
   for (const size_t size : {SIZE_MAX, SIZE_MAX - 30, SIZE_MAX / 2, pageSize() + 1}) {
     EXPECT_EQ(small->allocate(size), nullptr) << size;
   }
-  EXPECT_EQ((new MemoryDealer(3 * 4095))->getMemoryHeap()->getSize() % pageSize(), 0U);
+  const sp<MemoryDealer> odd = new MemoryDealer(3 * 4095);
+  EXPECT_EQ(odd->getMemoryHeap()->getSize() % pageSize(), 0U);
   const sp<IMemory> whole = small->allocate(pageSize());
   EXPECT_NE(small->allocate(0), nullptr);
   EXPECT_EQ(small->allocate(1), nullptr) << "the block at offset 0 went with the empty one";
