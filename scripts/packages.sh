@@ -2,7 +2,7 @@
 # The Debian packages that each step needs; read by ./call, ./check, .ci/run and the other scripts.
 BUILD_LIBRARIES="libavcodec-dev libavformat-dev libavutil-dev libcli11-dev libhwy-dev libpng-dev libswscale-dev nlohmann-json3-dev"
 BUILD_PACKAGES="cmake g++ ninja-build pkg-config $BUILD_LIBRARIES"
-TEST_PACKAGES="$BUILD_PACKAGES binutils libgtest-dev"
+TEST_PACKAGES="$BUILD_PACKAGES binutils libgtest-dev python3"
 PACKAGE_PACKAGES="dpkg-dev file"
 REFERENCE_PACKAGES="doxygen"
 FUZZ_PACKAGES="clang-14 libclang-rt-14-dev"

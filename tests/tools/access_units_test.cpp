@@ -17,45 +17,32 @@ namespace {
 using namespace tool;
 using tooltest::TemporaryDirectory;
 
-// A NAL unit, field by field.
-class Fields {
- public:
-  Fields& u(unsigned int count, uint32_t value) {
-    _bits.bits(value, count);
-    return *this;
-  }
-  Fields& ue(uint32_t value) {
-    _bits.ue(value);
-    return *this;
-  }
-  // With the stop bit and the bytes that keep start codes out, and no start code.
-  std::string nal(uint8_t header) {
-    _bits.finish();
-    std::vector<uint8_t> stream;
-    mediaserver::appendNal(header, _bits.bytes(), &stream);
-    return {stream.begin() + 4, stream.end()};
-  }
+using mediaserver::BitWriter;
 
- private:
-  mediaserver::BitWriter _bits;
-};
+// With the stop bit and the bytes that keep start codes out, and no start code.
+std::string nal(uint8_t header, BitWriter& bits) {
+  std::vector<uint8_t> stream;
+  mediaserver::appendNal(header, bits.finish().bytes(), &stream);
+  return {stream.begin() + 4, stream.end()};
+}
 
 constexpr int kHigh = 100;
 
 // 6 bits of frame number, order type 0 with 8 bits, 25 frames a second.
 std::string sps(uint32_t profile = 66) {
-  Fields bits;
-  bits.u(8, profile).u(8, 0).u(8, 31).ue(0);
-  if (profile == kHigh)
-    bits.ue(1).ue(0).ue(0).u(1, 0).u(1, 1).u(1, 1).ue(3).ue(20).u(7, 0);  // a scaling list: 2 more, 10 less
-  bits.ue(2).ue(0).ue(4).ue(1).u(1, 0).ue(10).ue(8).u(1, 1);
-  bits.u(1, 1).u(1, 0);
-  bits.u(1, 1).u(4, 0).u(1, 1).u(32, 1).u(32, 50).u(1, 1);  // timing
-  return bits.nal(0x67);
+  BitWriter bits;
+  bits.bits(profile, 8).bits(0, 8).bits(31, 8).ue(0);
+  // A scaling list: 2 more, 10 less.
+  if (profile == kHigh) bits.ue(1).ue(0).ue(0).bits(3, 3).ue(3).ue(20).bits(0, 7);
+  bits.ue(2).ue(0).ue(4).ue(1).bits(0, 1).ue(10).ue(8).bits(1, 1);
+  bits.bits(1, 1).bits(0, 1);
+  bits.bits(1, 1).bits(0, 4).bits(1, 1).bits(1, 32).bits(50, 32).bits(1, 1);  // timing
+  return nal(0x67, bits);
 }
 
 std::string pps(uint32_t id = 0) {
-  return Fields().ue(id).ue(0).u(1, 0).u(1, 0).ue(0).nal(0x68);
+  BitWriter bits;
+  return nal(0x68, bits.ue(id).ue(0).bits(0, 2).ue(0));
 }
 
 struct Slice {
@@ -65,11 +52,11 @@ struct Slice {
 };
 
 std::string slice(const Slice& fields, uint32_t first) {
-  Fields bits;
-  bits.ue(first).ue(7).ue(fields.pps).u(6, fields.frame);
+  BitWriter bits;
+  bits.ue(first).ue(7).ue(fields.pps).bits(fields.frame, 6);
   if (fields.idr) bits.ue(*fields.idr);
-  bits.u(8, fields.order).u(16, 0xFFFF);
-  return bits.nal(fields.idr ? 0x65 : fields.reference ? 0x61 : 0x01);
+  bits.bits(fields.order, 8).bits(0xFFFF, 16);
+  return nal(fields.idr ? 0x65 : fields.reference ? 0x61 : 0x01, bits);
 }
 
 const std::map<char, std::string> kOthers = {{'S', sps()},          {'H', sps(kHigh)},

@@ -90,25 +90,25 @@ int32_t BitReader::se() {
   return code % 2 != 0 ? magnitude + 1 : -magnitude;
 }
 
-void BitWriter::bits(uint32_t value, unsigned count) {
+BitWriter& BitWriter::bits(uint32_t value, unsigned count) {
   for (; count > 0; --count, ++_position) {
     if (_position % 8 == 0) _bytes.push_back(0);
     const unsigned bit = value >> (count - 1) & 1U;
     _bytes.back() = static_cast<uint8_t>(_bytes.back() | bit << (7 - _position % 8));
   }
+  return *this;
 }
 
-void BitWriter::ue(uint32_t value) {
+BitWriter& BitWriter::ue(uint32_t value) {
   unsigned zeros = 0;
   while ((uint64_t{value} + 1) >> (zeros + 1) != 0) ++zeros;
-  bits(0, zeros);
-  bits(1, 1);
-  bits(value + 1, zeros);
+  return bits(0, zeros).bits(1, 1).bits(value + 1, zeros);
 }
 
-void BitWriter::finish() {
+BitWriter& BitWriter::finish() {
   bits(1, 1);
   while (_position % 8 != 0) bits(0, 1);
+  return *this;
 }
 
 }  // namespace mediaserver

@@ -50,10 +50,10 @@ class BitReader {
 
 class BitWriter {
  public:
-  void bits(uint32_t value, unsigned count);
-  void ue(uint32_t value);
+  BitWriter& bits(uint32_t value, unsigned count);
+  BitWriter& ue(uint32_t value);
   // Stop bit and zeros up to the next byte.
-  void finish();
+  BitWriter& finish();
   const std::vector<uint8_t>& bytes() const { return _bytes; }
 
  private:

@@ -162,16 +162,12 @@ void appendSequenceSet(Bytes nal, int profileIdc, std::vector<uint8_t>* stream) 
   BitWriter writer;
   writer.bits(reader.bits(24), 24);
   writer.ue(reader.ue());
-  writer.ue(1);  // 4:2:0
-  writer.ue(0);  // eight bits
-  writer.ue(0);
-  writer.bits(0, 2);  // no bypass, no scaling lists
+  writer.ue(1).ue(0).ue(0).bits(0, 2);  // 4:2:0, eight bits, no bypass, no scaling lists
   // The rest as it is, up to the stop bit: the last one that is set.
   size_t end = payload.size() * 8;
   while (end > 0 && (unsigned{payload[(end - 1) / 8]} >> (7 - (end - 1) % 8) & 1U) == 0) --end;
   while (reader.position() + 1 < end) writer.bits(reader.bits(1), 1);
-  writer.finish();
-  appendNal(nal[0], writer.bytes(), stream);
+  appendNal(nal[0], writer.finish().bytes(), stream);
 }
 
 }  // namespace mediaserver
