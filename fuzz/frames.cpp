@@ -143,22 +143,14 @@ void bilinear(Input& input) {
   delete[] destination;
 }
 
-void padByBytes(Input& input) {
-  const unsigned sizes[] = {115200, 28800, 0, 1000};
-  const unsigned size = input.data().PickValueInArray(sizes);
-  const bool block = input.data().ConsumeBool();
-  const auto call = [&](In src, Out dst) { return PadI420Frame(size, src, dst, block); };
-  run(input, size, size == 115200 ? 152064 : 38016, call, unchecked);
-}
-
 }  // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size);
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   Input input(data, size);
   using Family = void (*)(Input&);
-  const Family families[] = {conversion, conversion,    conversion, conversion, conversion,
-                             crop,       withinABuffer, growing,    bilinear,   padByBytes};
+  const Family families[] = {conversion, conversion,    conversion, conversion,
+                             crop,       withinABuffer, growing,    bilinear};
   input.data().PickValueInArray(families)(input);
   return 0;
 }

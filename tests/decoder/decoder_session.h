@@ -47,10 +47,6 @@ class DecoderSessionTest : public SessionTest {
         },
         "the end of the event thread's work");
   }
-  void waitForEndOfEventThread() {
-    requireUnderLock([](SessionState& state) { return !state.eventThread.running; },
-                     "the event thread's end");
-  }
   // New settings, told by the test at the moment of its choice, and the session's answer: the command to
   // disable the port has gone out.
   void announceAndDisable() {

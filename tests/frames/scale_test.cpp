@@ -173,6 +173,7 @@ TEST(PadFrame, RefusesFramesThatAreSmallerOrTooLarge) {
   std::uint8_t byte[1] = {};
   const unsigned refused[][4] = {{4, 2, 2, 4}, {2, 4, 4, 2}, {2, 2, 65536, 65536}};
   for (const auto& s : refused) EXPECT_EQ(PadI420Frame(byte, byte, s[0], s[1], s[2], s[3]), -1);
+  for (const unsigned size : {0U, 1000U}) EXPECT_EQ(PadI420Frame(size, byte, byte, true), -1);
 }
 
 TEST(PadFrame, FixedSizesAreCutAndPaddedButForFourBytes) {

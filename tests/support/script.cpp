@@ -116,10 +116,7 @@ class ScriptedCodec final : public Codec {
     return setParameter(index, record, size);
   }
 
-  void configure(const PortPair& ports) override {
-    const Lock lock(_script._mutex);
-    _script._configured = ports;
-  }
+  void configure(const PortPair& /*ports*/) override {}
   OMX_ERRORTYPE start() override {
     const Lock lock(_script._mutex);
     if (_script._startFailure == OMX_ErrorNone) ++_script._starts;

@@ -100,8 +100,6 @@ class Script {
   [[nodiscard]] bool waitForInputs(size_t count) const {
     return _inputs.waitFor([](const Packet&) { return true; }, count);
   }
-  // The definitions that the work was last told to go by: at start, and after each enable of a port.
-  mediaserver::PortPair configured() const { return read(_configured); }
   size_t liveCodecs() const { return read(_codecs).size(); }
   size_t starts() const { return read(_starts); }
   size_t stops() const { return read(_stops); }
@@ -136,7 +134,6 @@ class Script {
   std::optional<size_t> _inputBudget;  // how many may pass; no number: all
   Transform _transform;
   std::set<ScriptedCodec*> _codecs;
-  mediaserver::PortPair _configured{};
   size_t _starts = 0;
   size_t _stops = 0;
 };
