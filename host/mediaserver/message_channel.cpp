@@ -2,6 +2,7 @@
 
 #include <condition_variable>
 #include <deque>
+#include <mutex>
 #include <system_error>
 #include <utility>
 
@@ -19,9 +20,11 @@ struct MessageChannel::Queue {
     std::function<void()> before;
   };
 
+  explicit Queue(const android::sp<android::IOMXObserver>& client) : observer(client) {}
   // Until nothing waits or the queue is closed. Only while nobody else delivers.
-  void deliverAll(std::unique_lock<std::mutex>& lock, const android::wp<android::IOMXObserver>& observer);
+  void deliverAll(std::unique_lock<std::mutex>& lock);
 
+  const android::wp<android::IOMXObserver> observer;
   std::mutex mutex;  // guards everything below
   std::condition_variable changed;
   std::deque<Entry> messages;
@@ -30,8 +33,7 @@ struct MessageChannel::Queue {
   bool closed = false;
 };
 
-void MessageChannel::Queue::deliverAll(std::unique_lock<std::mutex>& lock,
-                                       const android::wp<android::IOMXObserver>& observer) {
+void MessageChannel::Queue::deliverAll(std::unique_lock<std::mutex>& lock) {
   delivering = true;
   while (!closed && !messages.empty()) {
     const Entry entry = std::move(messages.front());
@@ -49,7 +51,8 @@ void MessageChannel::Queue::deliverAll(std::unique_lock<std::mutex>& lock,
   if (closed) changed.notify_all();
 }
 
-MessageChannel::MessageChannel(const android::sp<android::IOMXObserver>& observer) : _observer(observer) {}
+MessageChannel::MessageChannel(const android::sp<android::IOMXObserver>& observer)
+    : _queue(std::make_shared<Queue>(observer)) {}
 
 MessageChannel::~MessageChannel() {
   shut();
@@ -61,100 +64,66 @@ MessageChannel::~MessageChannel() {
   }
 }
 
-std::shared_ptr<MessageChannel::Queue> MessageChannel::present() const {
-  std::lock_guard<std::mutex> lock(_mutex);
-  return _queue;
-}
-
 bool MessageChannel::open() {
-  const auto isOpen = [this] {
-    const std::shared_ptr<Queue> queue = present();
-    if (queue == nullptr) return false;
-    std::lock_guard<std::mutex> lock(queue->mutex);
-    return !queue->closed;
-  };
-  // From inside a delivery, which a close in progress waits for.
-  if (tDelivering == this) return isOpen();
-  std::lock_guard<std::mutex> lifecycle(_lifecycle);
-  if (isOpen()) return true;
-  awaitEnd();  // closed from inside a delivery, which may still run
-  auto queue = std::make_shared<Queue>();
   try {
-    _thread = std::thread(&MessageChannel::run, this, queue, _observer);
+    _thread = std::thread(&MessageChannel::run, this, _queue);
   } catch (const std::system_error&) {
     return false;
   }
-  std::lock_guard<std::mutex> lock(_mutex);
-  _queue = std::move(queue);
   return true;
 }
 
 void MessageChannel::queue(const android::omx_message& message, std::function<void()> before) {
-  const std::shared_ptr<Queue> queue = present();
-  if (queue == nullptr) return;
-  std::lock_guard<std::mutex> lock(queue->mutex);
-  if (queue->closed) return;
-  queue->messages.push_back({message, std::move(before)});
-  queue->untold = true;
+  const std::lock_guard<std::mutex> lock(_queue->mutex);
+  if (_queue->closed) return;
+  _queue->messages.push_back({message, std::move(before)});
+  _queue->untold = true;
 }
 
 void MessageChannel::wake() {
-  const std::shared_ptr<Queue> queue = present();
-  if (queue == nullptr) return;
   {
-    std::lock_guard<std::mutex> lock(queue->mutex);
-    if (!std::exchange(queue->untold, false)) return;
+    const std::lock_guard<std::mutex> lock(_queue->mutex);
+    if (!std::exchange(_queue->untold, false)) return;
   }
-  queue->changed.notify_one();  // outside, so that the thread that wakes need not wait for the lock
+  _queue->changed.notify_one();  // outside, so that the thread that wakes need not wait for the lock
 }
 
 void MessageChannel::deliver() {
-  const std::shared_ptr<Queue> queue = present();
-  if (queue == nullptr) return;
-  std::unique_lock<std::mutex> lock(queue->mutex);
-  queue->untold = false;
-  if (queue->delivering) return;
+  std::unique_lock<std::mutex> lock(_queue->mutex);
+  _queue->untold = false;
+  if (_queue->delivering) return;
   const MessageChannel* const outer = std::exchange(tDelivering, this);
-  queue->deliverAll(lock, _observer);
+  _queue->deliverAll(lock);
   tDelivering = outer;
 }
 
 void MessageChannel::close() {
-  if (tDelivering == this) return shut();
-  // Both under the lock: in between somebody might open the channel again, and the end to wait for would be
-  // that of a thread that has just begun.
-  std::lock_guard<std::mutex> lifecycle(_lifecycle);
   shut();
-  awaitEnd();
+  if (tDelivering != this) awaitEnd();
 }
 
 void MessageChannel::shut() {
-  const std::shared_ptr<Queue> queue = present();
-  if (queue == nullptr) return;
   std::deque<Queue::Entry> dropped;  // ends without the lock
-  std::lock_guard<std::mutex> lock(queue->mutex);
-  queue->closed = true;
-  dropped.swap(queue->messages);
-  queue->changed.notify_all();
+  const std::lock_guard<std::mutex> lock(_queue->mutex);
+  _queue->closed = true;
+  dropped.swap(_queue->messages);
+  _queue->changed.notify_all();
 }
 
 void MessageChannel::awaitEnd() {
   if (_thread.joinable()) _thread.join();
-  const std::shared_ptr<Queue> queue = present();
-  if (queue == nullptr) return;
-  std::unique_lock<std::mutex> lock(queue->mutex);
-  queue->changed.wait(lock, [&] { return !queue->delivering; });
+  std::unique_lock<std::mutex> lock(_queue->mutex);
+  _queue->changed.wait(lock, [this] { return !_queue->delivering; });
 }
 
-void MessageChannel::run(const MessageChannel* channel, std::shared_ptr<Queue> queue,
-                         const android::wp<android::IOMXObserver>& observer) {
+void MessageChannel::run(const MessageChannel* channel, const std::shared_ptr<Queue>& queue) {
   tDelivering = channel;
   std::unique_lock<std::mutex> lock(queue->mutex);
   for (;;) {
     queue->changed.wait(lock,
                         [&] { return queue->closed || (!queue->messages.empty() && !queue->delivering); });
     if (queue->closed) return;
-    queue->deliverAll(lock, observer);
+    queue->deliverAll(lock);
   }
 }
 

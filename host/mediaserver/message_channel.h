@@ -6,7 +6,6 @@
 
 #include <functional>
 #include <memory>
-#include <mutex>
 #include <thread>
 
 #include <media/IOMX.h>
@@ -17,14 +16,14 @@ namespace mediaserver {
 class MessageChannel {
  public:
   explicit MessageChannel(const android::sp<android::IOMXObserver>& observer);
-  ~MessageChannel();  // closes; may run inside a delivery of its own
+  ~MessageChannel();  // closes; may run inside a delivery on the channel's own thread
   MessageChannel(const MessageChannel&) = delete;
   MessageChannel& operator=(const MessageChannel&) = delete;
 
-  // Starts the delivery thread, or does nothing when it runs. False when the system has no thread left.
+  // Starts the delivery thread; once, before everything else. False when the system has no thread left.
   [[nodiscard]] bool open();
 
-  // Queues a message; drops it unless the channel is open. `before`, if there is one, runs before the message
+  // Queues a message; drops it once the channel is closed. `before`, if there is one, runs before the message
   // is delivered, on the same thread. The delivery thread need not see the message before the next wake:
   // where a processor sleeps, to wake one takes longer than all the rest, so messages that come together wake
   // it once.
@@ -40,23 +39,18 @@ class MessageChannel {
   // well be closed meanwhile, is still there at the end.
   void deliver();
 
-  // Drops what waits and returns when no delivery is in progress; nothing is delivered from then on until
-  // the channel is opened again. Called from inside a delivery, it does not wait for that one.
+  // Drops what waits and returns when no delivery is in progress; nothing is delivered from then on. Called
+  // from inside a delivery, it does not wait for that one. By one thread at a time.
   void close();
 
  private:
   struct Queue;
-  static void run(const MessageChannel* channel, std::shared_ptr<Queue> queue,
-                  const android::wp<android::IOMXObserver>& observer);
-  std::shared_ptr<Queue> present() const;
+  static void run(const MessageChannel* channel, const std::shared_ptr<Queue>& queue);
   void shut();
   void awaitEnd();
 
-  const android::wp<android::IOMXObserver> _observer;
-  std::mutex _lifecycle;  // guards _thread; held while the end of deliveries is waited for
+  const std::shared_ptr<Queue> _queue;  // shared with the delivery thread, which may outlive the channel
   std::thread _thread;
-  mutable std::mutex _mutex;      // guards _queue
-  std::shared_ptr<Queue> _queue;  // the last one opened, null before; shared with those that deliver
 };
 
 }  // namespace mediaserver
