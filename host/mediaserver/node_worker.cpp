@@ -171,8 +171,10 @@ bool Node::sendInput(Lock& lock) {
   if (end) {
     _draining = true;
     _drainTime = view.timestamp;
+  } else {
+    receiveOutput(lock);  // first of all: it is what the client waits for
   }
-  giveBack(kInputPort, buffer);  // told together with the output, which is next, or else before the pause
+  giveBack(kInputPort, buffer);  // told with what comes next, or else before the pause
   return true;
 }
 
