@@ -94,8 +94,8 @@ void Node::shutdown() {
   {
     std::lock_guard<std::mutex> lock(_mutex);
     _stopping = true;
-    _wake.notify_all();
   }
+  _wakeUp.post();
   if (_worker.get_id() == std::this_thread::get_id()) {
     _worker.detach();  // a delivery of its own: it ends after that, and owns the node until then
   } else {
@@ -131,8 +131,12 @@ void Node::raise(OMX_EVENTTYPE kind, OMX_U32 data1, OMX_U32 data2) {
 }
 
 void Node::signal() {
+  if (markSignalled()) _wakeUp.post();
+}
+
+bool Node::markSignalled() {
   _signalled = true;
-  _wake.notify_one();
+  return std::exchange(_asleep, false);
 }
 
 void Node::event(OMX_EVENTTYPE kind, OMX_U32 data1, OMX_U32 data2) {

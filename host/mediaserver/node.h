@@ -20,6 +20,7 @@
 // _deferred         raise, worker                   worker          _mutex
 // _configureDue     worker, settle                  worker          _mutex
 // _signalled        all                             worker          _mutex
+// _asleep           all                             all             _mutex; who ends it posts _wakeUp
 // _stopping         shutdown                        all             _mutex
 // _lastExchange     worker, fillBuffer              worker          _mutex
 // _started, _draining, _drainTime,  worker          worker          one thread
@@ -33,7 +34,6 @@
 
 #include <array>
 #include <chrono>
-#include <condition_variable>
 #include <cstddef>
 #include <deque>
 #include <memory>
@@ -49,6 +49,7 @@
 #include "host/mediaserver/codec.h"
 #include "host/mediaserver/message_channel.h"
 #include "host/mediaserver/port.h"
+#include "host/mediaserver/wake_up.h"
 
 namespace mediaserver {
 
@@ -111,6 +112,7 @@ class Node final : private CodecHost {
   // node.cpp: messages.
   bool usable() const { return !_stopping && _state != OMX_StateInvalid; }
   void signal();
+  [[nodiscard]] bool markSignalled();  // whether the worker sleeps, and _wakeUp has to be posted
   void event(OMX_EVENTTYPE event, OMX_U32 data1, OMX_U32 data2);
   void error(OMX_ERRORTYPE code) { event(OMX_EventError, static_cast<OMX_U32>(code), 0); }
   void completed(OMX_COMMANDTYPE command, OMX_U32 data) { event(OMX_EventCmdComplete, command, data); }
@@ -167,8 +169,8 @@ class Node final : private CodecHost {
   std::unique_ptr<Codec> _codec;
   std::thread _worker;
 
+  WakeUp _wakeUp;
   std::mutex _mutex;
-  std::condition_variable _wake;
   OMX_STATETYPE _state = OMX_StateLoaded;
   OMX_STATETYPE _target = OMX_StateLoaded;    // where the accepted commands lead
   OMX_STATETYPE _awaited = OMX_StateInvalid;  // Idle or Loaded while that waits for buffers, else Invalid
@@ -180,6 +182,7 @@ class Node final : private CodecHost {
   std::vector<android::omx_message> _deferred;
   bool _configureDue = false;
   bool _signalled = false;
+  bool _asleep = false;
   bool _stopping = false;
   // When an output buffer last went to the client or came from it.
   std::chrono::steady_clock::time_point _lastExchange;

@@ -82,6 +82,7 @@ OMX_ERRORTYPE Node::claim(OMX_U32 index, BufferId id, std::shared_ptr<Buffer>* b
 // The worker hears of a buffer outside of the lock, which it would have to wait for otherwise: this is the
 // way of every picture.
 OMX_ERRORTYPE Node::fillBuffer(BufferId id) {
+  bool sleeps = false;
   {
     std::lock_guard<std::mutex> lock(_mutex);
     std::shared_ptr<Buffer> buffer;
@@ -92,14 +93,15 @@ OMX_ERRORTYPE Node::fillBuffer(BufferId id) {
     buffer->header.nFlags = 0;
     _ports[kOutputPort].append(buffer);
     _lastExchange = std::chrono::steady_clock::now();
-    _signalled = true;
+    sleeps = markSignalled();
   }
-  _wake.notify_one();
+  if (sleeps) _wakeUp.post();
   return OMX_ErrorNone;
 }
 
 OMX_ERRORTYPE Node::emptyBuffer(BufferId id, OMX_U32 offset, OMX_U32 length, OMX_U32 flags,
                                 OMX_TICKS timestamp) {
+  bool sleeps = false;
   {
     std::lock_guard<std::mutex> lock(_mutex);
     std::shared_ptr<Buffer> buffer;
@@ -111,9 +113,9 @@ OMX_ERRORTYPE Node::emptyBuffer(BufferId id, OMX_U32 offset, OMX_U32 length, OMX
     buffer->header.nFlags = flags;
     buffer->header.nTimeStamp = timestamp;
     _ports[kInputPort].append(buffer);
-    _signalled = true;
+    sleeps = markSignalled();
   }
-  _wake.notify_one();
+  if (sleeps) _wakeUp.post();
   return OMX_ErrorNone;
 }
 

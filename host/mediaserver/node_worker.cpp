@@ -26,11 +26,19 @@ void Node::deliver(Lock& lock) {
 }
 
 void Node::pause(Lock& lock) {
-  const auto woken = [this] { return _signalled || _stopping; };
-  if (_awaitsReader) {
-    _wake.wait_until(lock, _lastExchange + _readingTime, woken);
-  } else {
-    _wake.wait(lock, woken);
+  const bool limited = _awaitsReader;
+  const auto limit = _lastExchange + _readingTime;
+  bool inTime = true;
+  while (inTime && !_signalled && !_stopping) {
+    _asleep = true;
+    lock.unlock();
+    if (limited) {
+      inTime = _wakeUp.waitUntil(limit);
+    } else {
+      _wakeUp.wait();
+    }
+    lock.lock();
+    _asleep = false;
   }
 }
 
