@@ -59,24 +59,25 @@ DirectEncoder::DirectEncoder(tool::Size size, int framesPerSecond, int64_t bitRa
                      "keyint=infinite:scenecut=0:psy=0:aq-mode=0:cabac=0:8x8dct=0:weightp=0:ref=1", 0) >= 0 &&
           avcodec_open2(&context, nullptr, nullptr) >= 0,
       "libx264 cannot be opened");
+  _frame->format = context.pix_fmt;
+  _frame->width = context.width;
+  _frame->height = context.height;
+  // Stands for each picture's own reference, with which the library takes it as it lies instead of a copy.
+  static uint8_t nobodys = 0;
+  _frame->buf[0] = av_buffer_create(&nobodys, 1, keep, nullptr, AV_BUFFER_FLAG_READONLY);
 }
 
 std::span<const uint8_t> DirectEncoder::encode(const Frame& frame, bool key) {
   AVFrame& picture = *_frame;
   auto* const luma = const_cast<uint8_t*>(frame.data());
-  picture.format = AV_PIX_FMT_NV12;
-  picture.width = _context->width;
-  picture.height = _context->height;
   picture.data[0] = luma;
   picture.data[1] = luma + static_cast<ptrdiff_t>(_context->width) * _context->height;
   picture.linesize[0] = picture.linesize[1] = _context->width;
-  picture.buf[0] = av_buffer_create(luma, 1, keep, nullptr, AV_BUFFER_FLAG_READONLY);
   picture.pts = _count++;
   picture.pict_type = key ? AV_PICTURE_TYPE_I : AV_PICTURE_TYPE_NONE;
   av_packet_unref(_packet.get());
   const bool encoded = avcodec_send_frame(_context.get(), &picture) >= 0 &&
                        avcodec_receive_packet(_context.get(), _packet.get()) >= 0;
-  av_frame_unref(&picture);
   require(encoded, "libx264 gave no unit for a frame");
   return {_packet->data, static_cast<size_t>(_packet->size)};
 }

@@ -21,7 +21,6 @@ const AVCodec* library() {
   return avcodec_find_encoder_by_name("libx264");
 }
 
-// The picture belongs to the caller and is done with when the call returns.
 void keep(void* /*opaque*/, uint8_t* /*data*/) {}
 
 std::string describe(const StreamTools& tools) {
@@ -95,7 +94,14 @@ bool AvcStream::prepare(const StreamPace& pace) {
       av_opt_set(context.priv_data, "forced-idr", "1", 0) >= 0 &&
       av_opt_set(context.priv_data, "x264-params", describe(_tools).c_str(), 0) >= 0 &&
       (!_tools.constantQuantizer || av_opt_set_int(context.priv_data, "qp", _tools.quantizerP, 0) >= 0);
-  return set && avcodec_open2(&context, nullptr, nullptr) >= 0;
+  _frame->format = context.pix_fmt;
+  _frame->width = context.width;
+  _frame->height = context.height;
+  // With a reference to count, the library takes a picture as it lies instead of a copy. It stands for all of
+  // them: each belongs to the caller and is done with when its call returns.
+  static uint8_t nobodys = 0;
+  _frame->buf[0] = av_buffer_create(&nobodys, 1, keep, nullptr, AV_BUFFER_FLAG_READONLY);
+  return set && _frame->buf[0] != nullptr && avcodec_open2(&context, nullptr, nullptr) >= 0;
 }
 
 // The library follows the bit rate while it runs only if it began with a constant one: with the buffer's rate
@@ -117,20 +123,13 @@ bool AvcStream::encode(const SemiPlanarView& picture, bool key, const StreamPace
   request();
 
   AVFrame& frame = *_frame;
-  frame.format = AV_PIX_FMT_NV12;
-  frame.width = static_cast<int>(picture.width);
-  frame.height = static_cast<int>(picture.height);
-  auto* const luma = const_cast<uint8_t*>(picture.luma);
-  frame.data[0] = luma;
+  frame.data[0] = const_cast<uint8_t*>(picture.luma);
   frame.data[1] = const_cast<uint8_t*>(picture.chroma);
   frame.linesize[0] = frame.linesize[1] = static_cast<int>(picture.pitch);
-  // With a reference to give away, the library takes the picture as it lies instead of a copy.
-  frame.buf[0] = av_buffer_create(luma, 1, keep, nullptr, AV_BUFFER_FLAG_READONLY);
   frame.pts = _count++;
   frame.pict_type = key || frame.pts == 0 ? AV_PICTURE_TYPE_I : AV_PICTURE_TYPE_NONE;
-  const bool encoded = frame.buf[0] != nullptr && avcodec_send_frame(_context.get(), &frame) >= 0 &&
+  const bool encoded = avcodec_send_frame(_context.get(), &frame) >= 0 &&
                        avcodec_receive_packet(_context.get(), _packet.get()) >= 0;
-  av_frame_unref(&frame);
   if (!encoded) return false;
 
   // Slices and parameter sets, and nothing that the encoder library has to say besides.
