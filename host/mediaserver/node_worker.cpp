@@ -179,7 +179,7 @@ bool Node::sendInput(Lock& lock) {
   if (end) {
     _draining = true;
     _drainTime = view.timestamp;
-  } else {
+  } else if (!_configureDue) {
     receiveOutput(lock);  // first of all: it is what the client waits for
   }
   giveBack(kInputPort, buffer);  // told with what comes next, or else before the pause
