@@ -22,14 +22,18 @@ size_t findStart(Bytes stream) {
 
 }  // namespace
 
+Bytes findNal(Bytes stream) {
+  const size_t start = findStart(stream);
+  return start == stream.size() ? Bytes() : stream.subspan(start + kStartCode);
+}
+
 Bytes takeNal(Bytes* stream) {
   for (;;) {
-    const size_t start = findStart(*stream);
-    if (start == stream->size()) {
+    const Bytes rest = findNal(*stream);
+    if (rest.empty()) {
       *stream = {};
       return {};
     }
-    const Bytes rest = stream->subspan(start + kStartCode);
     const size_t end = findStart(rest);
     *stream = rest.subspan(end);
     Bytes nal = rest.first(end);

@@ -22,6 +22,10 @@ inline unsigned nalType(Bytes nal) {
   return nal.empty() ? 0U : nal[0] & 0x1FU;
 }
 
+// The stream from its next NAL unit on, without the start code in front of that. Empty when there is none
+// left.
+Bytes findNal(Bytes stream);
+
 // Takes the next NAL unit, without its start code, from the front of `stream`. Empty when there is none left.
 // Zeros behind a unit belong to none.
 Bytes takeNal(Bytes* stream);

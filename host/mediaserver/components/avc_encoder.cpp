@@ -1,7 +1,6 @@
 #include "host/mediaserver/components/avc_encoder.h"
 
 #include <algorithm>
-#include <cstring>
 #include <utility>
 
 #include "host/mediaserver/components/avc_level.h"
@@ -133,7 +132,6 @@ OMX_ERRORTYPE AvcEncoder::start() {
 
 void AvcEncoder::stop() {
   _stream.reset();
-  _unit.bytes.clear();
   _draining = false;
 }
 
@@ -143,8 +141,9 @@ void AvcEncoder::flush(OMX_U32 port) {
     return;
   }
   // Pictures behind one that nobody got could not be decoded.
-  if (!_unit.bytes.empty()) _sinceKey = 0;
-  _unit.bytes.clear();
+  if (!hasUnit()) return;
+  _stream->dropUnit();
+  _sinceKey = 0;
 }
 
 bool AvcEncoder::openStream(uint32_t width, uint32_t height, const StreamPace& pace) {
@@ -155,7 +154,7 @@ bool AvcEncoder::openStream(uint32_t width, uint32_t height, const StreamPace& p
 }
 
 Sent AvcEncoder::send(const InputView& input) {
-  if (!_unit.bytes.empty()) return Sent::Busy;
+  if (hasUnit()) return Sent::Busy;
   if (input.length == 0) return Sent::Taken;
   const std::optional<SemiPlanarView> picture = viewInput(_input, input.data, input.length);
   if (picture) {
@@ -174,8 +173,7 @@ void AvcEncoder::encode(const SemiPlanarView& untouched, OMX_TICKS timestamp) {
     openStream(picture.width, picture.height, pace);
   }
   const bool key = requested || _sinceKey == 0 || (pace.keyPeriod != 0 && _sinceKey >= pace.keyPeriod);
-  if (_stream == nullptr || !_stream->encode(picture, key, pace, &_unit.bytes)) {
-    _unit.bytes.clear();
+  if (_stream == nullptr || !_stream->encode(picture, key, pace)) {
     _sinceKey = 0;
     _host.raise(OMX_EventError, static_cast<OMX_U32>(OMX_ErrorHardware), 0);
     return;
@@ -192,24 +190,24 @@ void AvcEncoder::drain(OMX_TICKS /*timestamp*/) {
 }
 
 Received AvcEncoder::receive(OutputSpace& output) {
-  if (_unit.bytes.empty()) {
+  if (!hasUnit()) {
     if (!std::exchange(_draining, false)) return Received::Nothing;
     _sinceKey = 0;  // what follows is a stream of its own
     return Received::Drained;
   }
   if (_unit.width != _shownWidth || _unit.height != _shownHeight) return Received::NewGeometry;
-  if (_unit.bytes.size() > output.capacity) {
-    _unit.bytes.clear();
+  if (_stream->unitBytes() > output.capacity) {
+    _stream->dropUnit();
     _sinceKey = 0;
     _host.raise(OMX_EventError, static_cast<OMX_U32>(OMX_ErrorOverflow), 0);
     return Received::Nothing;
   }
-  std::memcpy(output.data, _unit.bytes.data(), _unit.bytes.size());
-  output.length = static_cast<OMX_U32>(_unit.bytes.size());
+  _stream->copyUnit(output.data);
+  output.length = static_cast<OMX_U32>(_stream->unitBytes());
   output.timestamp = _unit.timestamp;
   output.flags = OMX_BUFFERFLAG_ENDOFFRAME;
   if (_unit.key) output.flags |= OMX_BUFFERFLAG_SYNCFRAME;
-  _unit.bytes.clear();
+  _stream->dropUnit();
   if (std::exchange(_draining, false)) {
     output.flags |= OMX_BUFFERFLAG_EOS;
     _sinceKey = 0;

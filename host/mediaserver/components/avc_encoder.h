@@ -36,15 +36,15 @@ class AvcEncoder final : public Codec {
   OMX_U32 geometry(PortDefinition& output) override;
 
  private:
-  // An access unit that waits for an output buffer.
+  // The stream's access unit, which waits for an output buffer.
   struct Unit {
-    std::vector<uint8_t> bytes;  // empty: there is none
     bool key = false;
     OMX_TICKS timestamp = 0;
     uint32_t width = 0;
     uint32_t height = 0;
   };
 
+  bool hasUnit() const { return _stream != nullptr && _stream->unitBytes() != 0; }
   bool openStream(uint32_t width, uint32_t height, const StreamPace& pace);
   void encode(const SemiPlanarView& picture, OMX_TICKS timestamp);
 

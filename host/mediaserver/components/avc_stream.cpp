@@ -1,5 +1,6 @@
 #include "host/mediaserver/components/avc_stream.h"
 
+#include <algorithm>
 #include <cmath>
 #include <string>
 
@@ -7,7 +8,6 @@ extern "C" {
 #include <libavutil/opt.h>
 }
 
-#include "host/mediaserver/components/annex_b.h"
 #include "host/mediaserver/components/avc_level.h"
 #include "host/mediaserver/components/sequence_set.h"
 
@@ -116,9 +116,8 @@ void AvcStream::request() {
   _context->rc_buffer_size = static_cast<int>(std::llround(wanted.bufferBits));
 }
 
-bool AvcStream::encode(const SemiPlanarView& picture, bool key, const StreamPace& pace,
-                       std::vector<uint8_t>* unit) {
-  unit->clear();
+bool AvcStream::encode(const SemiPlanarView& picture, bool key, const StreamPace& pace) {
+  dropUnit();
   _budget.set(pace.bitRate, pace.frameRate / kQ16);
   request();
 
@@ -132,20 +131,33 @@ bool AvcStream::encode(const SemiPlanarView& picture, bool key, const StreamPace
                        avcodec_receive_packet(_context.get(), _packet.get()) >= 0;
   if (!encoded) return false;
 
-  // Slices and parameter sets, and nothing that the encoder library has to say besides.
+  // Parameter sets and slices, and nothing that the encoder library has to say besides. The slices come last;
+  // they are not walked over, since the client waits.
   Bytes stream(_packet->data, static_cast<size_t>(_packet->size));
-  for (Bytes nal = takeNal(&stream); !nal.empty(); nal = takeNal(&stream)) {
-    const unsigned type = nalType(nal);
-    if (type == kNalSequenceSet) {
-      appendSequenceSet(nal, _tools.profileIdc, unit);
-    } else if (type == kNalSlice || type == kNalIdrSlice || type == kNalPictureSet) {
-      unit->insert(unit->end(), {0, 0, 0, 1});
-      unit->insert(unit->end(), nal.begin(), nal.end());
+  for (Bytes rest = findNal(stream); !rest.empty(); rest = findNal(stream)) {
+    const unsigned type = nalType(rest);
+    if (type == kNalSlice || type == kNalIdrSlice) {
+      appendNal(rest[0], {}, &_head);
+      _slices = rest.subspan(1);
+      break;
     }
+    const Bytes nal = takeNal(&stream);
+    if (type == kNalSequenceSet) appendSequenceSet(nal, _tools.profileIdc, &_head);
+    if (type == kNalPictureSet) appendNal(nal[0], unescape(nal), &_head);
   }
-  av_packet_unref(_packet.get());
-  _budget.spent(static_cast<double>(unit->size()) * 8);
+  _budget.spent(static_cast<double>(unitBytes()) * 8);
   return true;
+}
+
+void AvcStream::copyUnit(uint8_t* to) const {
+  to = std::copy(_head.begin(), _head.end(), to);
+  std::copy(_slices.begin(), _slices.end(), to);
+}
+
+void AvcStream::dropUnit() {
+  _head.clear();
+  _slices = {};
+  av_packet_unref(_packet.get());
 }
 
 }  // namespace mediaserver

@@ -3,10 +3,12 @@
 // key frames but those that are asked for. One thread.
 #pragma once
 
+#include <cstddef>
 #include <cstdint>
 #include <memory>
 #include <vector>
 
+#include "host/mediaserver/components/annex_b.h"
 #include "host/mediaserver/components/av.h"
 #include "host/mediaserver/components/encoder_settings.h"
 #include "host/mediaserver/components/picture_layout.h"
@@ -28,9 +30,14 @@ class AvcStream {
     return width != _width || height != _height || tools != _tools;
   }
 
-  // One picture of the stream's size at the rates of the moment. Writes its access unit, in byte stream
-  // format, over what `unit` holds. The first picture is a key frame anyway. False when the library fails.
-  bool encode(const SemiPlanarView& picture, bool key, const StreamPace& pace, std::vector<uint8_t>* unit);
+  // One picture of the stream's size at the rates of the moment, whose access unit takes the place of the one
+  // before. The first picture is a key frame anyway. False when the library fails.
+  bool encode(const SemiPlanarView& picture, bool key, const StreamPace& pace);
+
+  // The access unit, in byte stream format. 0 bytes: there is none.
+  size_t unitBytes() const { return _head.size() + _slices.size(); }
+  void copyUnit(uint8_t* to) const;
+  void dropUnit();
 
  private:
   AvcStream(uint32_t width, uint32_t height, const StreamTools& tools, const StreamPace& pace);
@@ -43,7 +50,9 @@ class AvcStream {
   RateBudget _budget;
   AvContext _context;
   AvFrame _frame;
-  AvPacket _packet;
+  AvPacket _packet;  // with the unit's slices, which are copied once only, to where they go
+  std::vector<uint8_t> _head;
+  Bytes _slices;
   int64_t _count = 0;
 };
 
