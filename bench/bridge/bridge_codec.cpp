@@ -1,10 +1,10 @@
 #include "bench/bridge/bridge_codec.h"
 
-#include <string.h>
-
 #include <stdexcept>
 #include <string>
 #include <utility>
+
+#include "bench/bridge/codec_time.h"
 
 namespace bench {
 
@@ -65,7 +65,7 @@ void BridgeCodec::send(std::span<const uint8_t> input) {
     void* buffer = nullptr;
     void* data = nullptr;
     if (omx_interface_reserve_input_buffer(_handle, &buffer, &data) == 0) {
-      memcpy(data, input.data(), input.size());
+      copyInput(input, static_cast<uint8_t*>(data));
       if (omx_interface_send_input_buffer(_handle, buffer, static_cast<int>(input.size()),
                                           static_cast<int>(_sent)) != 0) {
         throw std::runtime_error("an input was refused");

@@ -2,6 +2,7 @@
 
 #include <dlfcn.h>
 #include <stdlib.h>
+#include <string.h>
 
 #include <atomic>
 
@@ -14,6 +15,7 @@ namespace {
 using Clock = std::chrono::steady_clock;
 
 std::atomic<Clock::rep> spent{0};
+std::atomic<Clock::rep> copying{0};
 
 // The function of that name behind the one that this program defines.
 template <typename Function>
@@ -58,6 +60,16 @@ namespace bench {
 
 std::chrono::nanoseconds takeCodecTime() {
   return Clock::duration(spent.exchange(0));
+}
+
+void copyInput(std::span<const uint8_t> input, uint8_t* to) {
+  const Clock::time_point begin = Clock::now();
+  memcpy(to, input.data(), input.size());
+  copying += (Clock::now() - begin).count();
+}
+
+std::chrono::nanoseconds takeCopyTime() {
+  return Clock::duration(copying.exchange(0));
 }
 
 }  // namespace bench

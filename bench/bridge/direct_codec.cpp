@@ -4,6 +4,7 @@
 
 #include <omxhost/device.h>
 
+#include "bench/bridge/codec_time.h"
 #include "host/mediaserver/components/picture_layout.h"
 
 extern "C" {
@@ -83,7 +84,8 @@ std::span<const uint8_t> DirectEncoder::encode(const Frame& frame, bool key) {
 }
 
 std::span<const uint8_t> DirectEncoder::encodeCopied(const Frame& frame, bool key) {
-  _copied = frame;
+  _copied.resize(frame.size());
+  copyInput(frame, _copied.data());
   return encode(_copied, key);
 }
 
@@ -99,7 +101,7 @@ DirectDecoder::DirectDecoder()
 
 void DirectDecoder::decode(const Unit& unit) {
   require(av_new_packet(_packet.get(), static_cast<int>(unit.size())) >= 0, "no memory");
-  std::copy(unit.begin(), unit.end(), _packet->data);
+  copyInput(unit, _packet->data);
   const bool sent = avcodec_send_packet(_context.get(), _packet.get()) >= 0;
   av_packet_unref(_packet.get());
   require(sent && avcodec_receive_frame(_context.get(), _frame.get()) >= 0, "no picture for a unit");
