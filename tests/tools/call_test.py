@@ -65,7 +65,7 @@ class CallOn(tool.TestCase):
 class Call(tool.TestCase):
     def test_recovers_from_losses_the_same_way_every_time_and_reports_them(self):
         page, snapshot = self.directory / "call.html", self.directory / "first.png"
-        arguments = ("call -s 192x128 -b 600k -k 0 --loss 1% --delay 40ms -n 200 --seed 3 --reorder 2%").split()
+        arguments = "call -s 192x128 -b 600k -k 0 --loss 1% --delay 40ms -n 200 --seed 3 --reorder 2%".split()
         first = self.report(*arguments)
         again = self.report(*arguments, "--report", page, "--snapshot", "1s", snapshot)
         self.assertGreater(first["network"]["packets_lost"], 0)
@@ -97,7 +97,8 @@ class Call(tool.TestCase):
         self.assertEqual(self.names(), ["a.y4m"])
 
     def test_ends_when_nobody_reads_its_output(self):
-        with tool.Process("call", "-n", 1_000_000_000, "-o", "-", "--stream", self.directory / "a") as process:
+        stream = self.directory / "a.264"
+        with tool.Process("call", "-n", 1_000_000_000, "-o", "-", "--stream", stream) as process:
             process.wait_for_output(b"FRAME")
             process.close_output()
             self.assertEnds(process.finish(), tool.OUTPUT, "standard output: whoever was reading it has gone")
@@ -124,7 +125,8 @@ class Decode(tool.TestCase):
             damaged[at] = at % 256
         ended = tool.run("decode", self.write("damaged.264", damaged + small), "--json")
         self.assertIn(ended.code, (0, tool.INPUT), ended.err)
-        self.assertGreaterEqual(json.loads(ended.out)["frames_decoded"], 20, "what comes behind it is not lost")
+        decoded = json.loads(ended.out)["frames_decoded"]
+        self.assertGreaterEqual(decoded, 20, "what comes behind the damage is not lost")
 
 
 if __name__ == "__main__":
