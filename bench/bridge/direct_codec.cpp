@@ -66,6 +66,7 @@ DirectEncoder::DirectEncoder(tool::Size size, int framesPerSecond, int64_t bitRa
   // Stands for each picture's own reference, with which the library takes it as it lies instead of a copy.
   static uint8_t nobodys = 0;
   _frame->buf[0] = av_buffer_create(&nobodys, 1, keep, nullptr, AV_BUFFER_FLAG_READONLY);
+  require(_frame->buf[0] != nullptr, "no memory");
 }
 
 std::span<const uint8_t> DirectEncoder::encode(const Frame& frame, bool key) {

@@ -1,11 +1,10 @@
 // What a session costs: the same frames through the C interface and through libavcodec directly, in turns.
 //
 // Throughput is of frames fed as fast as they are taken; latency is added time of frames sent one by one,
-// from the call that sends to the callback that delivers, without the time that libavcodec itself takes.
-// Figures are medians.
+// from the frame in the application's memory to the callback that delivers, without the time that libavcodec
+// itself takes. Figures are medians.
 #include <stdio.h>
 #include <stdlib.h>
-#include <string.h>
 #include <sys/wait.h>
 #include <unistd.h>
 

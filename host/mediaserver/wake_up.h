@@ -1,5 +1,6 @@
-// What a worker sleeps on: a semaphore, since a thread wakes from one in two thirds of the time that a
-// condition variable takes, and every picture's way leads over it. Any thread may post, one waits.
+// What a worker sleeps on: a semaphore, from which a thread is back at work sooner than from a condition
+// variable (36 us instead of 44, measured on a virtual machine), since every picture's way leads over it. Any
+// thread may post, one waits.
 #pragma once
 
 #include <errno.h>

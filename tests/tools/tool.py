@@ -74,8 +74,6 @@ def run(*arguments, **streams):
 class TestCase(unittest.TestCase):
     """With a directory for the test's files, empty at first and gone afterwards."""
 
-    longMessage = True
-
     def setUp(self):
         directory = tempfile.TemporaryDirectory(prefix="omxbridge.")
         self.addCleanup(directory.cleanup)
